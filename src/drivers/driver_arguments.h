@@ -1,0 +1,23 @@
+// Argument handling shared by the drivers.
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace vlr {
+
+// Both drivers need at least this many arguments.
+constexpr size_t kDriverMinArguments = 14;
+// Placeholder for an input the host leaves to the tool.
+constexpr const char* kNotOK = "NotOK";
+constexpr const char* kOK = "OK";
+
+// Reads the argument list; with too few arguments writes the START record
+// with title and raises 456962 with the whole argument text.
+std::vector<std::string> ReadDriverArguments(const char* argumentText, const char* title,
+                                             const char* module);
+
+// The argument at position, or "" when the list is shorter.
+const std::string& DriverArgument(const std::vector<std::string>& arguments, size_t position);
+
+}  // namespace vlr

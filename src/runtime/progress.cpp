@@ -1,0 +1,90 @@
+// Progress protocol: the working file holds the percent and a message.
+#include "runtime/progress.h"
+
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+
+#include <unistd.h>
+
+#include "runtime/environment.h"
+#include "runtime/error_codes.h"
+#include "runtime/file_utility.h"
+#include "runtime/process_log.h"
+#include "runtime/raise.h"
+
+namespace {
+
+constexpr const char* kModule = "vlr_generic_utility";
+constexpr int kOpenAttempts = 10;
+constexpr int kMaxPercent = 99;
+constexpr size_t kLineMax = 1025;
+
+std::string readLine(FILE* f, bool& got) {
+  char buffer[kLineMax + 2];
+  got = std::fgets(buffer, sizeof buffer, f) != nullptr;
+  if (!got) return "";
+  std::string line = buffer;
+  if (!line.empty() && line.back() == '\n') {
+    line.pop_back();
+  } else {
+    int c;
+    while ((c = std::fgetc(f)) != EOF && c != '\n') {
+    }
+  }
+  if (!line.empty() && line.back() == '\r') line.pop_back();
+  return line;
+}
+
+void traceStreamState(FILE* f, int attempt) {
+  if (!NVLR_UTILITY_IsTraceOn()) return;
+  std::string words = " File ";
+  if (f != nullptr && std::feof(f)) words += "End of file reached ";
+  if (f != nullptr && std::ferror(f)) words += "| A possibly recoverable formatting or conversion error ";
+  if (f == nullptr) words += "| A severe I/O error or unknown state";
+  NVLR_UTILITY_TracePrint("%s attempt open : %d\n", words.c_str(), attempt);
+}
+
+}  // namespace
+
+int getAndSetPerc(int previous, int current, const char* message) {
+  if (current == previous) return 1;
+  if (current > kMaxPercent) current = kMaxPercent;
+  const std::string& working = NVLR_UTILITY_WorkingFile();
+  if (!NVLR_UTILITY_FileExists((working + "_batch_ok").c_str())) {
+    NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
+  }
+  FILE* f = nullptr;
+  if (!NVLR_UTILITY_FileExists(working.c_str())) {
+    NVLR_UTILITY_TracePrint("getAndSetPerc - Not found the file : %s\n", working.c_str());
+    NVLR_UTILITY_TracePrint(" attempt create : %d\n", 1);
+    f = std::fopen(working.c_str(), "w+");
+  } else {
+    for (int attempt = 1; attempt <= kOpenAttempts; ++attempt) {
+      f = std::fopen(working.c_str(), "r+");
+      if (f != nullptr) break;
+      traceStreamState(f, attempt);
+      const int error = errno;
+      if (error != EINTR && error != EAGAIN && error != EBUSY) break;
+      sleep(static_cast<unsigned>(attempt - 1));
+    }
+  }
+  if (f == nullptr) {
+    NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
+  }
+  bool got = false;
+  const std::string first = readLine(f, got);
+  const std::string second = readLine(f, got);
+  if (std::atoi(first.c_str()) > 100) {
+    std::fclose(f);
+    NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
+  }
+  std::rewind(f);
+  std::fprintf(f, "%i\n%s\n", current, message ? message : second.c_str());
+  std::fflush(f);
+  if (ftruncate(fileno(f), std::ftell(f)) != 0) {
+  }
+  std::fclose(f);
+  return 1;
+}
