@@ -37,8 +37,9 @@ int GeneralSAR_BaseXML::createElementsVector(int n) {
   VLR_SCOPE("createElementsVector", kModule);
   elements_.assign(n > 0 ? static_cast<size_t>(n) : 0, parElement());
   cursor_ = 0;
+  registrations_ = 0;
   refreshParameters();
-  bool complete = cursor_ == 0;
+  bool complete = registrations_ == static_cast<int>(elements_.size());
   for (parElement& e : elements_) {
     e.registered = true;
     if (e.type == parElement::PT_NONE) complete = false;
@@ -73,6 +74,7 @@ int GeneralSAR_BaseXML::addElement(const char* name, void* ptr, parElement::Para
   e.setElement(name, ptr, type, count, min, max, mandatory);
   e.stringSize = size;
   e.stringArray = stringArray;
+  ++registrations_;
   if (++cursor_ >= static_cast<int>(elements_.size())) cursor_ = 0;
   return 0;
 }

@@ -115,6 +115,7 @@ class GeneralSAR_BaseXML {
   std::string fieldPath(const parElement& e) const;
 
   int cursor_ = 0;
+  int registrations_ = 0;  // fields registered since the vector was built
   std::vector<parElement> elements_;
   const GeneralSAR_BaseXML* registeredFor_ = nullptr;
   bool allocated_ = false;

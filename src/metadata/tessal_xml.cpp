@@ -6,6 +6,7 @@
 
 #include <cerrno>
 #include <climits>
+#include <cmath>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -115,6 +116,12 @@ bool validNames(const std::vector<std::string>& parts) {
   return true;
 }
 
+// Characters allowed in an XML 1.0 document.
+bool allowedInXml(int c) {
+  return c == 0x9 || c == 0xA || c == 0xD || (c >= 0x20 && c <= 0xD7FF) ||
+         (c >= 0xE000 && c <= 0xFFFD) || (c >= 0x10000 && c <= 0x10FFFF);
+}
+
 // Text made safe for an XML 1.0 UTF-8 document: bytes that are not valid
 // UTF-8, and characters that XML does not allow, become '?'.  Without this a
 // single stray byte from an input product would make the whole document
@@ -127,7 +134,7 @@ std::string xmlSafe(const char* text) {
   while (i < n) {
     int len = static_cast<int>(n - i < 4 ? n - i : 4);
     const int c = xmlGetUTF8Char(X(text + i), &len);
-    if (c < 0 || len < 1 || !xmlIsChar(c)) {
+    if (c < 0 || len < 1 || !allowedInXml(c)) {
       out += '?';
       ++i;
     } else {
@@ -164,9 +171,17 @@ void formatNumber(int v, char* buf, size_t size) {
 void formatNumber(float v, char* buf, size_t size) {
   std::snprintf(buf, size, "%.15g", static_cast<double>(v));
 }
+// "%.15g", the form readers of these documents expect; when 15 digits do not
+// give the value back, as many more as it takes.
 void formatNumber(double v, char* buf, size_t size) {
   std::snprintf(buf, size, "%.15g", v);
+  if (std::isfinite(v) && std::strtod(buf, nullptr) != v) {
+    std::snprintf(buf, size, "%.16g", v);
+    if (std::strtod(buf, nullptr) != v) std::snprintf(buf, size, "%.17g", v);
+  }
 }
+
+void silent(void*, const char*, ...) {}
 
 }  // namespace
 
@@ -247,8 +262,13 @@ int tessalxml::write() {
   VLR_SCOPE("tessalxml::write", kModule);
   if (doc_ == nullptr) newDocument();
   const int saved = errno;
+  // The failure is reported here; the parser library stays quiet.
+  xmlGenericErrorFunc handler = xmlGenericError;
+  void* context = xmlGenericErrorContext;
+  xmlSetGenericErrorFunc(nullptr, silent);
   const int written =
       fileName_.empty() ? -1 : xmlSaveFormatFileEnc(fileName_.c_str(), doc_, "UTF-8", 1);
+  xmlSetGenericErrorFunc(context, handler);
   errno = saved;
   if (written < 0) VLR_FAIL("File writing failed!", 5);
   return 0;
