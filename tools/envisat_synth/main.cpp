@@ -1,0 +1,155 @@
+// envisat_synth: writes a synthetic ENVISAT ASAR wide-swath SLC product with
+// its orbit and auxiliary files, and the ground truth a reader must find.
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+
+#include "synth_scene.h"
+#include "synth_writer.h"
+
+#ifndef SYNTH_DEFAULT_ORBIT
+#define SYNTH_DEFAULT_ORBIT ""
+#endif
+
+namespace {
+
+const char* kHelp =
+    "usage: envisat_synth --out DIR [options]\n"
+    "\n"
+    "Writes into DIR an ASA_WSS_1P product (five sub-swaths of ScanSAR bursts), the\n"
+    "DORIS orbit file it follows, an ASA_XCA and an ASA_INS file valid at the scene\n"
+    "time, ASA_AUX_list.dat listing them, and synth_truth.txt.  Same options and seed\n"
+    "give byte-identical files.\n"
+    "\n"
+    "options:\n"
+    "  --seed N             speckle seed (default 1)\n"
+    "  --size S             tiny | small | realistic (default tiny)\n"
+    "                         tiny: 4 bursts, 128 samples per sub-swath (< 1 MB)\n"
+    "                         small: 30 bursts, 320 samples per sub-swath\n"
+    "                         realistic: 282 bursts (60 s), real sample counts (~1.7 GB)\n"
+    "  --start TEXT         sensing start, \"DD-MMM-YYYY HH:MM:SS[.ffffff]\"; default: the\n"
+    "                       first crossing of 45 degrees latitude on the requested pass\n"
+    "                       at least 2 h into the orbit file (02-MAR-2008 10:00:00 with\n"
+    "                       --orbit kepler)\n"
+    "  --polarisation P     HH | VV (default HH)\n"
+    "  --pass P             ascending | descending (default descending)\n"
+    "  --orbit FILE|kepler  DORIS file whose trajectory the scene follows (the scene must\n"
+    "                       lie inside its validity; it is copied into DIR), or a\n"
+    "                       circular Keplerian orbit written as a DOR_VOR file with 60 s\n"
+    "                       records from 2 h before to 1 h after the scene.\n"
+    "                       default: " SYNTH_DEFAULT_ORBIT
+    "\n"
+    "  --pattern P          flat | checkerboard | points (default checkerboard)\n"
+    "defects:\n"
+    "  --blank-first N      first N lines of every sub-swath blank (quality -1, zero samples)\n"
+    "  --blank-last N       last N lines likewise\n"
+    "  --mds-count N        write only N measurement data sets (the other DSDs empty)\n"
+    "  --truncate BYTES     cut the product after BYTES bytes\n"
+    "  --dsd-beyond-end K   DSD K (0..17) points 4096 bytes beyond the end of the file\n"
+    "  --zero-count K       annotation DSD K (0..6) with record count and size 0\n"
+    "  --wrong-type CODE    product name (and file name) starts with CODE, e.g. ASA_IMS_1P\n"
+    "\n"
+    "synth_truth.txt is a parameter file ([Section], Key = value):\n"
+    "  [Scene]        file names, orbit source, sensing start/stop, pass, polarisation,\n"
+    "                 orbits, line interval, burst cycle, lines per burst, bursts, rates\n"
+    "  [SubSwath1..5] Samples, Records, LinesPerBurst, Bursts, EchoesPerBurst, Rank, PRF,\n"
+    "                 First/LastLineTime, Near/FarRangeTime, CentreTime, CentreRangeTime,\n"
+    "                 Near/Centre/FarIncidence, corner and centre Lat/Lon, MdsOffset ...\n"
+    "  [Pattern]      reflectivity pattern R(daz, drg) and how samples were drawn from it\n"
+    "  [Doppler], [Calibration], [Defects]\n"
+    "Times are seconds since 01-JAN-1985 (with UTC texts), range times two-way seconds,\n"
+    "angles and coordinates degrees.\n";
+
+bool take_int(const char* v, long long* out) {
+  char* end = nullptr;
+  *out = std::strtoll(v, &end, 10);
+  return end != v && *end == '\0';
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  synth::Options o;
+  o.orbit = SYNTH_DEFAULT_ORBIT;
+  for (int i = 1; i < argc; ++i) {
+    const std::string a = argv[i];
+    if (a == "--help" || a == "-h") {
+      std::fputs(kHelp, stdout);
+      return 0;
+    }
+    if (i + 1 >= argc) {
+      std::fprintf(stderr, "envisat_synth: %s needs a value (see --help)\n", a.c_str());
+      return 2;
+    }
+    const char* v = argv[++i];
+    long long n = 0;
+    bool ok = true;
+    if (a == "--out")
+      o.out_dir = v;
+    else if (a == "--size")
+      o.size = v;
+    else if (a == "--start")
+      o.start = v;
+    else if (a == "--polarisation")
+      o.polarisation = v;
+    else if (a == "--pass")
+      o.pass = v;
+    else if (a == "--orbit")
+      o.orbit = v;
+    else if (a == "--pattern")
+      o.pattern = v;
+    else if (a == "--wrong-type")
+      o.wrong_type = v;
+    else if ((ok = take_int(v, &n))) {
+      if (a == "--seed" && n >= 0)
+        o.seed = static_cast<uint64_t>(n);
+      else if (a == "--blank-first" && n >= 0)
+        o.blank_first = static_cast<int>(n);
+      else if (a == "--blank-last" && n >= 0)
+        o.blank_last = static_cast<int>(n);
+      else if (a == "--mds-count" && n >= 0 && n <= 5)
+        o.mds_count = static_cast<int>(n);
+      else if (a == "--truncate" && n >= 0)
+        o.truncate_at = n;
+      else if (a == "--dsd-beyond-end" && n >= 0 && n < 18)
+        o.dsd_beyond_end = static_cast<int>(n);
+      else if (a == "--zero-count" && n >= 0 && n <= 6)
+        o.zero_count = static_cast<int>(n);
+      else
+        ok = false;
+    }
+    if (!ok) {
+      std::fprintf(stderr, "envisat_synth: bad option or value: %s %s (see --help)\n", a.c_str(),
+                   v);
+      return 2;
+    }
+  }
+  if (o.out_dir.empty()) {
+    std::fputs("envisat_synth: --out DIR is required (see --help)\n", stderr);
+    return 2;
+  }
+  if (o.orbit.empty()) {
+    std::fputs("envisat_synth: no default orbit file known; give --orbit FILE or kepler\n", stderr);
+    return 2;
+  }
+  std::error_code ec;
+  std::filesystem::create_directories(o.out_dir, ec);
+  if (ec) {
+    std::fprintf(stderr, "envisat_synth: cannot create %s: %s\n", o.out_dir.c_str(),
+                 ec.message().c_str());
+    return 1;
+  }
+  const auto t_start = std::chrono::steady_clock::now();
+  synth::Scene scene;
+  std::string error;
+  if (!synth::build_scene(o, &scene, &error) || !synth::write_scene(scene, &error)) {
+    std::fprintf(stderr, "envisat_synth: %s\n", error.c_str());
+    return 1;
+  }
+  const double secs =
+      std::chrono::duration<double>(std::chrono::steady_clock::now() - t_start).count();
+  std::printf("%s written in %.1f s\n", scene.product_name.c_str(), secs);
+  return 0;
+}

@@ -1,0 +1,107 @@
+// The scene the generator writes: options, timing, sub-swath layout,
+// reflectivity pattern, and the geometric truth derived from the trajectory.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "synth_geometry.h"
+
+namespace synth {
+
+constexpr int kSubSwaths = 5;
+
+struct Options {
+  std::string out_dir;
+  uint64_t seed = 1;
+  std::string size = "tiny";  // tiny, small, realistic
+  std::string start;          // sensing start text; empty: the default
+  std::string polarisation = "HH";
+  std::string pass;   // ascending, descending; empty: descending (or as --start gives)
+  std::string orbit;  // a DORIS file or "kepler"
+  std::string pattern = "checkerboard";  // flat, checkerboard, points
+  // Defects.
+  int blank_first = 0, blank_last = 0;
+  int mds_count = 5;
+  int64_t truncate_at = -1;
+  int dsd_beyond_end = -1;
+  int zero_count = -1;
+  std::string wrong_type;
+};
+
+struct Corner {
+  double t = 0, tau = 0;
+  double lat = 0, lon = 0, incidence = 0, look = 0;
+};
+
+struct SubSwath {
+  int index = 0;  // 0..4
+  int samples = 0;
+  double prf = 0, pulse_len = 0, pulse_bw = 0;
+  int rank = 0, echoes = 0;
+  double near_tau = 0, far_tau = 0;
+  int records = 0;
+  double first_time = 0, last_time = 0;  // times of the first and last records
+  Corner first_near, first_far, last_near, last_far, centre;
+  double chirp_power = 0;
+  int dop_delta = 0;
+  double elev_centre = 0;  // look angle at the sub-swath centre (XCA reference angle)
+  double fm_rate[3] = {0, 0, 0}, fm_origin_tau = 0;
+  int64_t record_size = 0;
+};
+
+struct Target {
+  double t = 0, tau = 0, lat = 0, lon = 0;
+};
+
+struct Pattern {
+  std::string kind;
+  double scale = 100.0;             // std dev of I and Q for reflectivity 1 at full illumination
+  double az_cell = 0, rg_cell = 0;  // checkerboard cell (s, s of two-way range time)
+  double high = 1.0, low = 0.25;
+  double background = 1.0, target_level = 64.0;
+  double target_half_az = 0, target_half_rg = 0;  // half extent of a target (s)
+  std::vector<Target> targets;
+  // Reflectivity at zero-Doppler time offset daz (from the first line) and
+  // range time offset drg (from the near range of SS1).
+  double at(double daz, double drg) const;
+};
+
+struct Scene {
+  Options opt;
+  std::unique_ptr<Trajectory> traj;
+  bool kepler = false;
+  std::string orbit_source;  // path of the real file or "kepler"
+  double t0 = 0, stop = 0;
+  double line_interval = 0, burst_cycle = 0;
+  int cycle_lines = 0, lines_per_burst = 0, bursts = 0, grid_lines = 0;
+  double fs = 19.20768e6, fc = 5.331004416e9;
+  double range_spacing = 0, azimuth_spacing = 0;
+  double time_diff_zd = -0.351;  // value at 73 of the processing record
+  SubSwath ss[kSubSwaths];
+  std::string pass, polar;
+  int abs_orbit = 0, rel_orbit = 0, cycle = 0;
+  Pattern pattern;
+  // Doppler centroid: per record coefficients about the reference range time.
+  double dop_ref_tau = 0;
+  std::vector<double> dop_times;
+  std::vector<double> dop_c0;
+  double dop_c1 = -1.5e4;
+  double droop[8] = {0}, temperature = 0;
+  // File names in the output folder.
+  std::string product_name, orbit_name, xca_name, ins_name;
+  double orbit_first = 0, orbit_last = 0;  // records of a generated orbit file
+  double xca_start = 0, xca_stop = 0;
+};
+
+// Builds the scene; false with a message on bad options.
+bool build_scene(const Options& opt, Scene* scene, std::string* error);
+// Two-way elevation pattern of the generated calibration files, in dB, at an
+// angle offset (degrees) from the reference angle of slot `slot` (0..7).
+double xca_pattern_db(int slot, double offset_deg);
+// Power taper of line i of a burst of L lines.
+double burst_taper(int i, int lines_per_burst);
+
+}  // namespace synth
