@@ -1,6 +1,7 @@
 // Checked forms: a failure of the plain form ends the process with status 1.
 #include "profile/profile_checked.h"
 
+#include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
 
@@ -12,11 +13,19 @@ const char* Text(const char* s) {
   return s != nullptr ? s : "";
 }
 
+// Prints the message to stderr and ends the process with status 1.
+[[noreturn]] __attribute__((format(printf, 1, 2))) void Die(const char* format, ...) {
+  va_list args;
+  va_start(args, format);
+  std::vfprintf(stderr, format, args);
+  va_end(args);
+  std::exit(1);
+}
+
 [[noreturn]] void Fail(const char* operation, const char* section, const char* key,
                        const char* file) {
-  std::fprintf(stderr, "Error in %s: section %s, key %s, file %s\n", operation, Text(section),
-               Text(key), Text(file));
-  std::exit(1);
+  Die("Error in %s: section %s, key %s, file %s\n", operation, Text(section), Text(key),
+      Text(file));
 }
 
 }  // namespace
@@ -32,9 +41,8 @@ int GetCheckMyProfileString(const char* section, const char* key, char* buffer, 
 int WriteCheckMyProfileString(const char* section, const char* key, const char* text,
                               const char* file) {
   if (WriteMyProfileString(section, key, text, file) != 0) {
-    std::fprintf(stderr, "Error in WriteMyProfileString: section %s, key %s, string %s, file %s\n",
-                 Text(section), Text(key), Text(text), Text(file));
-    std::exit(1);
+    Die("Error in WriteMyProfileString: section %s, key %s, string %s, file %s\n", Text(section),
+        Text(key), Text(text), Text(file));
   }
   return 0;
 }
@@ -68,9 +76,8 @@ VLR_CHECKED_ARRAY(WriteCheckMyProfileDoubleArray, WriteProfileDoubleArray, const
 
 int WriteCheckMyProfileInt(const char* section, const char* key, int value, const char* file) {
   if (WriteMyProfileInt(section, key, value, file) != 0) {
-    std::fprintf(stderr, "Error in WriteMyProfileInt: section %s, key %s, value %d, file %s\n",
-                 Text(section), Text(key), value, Text(file));
-    std::exit(1);
+    Die("Error in WriteMyProfileInt: section %s, key %s, value %d, file %s\n", Text(section),
+        Text(key), value, Text(file));
   }
   return 0;
 }
@@ -78,9 +85,8 @@ int WriteCheckMyProfileInt(const char* section, const char* key, int value, cons
 int WriteCheckMyProfileInt64(const char* section, const char* key, int64_t value,
                              const char* file) {
   if (WriteMyProfileInt64(section, key, value, file) != 0) {
-    std::fprintf(stderr, "Error in WriteMyProfileInt64: section %s, key %s, value %f, file %s\n",
-                 Text(section), Text(key), static_cast<double>(value), Text(file));
-    std::exit(1);
+    Die("Error in WriteMyProfileInt64: section %s, key %s, value %f, file %s\n", Text(section),
+        Text(key), static_cast<double>(value), Text(file));
   }
   return 0;
 }
@@ -88,9 +94,8 @@ int WriteCheckMyProfileInt64(const char* section, const char* key, int64_t value
 int WriteCheckMyProfileDouble(const char* section, const char* key, double value,
                               const char* file) {
   if (WriteMyProfileDouble(section, key, value, file) != 0) {
-    std::fprintf(stderr, "Error in WriteMyProfileDouble: section %s, key %s, value %f, file %s\n",
-                 Text(section), Text(key), value, Text(file));
-    std::exit(1);
+    Die("Error in WriteMyProfileDouble: section %s, key %s, value %f, file %s\n", Text(section),
+        Text(key), value, Text(file));
   }
   return 0;
 }
