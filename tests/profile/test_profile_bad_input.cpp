@@ -73,16 +73,4 @@ TEST_F(ProfileBadInput, OverLongValuesAndNamesStayBounded) {
   EXPECT_EQ(GetMyProfileIntArray("S", "K", n, 1, f.c_str()), 10);
 }
 
-TEST_F(ProfileBadInput, MissingArgumentsFailQuietly) {
-  const std::string f = WriteFile("x.par", "[S]\nK = 1\n");
-  EXPECT_EQ(GetSetProfileChar(kProfileGet, nullptr, "K", nullptr, f.c_str()), nullptr);
-  EXPECT_EQ(GetSetProfileChar(kProfileGet, "S", nullptr, nullptr, f.c_str()), nullptr);
-  EXPECT_EQ(GetSetProfileChar(kProfileGet, "S", "K", nullptr, nullptr), nullptr);
-  EXPECT_EQ(GetSetProfileChar(kProfileSet, "S", "K", nullptr, f.c_str()), nullptr);
-  char buffer[4];
-  EXPECT_EQ(GetMyProfileString("S", "K", nullptr, 4, f.c_str()), 10);
-  EXPECT_EQ(GetMyProfileString("S", "K", buffer, 4, nullptr), 10);
-  EXPECT_EQ(Value(f, "S", "K"), "1");
-}
-
 }  // namespace

@@ -171,16 +171,4 @@ TEST_F(ProfileParser, DeleteKeyAndSection) {
   EXPECT_EQ(ReadFile(f), "\n[S]\nA = 1\nB = 2\n\n[S]\n");
 }
 
-TEST_F(ProfileParser, CaseInsensitiveCompareFoldsAsciiOnly) {
-  EXPECT_EQ(mystrcasecmp("JAN", "jan"), 0);
-  EXPECT_EQ(mystrcasecmp("Feb", "fEB"), 0);
-  EXPECT_LT(mystrcasecmp("abc", "ABD"), 0);
-  EXPECT_GT(mystrcasecmp("abcd", "ABC"), 0);
-  EXPECT_EQ(mystrcasecmp("a[", "A{"), '[' - '{');
-  EXPECT_NE(mystrcasecmp("\xC4", "\xE4"), 0);
-  const char* same = "x";
-  EXPECT_EQ(mystrcasecmp(same, same), 0);
-  EXPECT_EQ(mystrcasecmp(nullptr, nullptr), 0);
-}
-
 }  // namespace
