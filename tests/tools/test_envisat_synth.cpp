@@ -1,0 +1,252 @@
+// The generator is the reference for the import: its files must be
+// self-consistent, reproducible, carry the defects asked for, and its truth
+// must describe the data and the geometry it wrote.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <filesystem>
+
+#include "synth_run.h"
+
+namespace synth_test {
+namespace {
+
+constexpr size_t kSph = 1247;
+constexpr size_t kDsd0 = kSph + 1059;
+
+struct Dsd {
+  long long offset, size, num, dsr;
+};
+Dsd dsd(const std::vector<uint8_t>& f, int k) {
+  const size_t b = kDsd0 + 280 * k;
+  return {header_number(f, b + 133), header_number(f, b + 170), header_number(f, b + 207),
+          header_number(f, b + 228)};
+}
+
+double mjd_time(const uint8_t* p) {
+  return static_cast<int32_t>(be32(p)) * 86400.0 + be32(p + 4) + be32(p + 8) * 1e-6 + 473299200.0;
+}
+
+double num(const Params& t, const char* s, const char* k) {
+  return std::stod(t.at(s).at(k));
+}
+
+class SynthTiny : public ::testing::Test {
+ protected:
+  static void SetUpTestSuite() { run_ = new SynthRun(run_synth("--orbit kepler --pattern flat")); }
+  static void TearDownTestSuite() {
+    remove_run(*run_);
+    delete run_;
+  }
+  static SynthRun* run_;
+};
+SynthRun* SynthTiny::run_ = nullptr;
+
+TEST_F(SynthTiny, HeadersDescriptorsAndDataSetsAreConsistent) {
+  ASSERT_EQ(run_->exit_code, 0);
+  const std::vector<uint8_t> f = read_file(run_->product);
+  ASSERT_GT(f.size(), 7346u);
+  EXPECT_LT(f.size(), 1u << 20);
+  EXPECT_EQ(header_number(f, 1075), static_cast<long long>(f.size()));  // TOT_SIZE
+  EXPECT_EQ(header_number(f, 1113), 6099);                              // SPH_SIZE
+  EXPECT_EQ(header_number(f, 1140), 18);                                // NUM_DSD
+  EXPECT_EQ(std::string(reinterpret_cast<const char*>(&f[9]), 62),
+            std::filesystem::path(run_->product).filename().string());
+  // Data sets follow each other in descriptor order, right after the headers.
+  long long next = 7346;
+  for (int k = 0; k < 18; ++k) {
+    const Dsd d = dsd(f, k);
+    EXPECT_EQ(f[kDsd0 + 280 * k + 279], '\n');
+    if (d.size == 0) continue;
+    EXPECT_EQ(d.offset, next) << "DSD " << k;
+    EXPECT_EQ(d.size, d.num * d.dsr) << "DSD " << k;
+    next = d.offset + d.size;
+  }
+  EXPECT_EQ(next, static_cast<long long>(f.size()));
+  EXPECT_EQ(dsd(f, 1).dsr, 2009);
+  EXPECT_EQ(dsd(f, 5).dsr, 521);
+  EXPECT_EQ(dsd(f, 5).num % 5, 0);
+  // Per sub-swath processing record: swath name, lines and samples.
+  for (int k = 0; k < 5; ++k) {
+    const uint8_t* m = &f[dsd(f, 1).offset + 2009 * k];
+    EXPECT_EQ(m[43], '1' + k);
+    EXPECT_EQ(be32(m + 56),
+              std::stoul(run_->truth.at("SubSwath" + std::to_string(k + 1)).at("Records")));
+    EXPECT_EQ(dsd(f, 7 + k).dsr, 17 + 4 * static_cast<long long>(be32(m + 60)));
+  }
+  // The first geolocation record of each sub-swath starts at the first line:
+  // its near tie point is the truth's first-near corner.
+  for (int k = 0; k < 5; ++k) {
+    const uint8_t* g = &f[dsd(f, 5).offset + 521 * k];
+    const std::string s = "SubSwath" + std::to_string(k + 1);
+    EXPECT_EQ(g[501], '1' + k);
+    EXPECT_EQ(be32(g + 25), 1u);
+    EXPECT_EQ(static_cast<int32_t>(be32(g + 157)),
+              std::lround(num(run_->truth, s.c_str(), "FirstNearLat") * 1e6));
+    EXPECT_EQ(static_cast<int32_t>(be32(g + 201)),
+              std::lround(num(run_->truth, s.c_str(), "FirstNearLon") * 1e6));
+  }
+}
+
+TEST_F(SynthTiny, LinesFormOverlappingBurstsOnOneTimeGrid) {
+  ASSERT_EQ(run_->exit_code, 0);
+  const std::vector<uint8_t> f = read_file(run_->product);
+  const Params& t = run_->truth;
+  const double dt = num(t, "Scene", "LineTimeInterval");
+  const double cycle = num(t, "Scene", "BurstCycle");
+  const int lpb = std::stoi(t.at("Scene").at("LinesPerBurst"));
+  EXPECT_NEAR(cycle, 18 * dt, 1e-12);
+  // Each time of the grid lies in three bursts: a burst spans three cycles.
+  EXPECT_EQ(lpb, 3 * 18);
+  for (int k = 0; k < 5; ++k) {
+    const Dsd d = dsd(f, 7 + k);
+    const uint8_t* r0 = &f[d.offset];
+    EXPECT_NEAR(mjd_time(r0), num(t, "Scene", "SensingStart"), 1e-6);
+    EXPECT_EQ(r0[12], 0);
+    EXPECT_EQ(be32(r0 + 13), 1u);
+    EXPECT_NEAR(mjd_time(r0 + d.dsr) - mjd_time(r0), dt, 1.5e-6);
+    EXPECT_NEAR(mjd_time(r0 + d.dsr * lpb) - mjd_time(r0), cycle, 1.5e-6);
+    const uint8_t* last = &f[d.offset + d.dsr * (d.num - 1)];
+    EXPECT_NEAR(mjd_time(last), num(t, "SubSwath1", "LastLineTime"), 1e-6);
+    EXPECT_EQ(be32(last + 13), static_cast<uint32_t>(d.num));
+  }
+}
+
+TEST_F(SynthTiny, SamplePowerFollowsTaperAndScale) {
+  ASSERT_EQ(run_->exit_code, 0);
+  const std::vector<uint8_t> f = read_file(run_->product);
+  const Dsd d = dsd(f, 7);
+  const int lpb = std::stoi(run_->truth.at("Scene").at("LinesPerBurst"));
+  const double scale = num(run_->truth, "Pattern", "Scale");
+  const long long n = (d.dsr - 17) / 4;
+  // Power over lines near the burst centre against lines near its edges.
+  double centre = 0, edge = 0, expect_centre = 0, expect_edge = 0;
+  for (long long r = 0; r < d.num; ++r) {
+    const int i = static_cast<int>(r % lpb);
+    const double taper = std::pow(std::sin(M_PI * (i + 0.5) / lpb), 2);
+    double p = 0;
+    for (long long s = 0; s < n; ++s) {
+      const uint8_t* q = &f[d.offset + r * d.dsr + 17 + 4 * s];
+      p += double(be16(q)) * be16(q) + double(be16(q + 2)) * be16(q + 2);
+    }
+    (taper > 0.5 ? centre : edge) += p;
+    (taper > 0.5 ? expect_centre : expect_edge) += 2 * scale * scale * taper * n;
+  }
+  EXPECT_NEAR(centre / expect_centre, 1.0, 0.03);
+  EXPECT_NEAR(edge / expect_edge, 1.0, 0.05);
+}
+
+TEST_F(SynthTiny, CornersLieAtTheRangeAndZeroDopplerOfTheStateVector) {
+  ASSERT_EQ(run_->exit_code, 0);
+  // The MPH state vector is at the sensing start: the first-line corners must
+  // lie on the ellipsoid at the slant range of their range time, at right angles
+  // to the velocity, and to the right of the track.
+  const std::vector<uint8_t> f = read_file(run_->product);
+  auto value = [&](size_t off) {
+    return std::atof(std::string(f.begin() + off, f.begin() + off + 12).c_str());
+  };
+  const double p[3] = {value(598), value(625), value(652)};
+  const double v[3] = {value(679), value(708), value(737)};
+  const double a = 6378137.0, b = 6356752.314245, e2 = 1 - b * b / (a * a);
+  for (int k = 1; k <= 5; ++k) {
+    const std::string s = "SubSwath" + std::to_string(k);
+    for (const char* c : {"FirstNear", "FirstFar"}) {
+      const double lat = num(run_->truth, s.c_str(), (std::string(c) + "Lat").c_str()) * M_PI / 180;
+      const double lon = num(run_->truth, s.c_str(), (std::string(c) + "Lon").c_str()) * M_PI / 180;
+      const double nr = a / std::sqrt(1 - e2 * std::sin(lat) * std::sin(lat));
+      const double x[3] = {nr * std::cos(lat) * std::cos(lon), nr * std::cos(lat) * std::sin(lon),
+                           nr * (1 - e2) * std::sin(lat)};
+      const double dx[3] = {x[0] - p[0], x[1] - p[1], x[2] - p[2]};
+      const double range = std::sqrt(dx[0] * dx[0] + dx[1] * dx[1] + dx[2] * dx[2]);
+      const double tau = num(run_->truth, s.c_str(),
+                             c == std::string("FirstNear") ? "NearRangeTime" : "FarRangeTime");
+      EXPECT_NEAR(range, tau * 299792458.0 / 2, 0.5) << s << c;
+      const double speed = std::sqrt(v[0] * v[0] + v[1] * v[1] + v[2] * v[2]);
+      EXPECT_NEAR((dx[0] * v[0] + dx[1] * v[1] + dx[2] * v[2]) / (range * speed), 0.0, 1e-6);
+    }
+    EXPECT_GT(num(run_->truth, s.c_str(), "FarIncidence"),
+              num(run_->truth, s.c_str(), "NearIncidence"));
+  }
+}
+
+TEST(Synth, SameSeedSameBytesOtherSeedOtherSpeckle) {
+  const SynthRun a = run_synth("--orbit kepler --seed 5");
+  const SynthRun b = run_synth("--orbit kepler --seed 5");
+  const SynthRun c = run_synth("--orbit kepler --seed 6");
+  ASSERT_EQ(a.exit_code, 0);
+  ASSERT_EQ(b.exit_code, 0);
+  ASSERT_EQ(c.exit_code, 0);
+  for (const char* key : {"Product", "OrbitFile", "XcaFile", "InsFile"})
+    EXPECT_EQ(read_file(a.dir + a.truth.at("Scene").at(key)),
+              read_file(b.dir + b.truth.at("Scene").at(key)))
+        << key;
+  EXPECT_EQ(read_text(a.dir + "synth_truth.txt"), read_text(b.dir + "synth_truth.txt"));
+  const std::vector<uint8_t> pa = read_file(a.product), pc = read_file(c.product);
+  ASSERT_EQ(pa.size(), pc.size());
+  EXPECT_NE(pa, pc);
+  for (const SynthRun* r : {&a, &b, &c}) remove_run(*r);
+}
+
+TEST(Synth, KeplerOrbitFileCoversTheSceneWithANodeBefore) {
+  const SynthRun r = run_synth("--orbit kepler --pass ascending");
+  ASSERT_EQ(r.exit_code, 0);
+  EXPECT_EQ(r.truth.at("Scene").at("Pass"), "ASCENDING");
+  const std::vector<uint8_t> o = read_file(r.dir + r.truth.at("Scene").at("OrbitFile"));
+  const long long off = header_number(o, 1247 + 231), n = header_number(o, 1247 + 305);
+  ASSERT_EQ(off, 1625);
+  ASSERT_EQ(static_cast<long long>(o.size()), off + 129 * n);
+  // The records begin two hours (120 records) before the scene.
+  bool node_before = false;
+  double prev_z = 0;
+  for (long long i = 0; i < n; ++i) {
+    const char* rec = reinterpret_cast<const char*>(&o[off + 129 * i]);
+    EXPECT_EQ(rec[128], '\n');
+    const double z = std::atof(std::string(rec + 70, 12).c_str());
+    if (i > 0 && i < 120 && prev_z <= 0 && z > 0) node_before = true;
+    prev_z = z;
+  }
+  EXPECT_TRUE(node_before);
+  EXPECT_GE(n * 60.0, 3 * 3600.0);
+  remove_run(r);
+}
+
+TEST(Synth, DefectsAreWrittenAsAsked) {
+  const SynthRun r = run_synth(
+      "--orbit kepler --blank-first 3 --blank-last 2 --mds-count 3 "
+      "--zero-count 2 --dsd-beyond-end 5");
+  ASSERT_EQ(r.exit_code, 0);
+  const std::vector<uint8_t> f = read_file(r.product);
+  const Dsd mds1 = dsd(f, 7);
+  for (int i = 0; i < 4; ++i) EXPECT_EQ(f[mds1.offset + mds1.dsr * i + 12], i < 3 ? 0xFF : 0);
+  EXPECT_EQ(f[mds1.offset + mds1.dsr * (mds1.num - 2) + 12], 0xFF);
+  EXPECT_EQ(f[mds1.offset + mds1.dsr * (mds1.num - 3) + 12], 0);
+  for (long long s = 17; s < mds1.dsr; ++s) EXPECT_EQ(f[mds1.offset + s], 0);
+  EXPECT_GT(dsd(f, 9).size, 0);
+  EXPECT_EQ(dsd(f, 10).size, 0);
+  EXPECT_EQ(dsd(f, 11).size, 0);
+  EXPECT_EQ(dsd(f, 2).num, 0);
+  EXPECT_GT(dsd(f, 5).offset, static_cast<long long>(f.size()));
+  EXPECT_EQ(r.truth.at("Scene").at("SubSwaths"), "3");
+  remove_run(r);
+
+  const SynthRun t = run_synth("--orbit kepler --truncate 5000 --wrong-type ASA_IMS_1P");
+  ASSERT_EQ(t.exit_code, 0);
+  const std::string name = t.truth.at("Scene").at("Product");
+  EXPECT_EQ(name.substr(0, 10), "ASA_IMS_1P");
+  const std::vector<uint8_t> g = read_file(t.product);
+  EXPECT_EQ(g.size(), 5000u);
+  EXPECT_EQ(std::string(reinterpret_cast<const char*>(&g[9]), 62), name);
+  remove_run(t);
+}
+
+TEST(Synth, RefusesScenesOutsideTheOrbitFileAndBadOptions) {
+  for (const char* args : {"--start \"01-JAN-2009 00:00:00\"", "--size huge", "--mds-count 9",
+                           "--pattern stripes", "--orbit /nonexistent/DOR_VOR"}) {
+    const SynthRun r = run_synth(args);
+    EXPECT_NE(r.exit_code, 0) << args;
+    remove_run(r);
+  }
+}
+
+}  // namespace
+}  // namespace synth_test
