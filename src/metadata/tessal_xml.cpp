@@ -239,16 +239,16 @@ int tessalxml::initXmlFile(const char* file) {
     xmlFreeDoc(doc);
     doc = nullptr;
   }
+  if (doc == nullptr && debug_)
+    std::fprintf(stderr, "File not recognized: %s does not exist\n", fileName_.c_str());
   if (doc == nullptr || !recognised(xmlDocGetRootElement(doc))) {
     if (doc != nullptr) xmlFreeDoc(doc);
-    if (debug_ && doc == nullptr)
-      std::fprintf(stderr, "File not recognized: %s does not exist\n", fileName_.c_str());
     newDocument();
     return 1;
   }
   doc_ = doc;
   root_ = xmlDocGetRootElement(doc_);
-  channels_ = std::atoi(textOf(firstChild(root_, kChannels)).c_str());
+  channels_ = storedChannels();
   return 0;
 }
 
@@ -288,10 +288,17 @@ xmlNodePtr tessalxml::channelForWrite(int channel) {
   if (c != nullptr) return c;
   c = xmlNewChild(root_, nullptr, X(kChannel), nullptr);
   xmlNewProp(c, X(kNumber), X(std::to_string(channel).c_str()));
-  xmlNodePtr count = firstChild(root_, kChannels);
-  channels_ = std::atoi(textOf(count).c_str()) + 1;
-  setText(count, std::to_string(channels_).c_str());
+  channels_ = storedChannels();
+  if (channels_ < INT_MAX) ++channels_;
+  setText(firstChild(root_, kChannels), std::to_string(channels_).c_str());
   return c;
+}
+
+int tessalxml::storedChannels() const {
+  const int saved = errno;
+  const int n = parseNumber<int>(textOf(firstChild(root_, kChannels)).c_str(), nullptr);
+  errno = saved;
+  return n;
 }
 
 xmlNodePtr tessalxml::findField(int channel, const char* path) const {

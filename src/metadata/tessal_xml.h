@@ -74,6 +74,7 @@ class tessalxml {
  private:
   void newDocument();
   bool recognised(xmlNodePtr root);
+  int storedChannels() const;
   xmlNodePtr findChannel(int channel) const;
   xmlNodePtr channelForWrite(int channel);
   xmlNodePtr findField(int channel, const char* path) const;
@@ -87,7 +88,6 @@ class tessalxml {
   xmlDocPtr doc_ = nullptr;
   xmlNodePtr root_ = nullptr;
   std::string fileName_;
-  std::string description_ = "My description";
   int channels_ = 0;
   bool debug_ = false;
 };
