@@ -1,0 +1,114 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstring>
+#include <limits>
+
+#include "raster/byte_order.h"
+
+namespace {
+
+TEST(ByteOrder, ReadersDecodeBothOrders) {
+  const unsigned char be[8] = {0x12, 0x34, 0x56, 0x78, 0x9A, 0xBC, 0xDE, 0xF0};
+  EXPECT_EQ(endi(), 'l');
+  EXPECT_EQ(ch2uint2(be, 'm'), 0x1234u);
+  EXPECT_EQ(ch2uint2(be, 'l'), 0x3412u);
+  EXPECT_EQ(ch2uint4(be, 'm'), 0x12345678u);
+  EXPECT_EQ(ch2uint4(be, 'l'), 0x78563412u);
+  const unsigned char minus_two[4] = {0xFF, 0xFF, 0xFF, 0xFE};
+  EXPECT_EQ(ch2int2(minus_two + 2, 'm'), -2);
+  EXPECT_EQ(ch2int4(minus_two, 'm'), -2);
+  EXPECT_EQ(ch2long4(minus_two, 'm'), -2);
+  // 1.5f is 0x3FC00000, 1.5 is 0x3FF8000000000000.
+  const unsigned char f_be[4] = {0x3F, 0xC0, 0x00, 0x00};
+  const unsigned char f_le[4] = {0x00, 0x00, 0xC0, 0x3F};
+  EXPECT_EQ(ch2float4(f_be, 'm'), 1.5f);
+  EXPECT_EQ(ch2float4(f_le, 'l'), 1.5f);
+  const unsigned char d_be[8] = {0x3F, 0xF8, 0, 0, 0, 0, 0, 0};
+  EXPECT_EQ(ch2double8(d_be, 'm'), 1.5);
+  // Unaligned source.
+  unsigned char odd[9] = {0};
+  std::memcpy(odd + 1, d_be, 8);
+  EXPECT_EQ(ch2double8(odd + 1, 'm'), 1.5);
+}
+
+TEST(ByteOrder, WritersRoundTrip) {
+  unsigned char b[4];
+  float2ch(-3.25f, b, 'm');
+  EXPECT_EQ(b[0], 0xC0);
+  EXPECT_EQ(ch2float4(b, 'm'), -3.25f);
+  float2ch(-3.25f, b, 'l');
+  EXPECT_EQ(b[3], 0xC0);
+  long2ch(-123456, b, 'm');
+  EXPECT_EQ(ch2long4(b, 'm'), -123456);
+  long2ch(0x01020304, b, 'l');
+  EXPECT_EQ(b[0], 0x04);
+  short2ch(-300, b, 'm');
+  EXPECT_EQ(ch2int2(b, 'm'), -300);
+  EXPECT_EQ(b[0], 0xFE);
+}
+
+TEST(ByteOrderDeathTest, UnknownOrderLetterEndsTheProcess) {
+  const unsigned char b[4] = {0};
+  EXPECT_EXIT(ch2int4(b, 'x'), ::testing::ExitedWithCode(1), "");
+  unsigned char w[4];
+  EXPECT_EXIT(short2ch(1, w, 'L'), ::testing::ExitedWithCode(1), "");
+}
+
+TEST(ByteOrder, SwappersAndGetEndian) {
+  unsigned char b[16];
+  for (int i = 0; i < 16; ++i) b[i] = static_cast<unsigned char>(i);
+  swp2(b, 2);
+  EXPECT_EQ(b[0], 1);
+  EXPECT_EQ(b[3], 2);
+  EXPECT_EQ(b[4], 4);  // beyond the count: untouched
+  for (int i = 0; i < 16; ++i) b[i] = static_cast<unsigned char>(i);
+  swp4(b, 1);
+  EXPECT_EQ(b[0], 3);
+  swp8(b + 8, 1);
+  EXPECT_EQ(b[8], 15);
+  EXPECT_EQ(bsw2b(0x1234), 0x3412);
+
+  for (int i = 0; i < 16; ++i) b[i] = static_cast<unsigned char>(i);
+  swp_any(b, 16, 3);  // odd size: unchanged
+  EXPECT_EQ(b[0], 0);
+  swp_any(b, 7, 6);  // one whole group, one byte left
+  EXPECT_EQ(b[0], 5);
+  EXPECT_EQ(b[5], 0);
+  EXPECT_EQ(b[6], 6);
+
+  for (int i = 0; i < 16; ++i) b[i] = static_cast<unsigned char>(i);
+  EXPECT_EQ(get_endian(b, 1, 16, 0), 0);
+  EXPECT_EQ(b[0], 0);
+  EXPECT_EQ(get_endian(b, 1, 16, 1), 0);
+  EXPECT_EQ(b[0], 15);
+  EXPECT_EQ(b[15], 0);
+  EXPECT_EQ(get_endian(b, 16, 1, 1), 0);
+  EXPECT_EQ(get_endian(b, 2, 6, 1), -1);
+  EXPECT_EQ(b[0], 15);
+}
+
+TEST(ByteOrder, Classification) {
+  const double inf = std::numeric_limits<double>::infinity();
+  const double nan = std::numeric_limits<double>::quiet_NaN();
+  EXPECT_TRUE(myisinf(inf));
+  EXPECT_TRUE(myisinf(-inf));
+  EXPECT_FALSE(myisinf(nan));
+  EXPECT_TRUE(myisnan(nan));
+  EXPECT_FALSE(myisnan(inf));
+  EXPECT_TRUE(myfinite(std::numeric_limits<double>::max()));
+  EXPECT_FALSE(myfinite(nan));
+
+  const float largest = std::numeric_limits<float>::max();  // bits 0x7F7FFFFF
+  EXPECT_TRUE(myisinf4(largest));
+  EXPECT_TRUE(myisinf4(-largest));
+  EXPECT_FALSE(myfinite4(largest));
+  EXPECT_FALSE(myisnan4(largest));
+  EXPECT_TRUE(myfinite4(std::nextafter(largest, 0.0f)));
+  EXPECT_TRUE(myisinf4(std::numeric_limits<float>::infinity()));
+  EXPECT_TRUE(myisnan4(std::numeric_limits<float>::quiet_NaN()));
+  EXPECT_FALSE(myisinf4(1.0f));
+  EXPECT_TRUE(myfinite4(0.0f));
+}
+
+}  // namespace

@@ -1,0 +1,209 @@
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <filesystem>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "raster/buffer_io.h"
+#include "raster/data_file.h"
+#include "raster_fixture.h"
+
+namespace {
+
+using raster_test::ReadFile;
+using raster_test::WriteFile;
+
+class DataFileTest : public raster_test::ScratchDir {};
+
+std::string RandomBytes(size_t n, unsigned seed) {
+  std::mt19937 gen(seed);
+  std::string s(n, '\0');
+  for (auto& c : s) c = static_cast<char>(gen());
+  return s;
+}
+
+// Reads the file through a fixed pseudo-random walk of seeks and reads.
+std::string Walk(DataFile* df, int64_t size) {
+  std::mt19937 gen(7);
+  std::string got;
+  for (int step = 0; step < 300; ++step) {
+    const int64_t at = static_cast<int64_t>(gen() % static_cast<unsigned>(size));
+    if (step % 3 == 0) {
+      EXPECT_EQ(df->seek(at, DataFile::kSeekSet), 0);
+    } else {
+      const int64_t back = std::min<int64_t>(df->tell(), gen() % 50);
+      EXPECT_EQ(df->seek(-back, DataFile::kSeekCurrent), 0);
+    }
+    const int64_t n = std::min<int64_t>(size - df->tell(), gen() % 9000);
+    std::string piece(static_cast<size_t>(n), '\0');
+    EXPECT_EQ(df->read(&piece[0], n), 0);
+    got += piece;
+    got += std::to_string(df->tell());
+  }
+  return got;
+}
+
+TEST_F(DataFileTest, BufferedAndUnbufferedReadsGiveTheSameBytes) {
+  const std::string data = RandomBytes(100003, 1);
+  WriteFile(Path("r"), data);
+  DataFile df;
+  df.set_name(Path("r").c_str());
+  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+  EXPECT_FALSE(df.is_buffered());
+  const std::string reference = Walk(&df, static_cast<int64_t>(data.size()));
+  ASSERT_EQ(df.close(), 0);
+  for (int size : {1, 7, 4096, 65536, 300000}) {
+    SCOPED_TRACE(size);
+    df.set_buffer_size(size);
+    ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+    EXPECT_TRUE(df.is_buffered());
+    EXPECT_EQ(Walk(&df, static_cast<int64_t>(data.size())), reference);
+    std::string all(data.size(), '\0');
+    ASSERT_EQ(df.seek(0, DataFile::kSeekSet), 0);
+    ASSERT_EQ(df.read(&all[0], static_cast<int64_t>(all.size())), 0);
+    EXPECT_EQ(all, data);
+    ASSERT_EQ(df.close(), 0);
+    EXPECT_EQ(df.buffer_size(), 0);  // close drops the buffer
+  }
+}
+
+TEST_F(DataFileTest, BufferedWritesReachTheFileAtSeekAndClose) {
+  const std::string data = RandomBytes(50000, 2);
+  for (int size : {0, 3, 1000, 100000}) {
+    SCOPED_TRACE(size);
+    DataFile df;
+    df.set_name(Path("w").c_str());
+    df.set_buffer_size(size);
+    ASSERT_EQ(df.open(DataFile::kOpenCreate), 0);
+    // Second half first, then the first half in uneven pieces.
+    ASSERT_EQ(df.seek(25000, DataFile::kSeekSet), 0);
+    ASSERT_EQ(df.write(data.data() + 25000, 25000), 0);
+    ASSERT_EQ(df.seek(0, DataFile::kSeekSet), 0);
+    for (int64_t at = 0; at < 25000;) {
+      const int64_t n = std::min<int64_t>(25000 - at, 1 + at % 977);
+      ASSERT_EQ(df.write(data.data() + at, n), 0);
+      at += n;
+      EXPECT_EQ(df.tell(), at);
+    }
+    char c;
+    EXPECT_EQ(df.read(&c, 1), 1);  // open for writing
+    ASSERT_EQ(df.close(), 0);
+    EXPECT_EQ(ReadFile(Path("w")), data);
+  }
+}
+
+TEST_F(DataFileTest, FailuresGiveTheirCodes) {
+  WriteFile(Path("f"), "0123456789");
+  DataFile df;
+  df.set_name(Path("missing").c_str());
+  EXPECT_FALSE(df.exists());
+  EXPECT_EQ(df.open(DataFile::kOpenRead), 9);
+  EXPECT_EQ(df.open(DataFile::kOpenUpdate), 9);
+  df.set_name(Path("f").c_str());
+  EXPECT_TRUE(df.exists());
+  EXPECT_EQ(df.open(7), 1);
+  char buf[16];
+  EXPECT_EQ(df.read(buf, 1), 9);
+  EXPECT_EQ(df.close(), 0);  // closing a closed file
+
+  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+  EXPECT_EQ(df.seek(0, DataFile::kSeekEnd), 1);  // unbuffered: no origin 2
+  EXPECT_EQ(df.seek(-1, DataFile::kSeekSet), 1);
+  EXPECT_EQ(df.write("x", 1), 1);
+  ASSERT_EQ(df.seek(8, DataFile::kSeekSet), 0);
+  EXPECT_EQ(df.read(buf, 3), 4);  // two bytes left
+  ASSERT_EQ(df.close(), 0);
+
+  df.set_buffer_size(4);
+  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+  ASSERT_EQ(df.seek(-3, DataFile::kSeekEnd), 0);
+  EXPECT_EQ(df.tell(), 7);
+  ASSERT_EQ(df.read(buf, 2), 0);
+  EXPECT_EQ(std::string(buf, 2), "78");
+  EXPECT_EQ(df.read(buf, 2), 4);  // the end of the file comes first
+  ASSERT_EQ(df.close(), 0);
+}
+
+TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
+  // A sparse raster of 600000 lines of 1024 FLOAT_COMPLEX samples (4.9 GB).
+  DataFile df;
+  df.set_name(Path("big").c_str());
+  df.pixels_per_line = 1024;
+  df.lines_per_image = 600000;
+  df.row_prefix = 17;
+  df.cell_type = CT_FLOAT_COMPLEX;
+  const int64_t line = 590001;
+  ASSERT_GT(df.line_offset(line), int64_t{1} << 32);
+  std::vector<float> in(2048);
+  for (size_t i = 0; i < in.size(); ++i) in[i] = static_cast<float>(i) - 1000.5f;
+  ASSERT_EQ(df.open(DataFile::kOpenCreate), 0);
+  ASSERT_EQ(df.seek(df.data_size() - 1, DataFile::kSeekSet), 0);
+  ASSERT_EQ(df.write("", 1), 0);
+  BufferIO io(&df);
+  io.first_line = static_cast<int32_t>(line);
+  io.num_lines = 1;
+  io.num_samples = 1024;
+  io.output_type = CT_FLOAT_COMPLEX;
+  ASSERT_EQ(io.writebuffer(reinterpret_cast<const char*>(in.data())), 0);
+  EXPECT_EQ(df.tell(), df.line_offset(line + 1));
+  ASSERT_EQ(df.close(), 0);
+  EXPECT_EQ(static_cast<int64_t>(std::filesystem::file_size(Path("big"))), df.data_size());
+
+  for (int buffered = 0; buffered <= 1; ++buffered) {
+    df.set_buffer_size(buffered ? 65536 : 0);
+    ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+    std::vector<float> out(2048, 0.0f);
+    io.output_type = CT_FLOAT_COMPLEX;
+    ASSERT_EQ(io.readbuffer(reinterpret_cast<char*>(out.data())), 0);
+    EXPECT_EQ(out, in);
+    std::vector<double> wide(2048, 0.0);
+    io.output_type = CT_DOUBLE_COMPLEX;
+    ASSERT_EQ(io.readbuffer(reinterpret_cast<char*>(wide.data())), 0);
+    EXPECT_EQ(std::vector<double>(in.begin(), in.end()), wide);
+    ASSERT_EQ(df.seek(df.line_offset(line) + 17 + 8, DataFile::kSeekSet), 0);
+    float f[2];
+    ASSERT_EQ(df.read(f, 8), 0);
+    EXPECT_EQ(f[0], in[2]);
+    ASSERT_EQ(df.close(), 0);
+  }
+  std::filesystem::remove(Path("big"));
+}
+
+TEST_F(DataFileTest, CopyWritesDataAndHeader) {
+  DataFile df;
+  df.set_name(Path("src").c_str());
+  df.pixels_per_line = 4;
+  df.lines_per_image = 3;
+  df.row_prefix = 2;
+  df.header_offset = 6;
+  df.cell_type = CT_INT16;
+  df.byte_order = 1;
+  const std::string data = RandomBytes(static_cast<size_t>(df.data_size()), 3);  // 36 bytes
+  WriteFile(Path("src"), data + "trailing bytes are not raster data");
+  ASSERT_EQ(df.copy(Path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
+  EXPECT_EQ(ReadFile(Path("dst")), data);
+  ASSERT_EQ(df.copy(Path("dst5").c_str(), 5), 0);
+  EXPECT_EQ(ReadFile(Path("dst5")), data);
+  DataFile copied;
+  ASSERT_EQ(copied.read_hdr(Path("dst").c_str()), 0);
+  EXPECT_EQ(copied.pixels_per_line, 4);
+  EXPECT_EQ(copied.header_offset, 6);
+  EXPECT_EQ(copied.byte_order, 1);
+  EXPECT_EQ(copied.cell_type, CT_INT16);
+
+  EXPECT_EQ(df.copy(Path("x").c_str(), 0), 1);
+  EXPECT_EQ(df.copy(Path("src").c_str(), 10), 1);  // onto itself: refused, source intact
+  EXPECT_EQ(ReadFile(Path("src")).substr(0, data.size()), data);
+  df.lines_per_image = 10;  // longer than the file
+  EXPECT_EQ(df.copy(Path("dst").c_str(), 10), 4);
+
+  DataFile other;
+  df.clone(&other);
+  EXPECT_EQ(other.lines_per_image, 10);
+  EXPECT_EQ(other.row_prefix, 2);
+  EXPECT_TRUE(other.name().empty());
+}
+
+}  // namespace
