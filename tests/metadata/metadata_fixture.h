@@ -1,4 +1,4 @@
-// A scratch directory per test, and small file helpers.
+// A scratch directory per test, and small file utilities.
 #pragma once
 
 #include <gtest/gtest.h>
