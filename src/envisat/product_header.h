@@ -1,0 +1,126 @@
+// Main and specific product headers and data set descriptors of ENVISAT
+// products, read as fixed-size blocks with every value taken at its fixed
+// offset.  The offsets are those of the ASAR product specification; values
+// are scanned only within their own field, so a blank or malformed field
+// gives an empty text or a failed number, never text of a neighbouring line.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+
+// A value's place: offset of its first character in its block, and width.
+struct EnvisatField {
+  size_t offset;
+  size_t width;
+};
+
+constexpr size_t kMphSize = 1247;       // main product header
+constexpr size_t kSphBlockSize = 6099;  // specific header block read after the MPH
+constexpr size_t kDsdRecordSize = 280;
+constexpr size_t kUtcTextWidth = 27;  // "DD-MMM-YYYY hh:mm:ss.uuuuuu"
+
+// Main product header values (offsets from the start of the file).
+constexpr EnvisatField kMphProduct{9, 62};
+constexpr EnvisatField kMphAcquisitionStation{182, 20};
+constexpr EnvisatField kMphProcCenter{217, 6};
+constexpr EnvisatField kMphProcTime{236, kUtcTextWidth};
+constexpr EnvisatField kMphSoftwareVer{279, 14};
+constexpr EnvisatField kMphSensingStart{351, kUtcTextWidth};
+constexpr EnvisatField kMphSensingStop{394, kUtcTextWidth};
+constexpr EnvisatField kMphRelOrbit{493, 6};
+constexpr EnvisatField kMphAbsOrbit{510, 6};
+
+// Image-product specific header values (offsets from the start of the SPH).
+constexpr EnvisatField kSphDescriptor{16, 28};
+constexpr EnvisatField kSphFirstLineTime{135, kUtcTextWidth};
+constexpr EnvisatField kSphLastLineTime{180, kUtcTextWidth};
+constexpr EnvisatField kSphSwath{688, 3};
+constexpr EnvisatField kSphSampleType{724, 8};
+constexpr EnvisatField kSphMds1Polar{772, 3};
+constexpr EnvisatField kSphMds2Polar{795, 3};
+constexpr EnvisatField kSphRangeSpacing{870, 15};
+constexpr EnvisatField kSphAzimuthSpacing{905, 15};
+constexpr EnvisatField kSphLineTimeInterval{943, 15};
+constexpr EnvisatField kSphDataType{1001, 4};
+
+// Data set descriptor values (offsets from the start of the descriptor).
+constexpr EnvisatField kDsdOffset{133, 21};
+constexpr EnvisatField kDsdSize{170, 21};
+constexpr EnvisatField kDsdNumDsr{207, 11};
+constexpr EnvisatField kDsdDsrSize{228, 11};
+
+// Where the extraction's descriptors sit in the SPH block, which differs
+// between wide-swath (WSS) products and all others.
+struct EnvisatDsdLayout {
+  size_t mainProcessing;  // records of 2009 bytes
+  size_t doppler;         // 55
+  size_t chirp;           // 1483
+  size_t antenna;         // 162
+  size_t geolocation;     // 521
+  size_t mds[5];          // 0 where the layout has no such descriptor
+  int mdsSlots;
+};
+constexpr EnvisatDsdLayout kWssDsdLayout{
+    1339, 1619, 1899, 2179, 2459, {3019, 3299, 3579, 3859, 4139}, 5};
+constexpr EnvisatDsdLayout kImageDsdLayout{1619, 1899, 2459, 2739, 3299, {3859, 4139, 0, 0, 0}, 2};
+
+// The first whitespace-delimited token of a field (as a "%Ns" scan limited to
+// the field): "PDHS-K  " gives "PDHS-K", a blank field "".
+std::string EnvisatToken(const char* block, size_t blockSize, EnvisatField field);
+// The field's characters as they stand (for the date texts).
+std::string EnvisatText(const char* block, size_t blockSize, EnvisatField field);
+// A decimal number in the field ("+7.80397e+00<m>", "+0000001625<bytes>");
+// false when the field holds none or lies outside the block.
+bool EnvisatNumber(const char* block, size_t blockSize, EnvisatField field, double* value);
+bool EnvisatInteger(const char* block, size_t blockSize, EnvisatField field, int64_t* value);
+
+// One data set descriptor.  A descriptor whose fields cannot be read, or
+// hold negative values, reads as absent (all zero) with valid false.
+struct EnvisatDataSet {
+  int64_t offset = 0;
+  int64_t size = 0;
+  int64_t numDsr = 0;
+  int64_t dsrSize = 0;
+  bool valid = false;
+  bool present() const { return valid && size > 0; }
+  // True when the data set lies inside a file of `fileSize` bytes and its
+  // records, numDsr of dsrSize bytes, fit inside it.
+  bool fitsIn(int64_t fileSize) const;
+};
+
+// The two header blocks of a product and the values taken from them.
+struct EnvisatHeaders {
+  char mph[kMphSize];
+  char sph[kSphBlockSize];
+  int64_t fileSize = 0;
+
+  // Main product header.
+  std::string product;      // "%62s"
+  std::string productType;  // characters 4 to 6 of the product name
+  std::string acquisitionStation, procCenter, procTime, softwareVer;
+  std::string sensingStart, sensingStop;  // 27-character UTC texts
+  std::string relOrbit, absOrbit;
+
+  // Specific product header (image products).
+  std::string sphDescriptor;                // 28 characters as they stand
+  std::string firstLineTime, lastLineTime;  // 27-character UTC texts
+  std::string swath, sampleType, mds1Polar, mds2Polar, dataType;
+  double rangeSpacing = 0.0, azimuthSpacing = 0.0, lineTimeInterval = 0.0;
+  bool spacingsValid = false;  // all three numbers were read
+
+  // Product type flags (from productType).
+  bool wss = false, aps = false, apm = false, app = false, wsm = false, gm1 = false;
+
+  // Data set descriptor at an offset of the SPH block.
+  EnvisatDataSet dataSet(size_t sphOffset) const;
+  // The layout of this product's descriptors.
+  const EnvisatDsdLayout& layout() const { return wss ? kWssDsdLayout : kImageDsdLayout; }
+  // WSS: the measurement data sets in order up to the first of size 0 (at
+  // most 5); others: the first MDS only (1 or 0).
+  int imageDataSets(EnvisatDataSet out[5]) const;
+};
+
+// Reads the MPH and SPH blocks of a product and its header values.
+// 0; 9 "File not opened!"; 4 "File reading failed!" (short MPH or SPH).
+int read_envisat_headers(const char* path, EnvisatHeaders* headers);
