@@ -22,7 +22,8 @@ int fvlr_main_import_esa(const char* argumentText) {
   using vlr::DriverArgument;
   const std::vector<std::string> args = vlr::ReadDriverArguments(argumentText, kTitle, kModule);
   const std::string parameters = NVLR_UTILITY_Format(
-      "\nINPUT ASA : [ %s ]\nINPUT DORIS : [ %s ]\nINPUT ASA_XCA : [ %s ]\nOUTPUT ROOT NAME : [ %s ]",
+      "\nINPUT ASA : [ %s ]\nINPUT DORIS : [ %s ]\nINPUT ASA_XCA : [ %s ]\nOUTPUT ROOT NAME : [ %s "
+      "]",
       DriverArgument(args, kProduct).c_str(), DriverArgument(args, kDoris).c_str(),
       DriverArgument(args, kXca).c_str(), DriverArgument(args, kOutputRoot).c_str());
   NVLR_UTILITY_WriteStart(args, kTitle, parameters.c_str());

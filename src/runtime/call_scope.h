@@ -32,8 +32,9 @@ class CallScope {
   // at the call-tree level and checks errno.  Returns the code.
   int callee(int code, int line) {
     ckerr_last_code = code;
-    if (code != 0) are_add_report("Called function returned ERROR", ARE_ERROR_CALL_TREE, line,
-                                  function_, module_);
+    if (code != 0)
+      are_add_report("Called function returned ERROR", ARE_ERROR_CALL_TREE, line, function_,
+                     module_);
     are_check(errno, line, function_, module_);
     errno = 0;
     return code;
@@ -123,10 +124,10 @@ class CkBuffer {
 #define VLR_SCOPE(function, module) ::vlr::CallScope vlr_scope_((function), (module), __LINE__)
 // Runs a library call and returns its code from the enclosing function when
 // it failed.
-#define VLR_CALL(expr)                                                  \
-  do {                                                                  \
+#define VLR_CALL(expr)                                                       \
+  do {                                                                       \
     const int vlr_rc_ = vlr_scope_.callee(static_cast<int>(expr), __LINE__); \
-    if (vlr_rc_ != 0) return vlr_rc_;                                   \
+    if (vlr_rc_ != 0) return vlr_rc_;                                        \
   } while (0)
 // Reports a failure of the enclosing function and returns code.
 #define VLR_FAIL(message, code) return vlr_scope_.fail((message), (code), __LINE__)

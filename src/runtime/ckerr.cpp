@@ -48,24 +48,42 @@ CkerrState& state() {
 
 LevelInfo levelInfo(int level) {
   switch (level) {
-    case 0: return {"ERROR", true, true, 0};
-    case 1: return {"WARNING", true, false, 0};
-    case 2: return {"CHECKPOINT", true, false, 0};
-    case 3: return {"ERROR_CALL_TREE", false, false, 0};
-    case 4: return {"CORRECT_FUNCTION_CALL", false, false, 0};
-    case 5: return {"CORRECT_SYSTEM_CALL", false, false, 0};
-    case 6: return {"MESSAGE", true, false, 0};
-    case 7: return {"XCA DOES NOT EXIST", true, true, 1305601};
-    case 8: return {"XCH DOES NOT EXIST", true, true, 1305604};
-    case 9: return {"DORVOR DOES NOT EXIST", true, true, 1305602};
-    case 10: return {"INS DOES NOT EXIST", true, true, 1305603};
-    case 11: return {"DEM DOES NOT COVER WHOLE IMAGE", true, true, 1370882};
-    case 12: return {"DEM DOES NOT EXIST", true, true, 1370883};
-    case 13: return {"IMAGE DOES NOT EXIST", true, true, 1305605};
-    case 19: return {"BURST SYNC ERROR", true, true, 1370881};
-    case 20: return {"OVERLAP ERROR", true, true, 1370884};
-    case 21: return {"FILE I/O ERROR", true, true, 1305606};
-    default: return {"", false, false, 0};
+    case 0:
+      return {"ERROR", true, true, 0};
+    case 1:
+      return {"WARNING", true, false, 0};
+    case 2:
+      return {"CHECKPOINT", true, false, 0};
+    case 3:
+      return {"ERROR_CALL_TREE", false, false, 0};
+    case 4:
+      return {"CORRECT_FUNCTION_CALL", false, false, 0};
+    case 5:
+      return {"CORRECT_SYSTEM_CALL", false, false, 0};
+    case 6:
+      return {"MESSAGE", true, false, 0};
+    case 7:
+      return {"XCA DOES NOT EXIST", true, true, 1305601};
+    case 8:
+      return {"XCH DOES NOT EXIST", true, true, 1305604};
+    case 9:
+      return {"DORVOR DOES NOT EXIST", true, true, 1305602};
+    case 10:
+      return {"INS DOES NOT EXIST", true, true, 1305603};
+    case 11:
+      return {"DEM DOES NOT COVER WHOLE IMAGE", true, true, 1370882};
+    case 12:
+      return {"DEM DOES NOT EXIST", true, true, 1370883};
+    case 13:
+      return {"IMAGE DOES NOT EXIST", true, true, 1305605};
+    case 19:
+      return {"BURST SYNC ERROR", true, true, 1370881};
+    case 20:
+      return {"OVERLAP ERROR", true, true, 1370884};
+    case 21:
+      return {"FILE I/O ERROR", true, true, 1305606};
+    default:
+      return {"", false, false, 0};
   }
 }
 
@@ -108,8 +126,12 @@ void interrupted() {
 
 int ckerr_last_code = 0;
 
-const char* are_level_name(int level) { return levelInfo(level).name; }
-int are_level_exit_code(int level) { return levelInfo(level).exitCode; }
+const char* are_level_name(int level) {
+  return levelInfo(level).name;
+}
+int are_level_exit_code(int level) {
+  return levelInfo(level).exitCode;
+}
 
 int init_report(int /*mode*/, const char* /*title*/, int level) {
   CkerrState& s = state();
@@ -124,18 +146,25 @@ int init_report(int /*mode*/, const char* /*title*/, int level) {
   return 0;
 }
 
-int set_flg_report(int level) { return state().reportLevel = level; }
-int ckflg_report() { return state().reportLevel; }
-int ckcnt_report() { return state().reportCount; }
-int exit_report() { return 0; }
+int set_flg_report(int level) {
+  return state().reportLevel = level;
+}
+int ckflg_report() {
+  return state().reportLevel;
+}
+int ckcnt_report() {
+  return state().reportCount;
+}
+int exit_report() {
+  return 0;
+}
 
 int are_add_report(const char* message, int level, int line, const char* function,
                    const char* file) {
   CkerrState& s = state();
   char record[2048];
   int len = std::snprintf(record, sizeof record, "%s - line : %d - function : %s - file : %s",
-                          message ? message : "", line, function ? function : "",
-                          file ? file : "");
+                          message ? message : "", line, function ? function : "", file ? file : "");
   if (s.reportLevel < 1 || s.reportLevel > 3) return len;
   const LevelInfo info = levelInfo(level);
   if (info.trace) {
@@ -155,7 +184,8 @@ int are_add_report(const char* message, int level, int line, const char* functio
 }
 
 void are_check(int error_number, int line, const char* function, const char* file) {
-  if (error_number != 0) are_add_report(std::strerror(error_number), ARE_ERROR, line, function, file);
+  if (error_number != 0)
+    are_add_report(std::strerror(error_number), ARE_ERROR, line, function, file);
 }
 
 int init_ckerr_locking() {
@@ -188,10 +218,18 @@ void deccurdep() {
   if (s.depth > 0) s.depth--;
 }
 
-int ckflg_ckerr() { return state().tracking; }
-int ckerr_depth() { return state().depth; }
-const uint16_t* ckerr_coordinates() { return state().coordinates; }
-int ckerr_count() { return static_cast<int>(state().table.size()); }
+int ckflg_ckerr() {
+  return state().tracking;
+}
+int ckerr_depth() {
+  return state().depth;
+}
+const uint16_t* ckerr_coordinates() {
+  return state().coordinates;
+}
+int ckerr_count() {
+  return static_cast<int>(state().table.size());
+}
 const CkerrEntry* ckerr_entry(int index) {
   CkerrState& s = state();
   if (index < 0 || index >= static_cast<int>(s.table.size())) return nullptr;
@@ -203,7 +241,8 @@ int exit_ckerr() {
   if (!s.tracking) return 0;
   if (!s.table.empty()) {
     std::fprintf(stderr, "\nPotential memory leaks detected!\n");
-    std::fprintf(stderr, "\n%d buffers left to be de-allocated.!\n", static_cast<int>(s.table.size()));
+    std::fprintf(stderr, "\n%d buffers left to be de-allocated.!\n",
+                 static_cast<int>(s.table.size()));
     std::fprintf(stderr, "--------------------------------\n");
     std::fprintf(stderr, "ML call graph coordinates: \n");
     for (const CkerrEntry& e : s.table) {

@@ -29,13 +29,20 @@ constexpr int kConfigurationLineBuffer = 512;
 
 // Names of the configuration lines, in file order.
 const char* const kConfigurationNames[kConfigurationLines] = {
-    "VELORAN_KEY_FILES_DIR",         "VELORAN_MANDATORY_DIR",
-    "VELORAN_WORKING_DIR",           "VELORAN_EXE_DIR",
-    "VELORAN_MAP_FILES_DIR",         "VELORAN_CEOS_DES_FILES_DIR",
-    "VELORAN_GCP_DATABASE_DIR",      "VELORAN_TESSAL_DES_FILES_DIR",
-    "VELORAN_OTHER_01_DES_FILES_DIR", "VELORAN_XML_SCHEMA_DES_FILES_DIR",
-    "VELORAN_DEFAULT_BYTE_ORDER",    "VELORAN_TRACING",
-    "VELORAN_CONFIGURATION_LINE_13", "VELORAN_DUMMY_VALUE",
+    "VELORAN_KEY_FILES_DIR",
+    "VELORAN_MANDATORY_DIR",
+    "VELORAN_WORKING_DIR",
+    "VELORAN_EXE_DIR",
+    "VELORAN_MAP_FILES_DIR",
+    "VELORAN_CEOS_DES_FILES_DIR",
+    "VELORAN_GCP_DATABASE_DIR",
+    "VELORAN_TESSAL_DES_FILES_DIR",
+    "VELORAN_OTHER_01_DES_FILES_DIR",
+    "VELORAN_XML_SCHEMA_DES_FILES_DIR",
+    "VELORAN_DEFAULT_BYTE_ORDER",
+    "VELORAN_TRACING",
+    "VELORAN_CONFIGURATION_LINE_13",
+    "VELORAN_DUMMY_VALUE",
 };
 
 std::string withSlash(const char* dir) {
@@ -58,8 +65,7 @@ bool readConfigurationLine(FILE* f, int number, const std::string& path, std::st
     out.pop_back();
   } else if (out.size() == kConfigurationLineBuffer - 1 && std::fgetc(f) != EOF) {
     std::fclose(f);
-    const std::string extra =
-        NVLR_UTILITY_Format("%s line %d is too long", path.c_str(), number);
+    const std::string extra = NVLR_UTILITY_Format("%s line %d is too long", path.c_str(), number);
     NVLR_UTILITY_RaiseError(vlr::kCodeNoInitDir, kModule, __LINE__, extra.c_str());
   }
   // A single stray character behind a closing separator (such as the
@@ -78,7 +84,9 @@ SuiteState& suite() {
   return *s;
 }
 
-std::string workingDir() { return NVLR_UTILITY_EnvValue("VELORAN_WORKING_DIR"); }
+std::string workingDir() {
+  return NVLR_UTILITY_EnvValue("VELORAN_WORKING_DIR");
+}
 
 }  // namespace vlr_detail
 
@@ -189,7 +197,9 @@ std::string NVLR_UTILITY_EnvValue(const char* name) {
   return v;
 }
 
-bool NVLR_UTILITY_IsEnvironmentReady() { return suite().tableReady; }
+bool NVLR_UTILITY_IsEnvironmentReady() {
+  return suite().tableReady;
+}
 
 void NVLR_UTILITY_ReleaseEnvironment() {
   auto& s = suite();
@@ -198,15 +208,29 @@ void NVLR_UTILITY_ReleaseEnvironment() {
   s.tableReady = false;
 }
 
-float NVLR_UTILITY_NoDataFloat() { return suite().noDataFloat; }
-double NVLR_UTILITY_NoDataDouble() { return suite().noDataDouble; }
-const std::string& NVLR_UTILITY_WorkingFile() { return suite().workingFile; }
-const std::string& NVLR_UTILITY_Identification() { return suite().identification; }
+float NVLR_UTILITY_NoDataFloat() {
+  return suite().noDataFloat;
+}
+double NVLR_UTILITY_NoDataDouble() {
+  return suite().noDataDouble;
+}
+const std::string& NVLR_UTILITY_WorkingFile() {
+  return suite().workingFile;
+}
+const std::string& NVLR_UTILITY_Identification() {
+  return suite().identification;
+}
 
-void NVLR_UTILITY_SetCommandString(const char* command) { suite().command = command ? command : ""; }
-const char* NVLR_UTILITY_CommandString() { return suite().command.c_str(); }
+void NVLR_UTILITY_SetCommandString(const char* command) {
+  suite().command = command ? command : "";
+}
+const char* NVLR_UTILITY_CommandString() {
+  return suite().command.c_str();
+}
 
-void NVLR_UTILITY_SetErrorHook(VlrErrorHook hook) { suite().hook = hook; }
+void NVLR_UTILITY_SetErrorHook(VlrErrorHook hook) {
+  suite().hook = hook;
+}
 
 void NVLR_UTILITY_ResetForTesting() {
   auto& s = suite();

@@ -47,7 +47,9 @@ struct Split {
   int index;
 };
 
-Split split(int code) { return {code / vlr::kGroupSize, code % vlr::kGroupSize - 1}; }
+Split split(int code) {
+  return {code / vlr::kGroupSize, code % vlr::kGroupSize - 1};
+}
 
 }  // namespace
 
@@ -70,7 +72,8 @@ ErrorCatalog ParseErrorCatalog(const std::vector<std::string>& lines) {
       if (i + 1 >= total) break;
       long m = parseCount(lines[i + 1]);
       if (m > total - (i + 2)) m = total - (i + 2);
-      for (long k = 0; k < m; ++k) group.texts.push_back(lines[i + 2 + k].substr(0, kCatalogTextMax));
+      for (long k = 0; k < m; ++k)
+        group.texts.push_back(lines[i + 2 + k].substr(0, kCatalogTextMax));
       break;
     }
   }

@@ -2,6 +2,7 @@
 #include "runtime/file_utility.h"
 
 #include <spawn.h>
+#include <strings.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <sys/types.h>
@@ -12,7 +13,6 @@
 #include <cstdio>
 #include <cstring>
 #include <ctime>
-#include <strings.h>
 
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
@@ -31,7 +31,8 @@ constexpr const char* kDeleteProgram = "main_delete_file";
 const char* const kHeaderSuffixes[] = {"_hdr", ".sml", "_par", "_map", ".orb", "_orb_hdr"};
 
 bool endsWithExact(const std::string& s, const std::string& suffix) {
-  return s.size() > suffix.size() && s.compare(s.size() - suffix.size(), suffix.size(), suffix) == 0;
+  return s.size() > suffix.size() &&
+         s.compare(s.size() - suffix.size(), suffix.size(), suffix) == 0;
 }
 
 struct LocalNow {
@@ -156,12 +157,18 @@ uint64_t NVLR_UTILITY_MemoryStatus() {
     char line[256];
     while (std::fgets(line, sizeof line, f)) {
       unsigned long long v = 0;
-      if (std::sscanf(line, "MemTotal: %llu", &v) == 1) total = v * 1024;
-      else if (std::sscanf(line, "MemAvailable: %llu", &v) == 1) avail = v * 1024;
-      else if (std::sscanf(line, "SwapTotal: %llu", &v) == 1) swapTotal = v * 1024;
-      else if (std::sscanf(line, "SwapFree: %llu", &v) == 1) swapFree = v * 1024;
-      else if (std::sscanf(line, "CommitLimit: %llu", &v) == 1) commitLimit = v * 1024;
-      else if (std::sscanf(line, "Committed_AS: %llu", &v) == 1) committed = v * 1024;
+      if (std::sscanf(line, "MemTotal: %llu", &v) == 1)
+        total = v * 1024;
+      else if (std::sscanf(line, "MemAvailable: %llu", &v) == 1)
+        avail = v * 1024;
+      else if (std::sscanf(line, "SwapTotal: %llu", &v) == 1)
+        swapTotal = v * 1024;
+      else if (std::sscanf(line, "SwapFree: %llu", &v) == 1)
+        swapFree = v * 1024;
+      else if (std::sscanf(line, "CommitLimit: %llu", &v) == 1)
+        commitLimit = v * 1024;
+      else if (std::sscanf(line, "Committed_AS: %llu", &v) == 1)
+        committed = v * 1024;
     }
     std::fclose(f);
   }

@@ -35,7 +35,8 @@ std::vector<std::string> NVLR_UTILITY_ReadListFile(const char* path) {
     }
   }
   FILE* f = std::fopen(name.c_str(), "r");
-  if (f == nullptr) NVLR_UTILITY_RaiseError(vlr::kCodeFileNotFound, kModule, __LINE__, name.c_str());
+  if (f == nullptr)
+    NVLR_UTILITY_RaiseError(vlr::kCodeFileNotFound, kModule, __LINE__, name.c_str());
   std::vector<std::string> lines;
   std::string line;
   bool tooLong = false;
@@ -76,7 +77,8 @@ std::vector<std::string> NVLR_UTILITY_SplitCommand(const char* text) {
   const size_t b = path.find_first_not_of(" \t");
   path = b == std::string::npos ? "" : path.substr(b, path.find_last_not_of(" \t\r\n") - b + 1);
   std::vector<std::string> lines = NVLR_UTILITY_ReadListFile(path.c_str());
-  if (lines.size() < 2) NVLR_UTILITY_RaiseError(vlr::kCodeFileNotFound, kModule, __LINE__, given.c_str());
+  if (lines.size() < 2)
+    NVLR_UTILITY_RaiseError(vlr::kCodeFileNotFound, kModule, __LINE__, given.c_str());
   lines.erase(lines.begin());
   return lines;
 }

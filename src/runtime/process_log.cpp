@@ -35,7 +35,9 @@ bool vprint(FILE* f, const char* format, va_list args) {
   return !std::ferror(f);
 }
 
-std::string stars() { return std::string(160, '*'); }
+std::string stars() {
+  return std::string(160, '*');
+}
 
 // Writes text to the process log, then to the trace.
 void logAndTrace(const std::string& text) {
@@ -77,7 +79,9 @@ bool NVLR_UTILITY_TracePrint(const char* format, ...) {
   return ok;
 }
 
-bool NVLR_UTILITY_IsTraceOn() { return suite().traceOn; }
+bool NVLR_UTILITY_IsTraceOn() {
+  return suite().traceOn;
+}
 
 void NVLR_UTILITY_FlushTrace() {
   auto& s = suite();
@@ -94,7 +98,9 @@ void NVLR_UTILITY_SetProcessLabel(const char* title) {
   suite().processLabel = label;
 }
 
-const std::string& NVLR_UTILITY_ProcessLabel() { return suite().processLabel; }
+const std::string& NVLR_UTILITY_ProcessLabel() {
+  return suite().processLabel;
+}
 
 std::string NVLR_UTILITY_LocalTimeText() {
   const std::time_t now = std::time(nullptr);
@@ -122,7 +128,8 @@ void NVLR_UTILITY_WriteStart(const std::vector<std::string>& arguments, const ch
     text += parameterText;
   } else {
     for (size_t i = 0; i < arguments.size(); ++i) {
-      text += NVLR_UTILITY_Format(" Parameter %d (%s)\n", static_cast<int>(i), arguments[i].c_str());
+      text +=
+          NVLR_UTILITY_Format(" Parameter %d (%s)\n", static_cast<int>(i), arguments[i].c_str());
     }
   }
   text += "\n" + stars() + "\n\n";

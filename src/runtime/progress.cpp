@@ -1,12 +1,12 @@
 // Progress protocol: the working file holds the percent and a message.
 #include "runtime/progress.h"
 
+#include <unistd.h>
+
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <string>
-
-#include <unistd.h>
 
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
@@ -41,7 +41,8 @@ void traceStreamState(FILE* f, int attempt) {
   if (!NVLR_UTILITY_IsTraceOn()) return;
   std::string words = " File ";
   if (f != nullptr && std::feof(f)) words += "End of file reached ";
-  if (f != nullptr && std::ferror(f)) words += "| A possibly recoverable formatting or conversion error ";
+  if (f != nullptr && std::ferror(f))
+    words += "| A possibly recoverable formatting or conversion error ";
   if (f == nullptr) words += "| A severe I/O error or unknown state";
   NVLR_UTILITY_TracePrint("%s attempt open : %d\n", words.c_str(), attempt);
 }

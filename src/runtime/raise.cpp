@@ -1,13 +1,13 @@
 // The raise sequence, the warning sequence and the error recorder.
 #include "runtime/raise.h"
 
+#include <unistd.h>
+
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string>
-
-#include <unistd.h>
 
 #include "runtime/environment.h"
 #include "runtime/error_catalog.h"
@@ -50,7 +50,9 @@ std::string readLine(FILE* f) {
 
 // Opening fails on Linux for lasting reasons (missing file, permissions);
 // only transient failures are worth the host's retry schedule.
-bool transient(int error) { return error == EINTR || error == EAGAIN || error == EBUSY || error == ETXTBSY; }
+bool transient(int error) {
+  return error == EINTR || error == EAGAIN || error == EBUSY || error == ETXTBSY;
+}
 
 }  // namespace
 
@@ -81,8 +83,9 @@ std::string VlrErrorExtraLines(int code, const char* const* texts, int count) {
       text += ".sml";
     }
     const int len = static_cast<int>(text.size());
-    NVLR_UTILITY_TracePrint("(aTotLen + aLen) [%d]\n(CVLR_MAX_LEN_IN_ERROR * CVLR_MAX_LINE_IN_ERROR) [%d]\n",
-                            total + len, maxTotal);
+    NVLR_UTILITY_TracePrint(
+        "(aTotLen + aLen) [%d]\n(CVLR_MAX_LEN_IN_ERROR * CVLR_MAX_LINE_IN_ERROR) [%d]\n",
+        total + len, maxTotal);
     if (len <= CVLR_MAX_LEN_IN_ERROR) {
       if (total + len < maxTotal) {
         out += text + "\n";
@@ -185,9 +188,10 @@ void NVLR_UTILITY_RaiseWarning(int code, const char* file, int line, const char*
   std::string title, text;
   NVLR_UTILITY_GetErrorTexts(s.warnings, code, title, text);
   const char* extraText = extra ? extra : "";
-  NVLR_UTILITY_TracePrint("\nWARNING : %s [%s] (%s) \n %s   %s\n    FILE=%s   LINE=%d  (errno = %d)",
-                          title.c_str(), text.c_str(), extraText, s.processLabel.c_str(),
-                          s.identification.c_str(), file ? file : "", line, errno);
+  NVLR_UTILITY_TracePrint(
+      "\nWARNING : %s [%s] (%s) \n %s   %s\n    FILE=%s   LINE=%d  (errno = %d)", title.c_str(),
+      text.c_str(), extraText, s.processLabel.c_str(), s.identification.c_str(), file ? file : "",
+      line, errno);
   NVLR_UTILITY_LogPrint("\n\nWARNING : [ERROR ID : %d] %s [%s]\n  %s \n\n", code, title.c_str(),
                         text.c_str(), extraText);
 }

@@ -42,8 +42,7 @@ std::string NVLR_UTILITY_RecordError(int code, const char* extra1, const char* e
 // The lines the recorder writes for the extra texts (48 x 3 layout).
 std::string VlrErrorExtraLines(int code, const char* const* texts, int count);
 
-[[noreturn]] void NVLR_UTILITY_RaiseError(int code, const char* file, int line,
-                                          const char* extra);
+[[noreturn]] void NVLR_UTILITY_RaiseError(int code, const char* file, int line, const char* extra);
 void NVLR_UTILITY_RaiseWarning(int code, const char* file, int line, const char* extra);
 
 // Ends the process with the exit status of code (see ExitStatusFor).
