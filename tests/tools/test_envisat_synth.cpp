@@ -169,6 +169,44 @@ TEST_F(SynthTiny, CornersLieAtTheRangeAndZeroDopplerOfTheStateVector) {
   }
 }
 
+TEST(Synth, CheckerboardPowerFollowsTheTruthDefinition) {
+  const SynthRun r = run_synth("--orbit kepler --pattern checkerboard --seed 3");
+  ASSERT_EQ(r.exit_code, 0);
+  const std::vector<uint8_t> f = read_file(r.product);
+  const Params& t = r.truth;
+  const double start = num(t, "Scene", "SensingStart");
+  const double fs = num(t, "Scene", "RangeSamplingRate");
+  const double near1 = num(t, "SubSwath1", "NearRangeTime");
+  const double az_cell = num(t, "Pattern", "AzCell"), rg_cell = num(t, "Pattern", "RgCell");
+  const double scale = num(t, "Pattern", "Scale");
+  const int lpb = std::stoi(t.at("Scene").at("LinesPerBurst"));
+  double sum[2] = {0, 0}, count[2] = {0, 0};
+  for (int k = 0; k < 5; ++k) {
+    const Dsd d = dsd(f, 7 + k);
+    const double near = num(t, ("SubSwath" + std::to_string(k + 1)).c_str(), "NearRangeTime");
+    const long long n = (d.dsr - 17) / 4;
+    for (long long r = 0; r < d.num; ++r) {
+      const uint8_t* line = &f[d.offset + r * d.dsr];
+      const int i = static_cast<int>(r % lpb);
+      const double taper = std::pow(std::sin(M_PI * (i + 0.5) / lpb), 2);
+      const long a = static_cast<long>(std::floor((mjd_time(line) - start) / az_cell));
+      for (long long s = 0; s < n; ++s) {
+        const long c = static_cast<long>(std::floor((near - near1 + s / fs) / rg_cell));
+        const uint8_t* q = line + 17 + 4 * s;
+        const double p = double(be16(q)) * be16(q) + double(be16(q + 2)) * be16(q + 2);
+        const int high = (a + c) % 2 == 0;
+        sum[high] += p / (2 * scale * scale * taper);
+        count[high] += 1;
+      }
+    }
+  }
+  ASSERT_GT(count[0], 1000);
+  ASSERT_GT(count[1], 1000);
+  EXPECT_NEAR(sum[1] / count[1], num(t, "Pattern", "High"), 0.05);
+  EXPECT_NEAR(sum[0] / count[0], num(t, "Pattern", "Low"), 0.0125);
+  remove_run(r);
+}
+
 TEST(Synth, SameSeedSameBytesOtherSeedOtherSpeckle) {
   const SynthRun a = run_synth("--orbit kepler --seed 5");
   const SynthRun b = run_synth("--orbit kepler --seed 5");

@@ -567,6 +567,11 @@ bool write_orbit(const Scene& s, std::string* error) {
     std::error_code ec;
     std::filesystem::copy_file(s.orbit_source, path_in(s, s.orbit_name),
                                std::filesystem::copy_options::overwrite_existing, ec);
+    // A read-only original stays writable in the copy, so that a later run
+    // into the same folder can replace it.
+    if (!ec)
+      std::filesystem::permissions(path_in(s, s.orbit_name), std::filesystem::perms::owner_write,
+                                   std::filesystem::perm_options::add, ec);
     if (ec) *error = "cannot copy the orbit file: " + ec.message();
     return !ec;
   }
