@@ -3,9 +3,10 @@
 //   bench_bufferio make FILE [MiB]   writes a big-endian SHORT_COMPLEX raster
 //                                    of about MiB mebibytes (default 1024)
 //                                    with 17-byte line prefixes, and its header
-//   bench_bufferio read FILE [BYTES] reads it line by line into FLOAT_COMPLEX,
-//                                    through a read buffer of BYTES bytes
-//                                    (default 0: unbuffered)
+//   bench_bufferio read FILE [BYTES] reads it line by line into FLOAT_COMPLEX;
+//                                    with BYTES the file is opened first with
+//                                    a read buffer of that size (0:
+//                                    unbuffered), else BufferIO opens it
 //
 // The read prints a checksum so that the work cannot be skipped.
 #include <cstdio>
@@ -49,11 +50,13 @@ int Make(const char* name, long mebibytes) {
   return 0;
 }
 
-int Read(const char* name, int buffer) {
+int Read(const char* name, const char* buffer) {
   DataFile df;
   if (df.read_hdr(name) != 0) return 1;
-  df.set_buffer_size(buffer);
-  if (df.open(DataFile::kOpenRead) != 0) return 1;
+  if (buffer != nullptr) {
+    df.set_buffer_size(std::atoi(buffer));
+    if (df.open(DataFile::kOpenRead) != 0) return 1;
+  }
   BufferIO io(&df);
   io.first_sample = 0;
   io.num_samples = df.pixels_per_line;
@@ -78,7 +81,7 @@ int main(int argc, char** argv) {
     return Make(argv[2], argc >= 4 ? std::atol(argv[3]) : 1024);
   }
   if (argc >= 3 && std::strcmp(argv[1], "read") == 0) {
-    return Read(argv[2], argc >= 4 ? std::atoi(argv[3]) : 0);
+    return Read(argv[2], argc >= 4 ? argv[3] : nullptr);
   }
   std::fprintf(stderr, "usage: %s make FILE [MiB] | read FILE [BYTES]\n", argv[0]);
   return 2;

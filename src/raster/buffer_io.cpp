@@ -15,6 +15,10 @@ constexpr const char* kModule = "bufferio";
 // the caller's line, large enough to keep the per-call cost negligible.
 constexpr int64_t kChunkBytes = 64 * 1024;
 
+// Read buffer given to a file that a read opens itself, when its user set
+// none: line after line, the buffer saves one system call per line.
+constexpr int kDefaultReadBuffer = 1 << 20;
+
 bool IsTransferType(int code) {
   return code >= 0 && code <= 7;
 }
@@ -23,7 +27,9 @@ bool IsTransferType(int code) {
 
 int64_t BufferIO::window_bytes() const {
   if (!IsTransferType(output_type) || num_lines < 0 || num_samples < 0) return 0;
-  return int64_t{num_lines} * num_samples * cell_type_size(output_type);
+  const int64_t line = int64_t{num_samples} * cell_type_size(output_type);
+  if (num_lines > 0 && line > INT64_MAX / num_lines) return INT64_MAX;
+  return num_lines * line;
 }
 
 bool BufferIO::must_swap() const {
@@ -47,6 +53,11 @@ int BufferIO::check_window(Transfer transfer) const {
   return 0;
 }
 
+int BufferIO::open_for_reading() {
+  if (file->buffer_size() == 0) file->set_buffer_size(kDefaultReadBuffer);
+  return file->open(DataFile::kOpenRead);
+}
+
 int BufferIO::readprefix(char* out) {
   VLR_SCOPE("BufferIO::readprefix", kModule);
   VLR_CALL(transfer_prefix(out, nullptr));
@@ -66,9 +77,7 @@ int BufferIO::transfer_prefix(char* out, const char* in) {
   if (check_window(kPrefix) != 0 || (out == nullptr && in == nullptr && num_lines > 0)) {
     VLR_FAIL("Invalid raster window!", vlr::kLibInconsistent);
   }
-  if (!file->is_open()) {
-    VLR_CALL(file->open(reading ? DataFile::kOpenRead : DataFile::kOpenCreate));
-  }
+  if (!file->is_open()) VLR_CALL(reading ? open_for_reading() : file->open(DataFile::kOpenCreate));
   const int64_t prefix = file->row_prefix;
   for (int32_t k = 0; k < num_lines; ++k) {
     VLR_CALL(file->seek(file->line_offset(first_line + k), DataFile::kSeekSet));
@@ -95,7 +104,7 @@ int BufferIO::readbuffer(char* out) {
   if (check_window(kRead) != 0 || (out == nullptr && window_bytes() > 0)) {
     VLR_FAIL("Invalid raster window!", vlr::kLibInconsistent);
   }
-  if (!file->is_open()) VLR_CALL(file->open(DataFile::kOpenRead));
+  if (!file->is_open()) VLR_CALL(open_for_reading());
   const int in_type = file->cell_type;
   const int64_t in_size = cell_type_size(in_type);
   const int64_t out_size = cell_type_size(output_type);

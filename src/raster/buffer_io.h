@@ -29,7 +29,9 @@ class BufferIO {
   int32_t output_type = 0;  // cell type of the caller's samples
 
   // The RowPrefix bytes of each line of the window, one after another, as
-  // they are stored (never swapped).  Opens the file for reading if closed.
+  // they are stored (never swapped).  Opens the file for reading if closed
+  // (reads that open the file give it a 1 MiB read buffer unless a buffer
+  // size was set).
   int readprefix(char* out);
   // Stores the RowPrefix bytes of each line of the window from `in`.  Opens
   // the file for writing (created) if closed.
@@ -45,7 +47,8 @@ class BufferIO {
   int writebuffer(const char* in);
 
   // Bytes of the caller's side of the window: num_lines x num_samples x the
-  // output element size (0 for an invalid output type).
+  // output element size (0 for an invalid output type, INT64_MAX when the
+  // product does not fit).
   int64_t window_bytes() const;
 
  private:
@@ -53,6 +56,7 @@ class BufferIO {
   int check_window(Transfer transfer) const;
   bool must_swap() const;
   int transfer_prefix(char* out, const char* in);
+  int open_for_reading();
 
   std::vector<unsigned char> scratch_;  // one conversion chunk
 };

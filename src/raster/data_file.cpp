@@ -18,6 +18,9 @@ constexpr const char* kNotOpened = "File not opened!";
 constexpr const char* kReadFailed = "File reading failed!";
 constexpr const char* kWriteFailed = "File writing failed!";
 
+// Smallest refill of a read buffer.
+constexpr int64_t kMinRefill = 16 * 1024;
+
 // Largest single read or write handed to the system at once.
 constexpr int64_t kMaxTransfer = int64_t{1} << 30;
 
@@ -63,7 +66,6 @@ bool DataFile::exists() const {
 
 int DataFile::open(int mode) {
   VLR_SCOPE("DataFile::open", kModule);
-  if (is_open()) VLR_CALL(close());
   int flags = 0;
   int internal = kModeRead;
   switch (mode) {
@@ -85,6 +87,7 @@ int DataFile::open(int mode) {
     default:
       VLR_FAIL("Unknown file open mode!", vlr::kLibInconsistent);
   }
+  if (is_open()) VLR_CALL(close());
   if (name_.empty()) VLR_FAIL(kNotOpened, vlr::kLibOpen);
   const int fd = ::open(name_.c_str(), flags | O_CLOEXEC, 0666);
   if (fd < 0) {
@@ -98,11 +101,18 @@ int DataFile::open(int mode) {
   }
   fd_ = fd;
   mode_ = internal;
+  reset_position();
+  return 0;
+}
+
+void DataFile::reset_position() {
   position_ = 0;
   buffer_offset_ = 0;
   cursor_ = 0;
   valid_ = 0;
-  return 0;
+  fill_start_ = 0;
+  fill_end_ = 0;
+  readahead_ = 0;
 }
 
 int DataFile::flush() {
@@ -125,10 +135,7 @@ int DataFile::close() {
   errno = 0;
   fd_ = -1;
   mode_ = kModeRead;
-  position_ = 0;
-  buffer_offset_ = 0;
-  cursor_ = 0;
-  valid_ = 0;
+  reset_position();
   if (rc != 0) VLR_FAIL(kWriteFailed, vlr::kLibWrite);
   return 0;
 }
@@ -212,6 +219,32 @@ int DataFile::write_direct(const unsigned char* in, int64_t offset, int64_t n) {
   return 0;
 }
 
+// Moves the read buffer to the current position and fills it with at least
+// `need` bytes where the file has them.  Reading on from the last fill (or
+// less than a buffer beyond it, as when line prefixes are skipped) doubles
+// the amount read each time up to the buffer size; a jump backwards or far
+// ahead starts small again, so that scattered reads do not pull whole
+// buffers.
+int DataFile::refill(int64_t need) {
+  const int64_t size = static_cast<int64_t>(buffer_.size());
+  const int64_t at = buffer_offset_ + cursor_;
+  const int64_t smallest = std::min(size, kMinRefill);
+  if (at >= fill_start_ && at - fill_end_ <= size) {
+    readahead_ = std::min(size, std::max(2 * readahead_, smallest));
+  } else {
+    readahead_ = smallest;
+  }
+  buffer_offset_ = at;
+  cursor_ = 0;
+  valid_ = 0;
+  int64_t got = 0;
+  const int rc = read_direct(buffer_.data(), at, std::min(size, std::max(need, readahead_)), &got);
+  valid_ = got;
+  fill_start_ = at;
+  fill_end_ = at + got;
+  return rc;
+}
+
 int DataFile::read_buffered(unsigned char* out, int64_t n) {
   const int64_t size = static_cast<int64_t>(buffer_.size());
   while (n > 0) {
@@ -224,20 +257,17 @@ int DataFile::read_buffered(unsigned char* out, int64_t n) {
       n -= take;
       continue;
     }
-    // Buffer used up: move it to the current position.
-    buffer_offset_ += cursor_;
-    cursor_ = 0;
-    valid_ = 0;
-    int64_t got = 0;
     if (n >= size) {
       // A request of a buffer or more goes straight to the caller.
+      buffer_offset_ += cursor_;
+      cursor_ = 0;
+      valid_ = 0;
+      int64_t got = 0;
       if (read_direct(out, buffer_offset_, n, &got) != 0) return vlr::kLibRead;
       buffer_offset_ += got;
       return got == n ? 0 : vlr::kLibRead;
     }
-    if (read_direct(buffer_.data(), buffer_offset_, size, &got) != 0) return vlr::kLibRead;
-    if (got == 0) return vlr::kLibRead;  // end of file before the request was served
-    valid_ = got;
+    if (refill(n) != 0 || valid_ == 0) return vlr::kLibRead;  // end of file comes first
   }
   return 0;
 }
@@ -268,14 +298,7 @@ int DataFile::read_view(int64_t n, const unsigned char** view) {
   VLR_SCOPE("DataFile::read_view", kModule);
   if (valid_ - cursor_ < n) {
     // Refill from the current position so that the n bytes are contiguous.
-    buffer_offset_ += cursor_;
-    cursor_ = 0;
-    valid_ = 0;
-    int64_t got = 0;
-    const int rc =
-        read_direct(buffer_.data(), buffer_offset_, static_cast<int64_t>(buffer_.size()), &got);
-    valid_ = got;
-    if (rc != 0 || got < n) VLR_FAIL(kReadFailed, vlr::kLibRead);
+    if (refill(n) != 0 || valid_ < n) VLR_FAIL(kReadFailed, vlr::kLibRead);
   }
   *view = buffer_.data() + cursor_;
   cursor_ += n;

@@ -128,10 +128,12 @@ class DataFile : public GeneralSAR_Base {
   enum InternalMode { kModeRead = 0, kModeWrite = 1, kModeUpdate = 2 };
 
   int read_legacy_hdr();
+  void reset_position();
   int flush();
   int read_direct(unsigned char* out, int64_t offset, int64_t n, int64_t* got);
   int write_direct(const unsigned char* in, int64_t offset, int64_t n);
   int read_buffered(unsigned char* out, int64_t n);
+  int refill(int64_t need);
   int write_buffered(const unsigned char* in, int64_t n);
 
   std::string name_;
@@ -142,6 +144,9 @@ class DataFile : public GeneralSAR_Base {
   int64_t buffer_offset_ = 0;  // file offset of buffer_[0]
   int64_t cursor_ = 0;         // position within the buffer
   int64_t valid_ = 0;          // bytes of the buffer that hold file data or pending writes
+  int64_t fill_start_ = 0;     // file range of the last refill of the read buffer
+  int64_t fill_end_ = 0;
+  int64_t readahead_ = 0;  // bytes the last refill asked for
   vlr::CkBuffer<unsigned char> buffer_;
   int mode_ = kModeRead;
   int fd_ = -1;

@@ -190,6 +190,7 @@ TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {
   io.num_lines = 2;
   char prefixes[2 * kPrefix];
   ASSERT_EQ(io.readprefix(prefixes), 0);
+  EXPECT_TRUE(df.is_buffered());  // opened by the read, with a read buffer
   EXPECT_EQ(std::string(prefixes, kPrefix), std::string(kPrefix, 'B'));
   EXPECT_EQ(std::string(prefixes + kPrefix, kPrefix), std::string(kPrefix, 'C'));
 
@@ -240,6 +241,11 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   io.output_type = CT_FLOAT32;
   EXPECT_EQ(io.readbuffer(reinterpret_cast<char*>(out), 4), 1);  // room for one float only
   EXPECT_EQ(out[0], 0.0f);
+  io.num_lines = INT32_MAX;
+  io.num_samples = INT32_MAX;
+  EXPECT_EQ(io.readbuffer(reinterpret_cast<char*>(out), INT32_MAX), 1);
+  io.num_lines = 1;
+  io.num_samples = 2;
   EXPECT_EQ(io.readbuffer(reinterpret_cast<char*>(out), 8), 0);
   EXPECT_EQ(out[1], static_cast<float>(Re(0, 1)));
   BufferIO none;
