@@ -64,6 +64,15 @@ bool DataFile::exists() const {
   return true;
 }
 
+bool DataFile::holds_data() const {
+  struct stat st;
+  if (name_.empty() || check_description() != 0 || ::stat(name_.c_str(), &st) != 0) {
+    errno = 0;
+    return false;
+  }
+  return st.st_size >= data_size();
+}
+
 int DataFile::open(int mode) {
   VLR_SCOPE("DataFile::open", kModule);
   int flags = 0;

@@ -103,6 +103,9 @@ class DataFile : public GeneralSAR_Base {
   bool is_complex() const { return cell_type_is_complex(cell_type); }
   // The data file can be opened for reading.
   bool exists() const;
+  // The data file exists and holds at least data_size() bytes: readers that
+  // allocate by the description check this first.
+  bool holds_data() const;
 
   // Line length L and file offset of the first byte (prefix) of line k.
   int64_t line_length() const;

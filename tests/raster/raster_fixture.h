@@ -51,59 +51,44 @@ inline int Components(int type) {
   return type % 2 == 0 ? 2 : 1;
 }
 
-// Stores value v as one component of `type` at p, most significant byte
-// first when `big`.
+// One component of type T at p, most significant byte first when `big`.
+template <class T>
+void Put(double v, bool big, unsigned char* p) {
+  const T t = static_cast<T>(v);
+  const auto* b = reinterpret_cast<const unsigned char*>(&t);
+  for (size_t i = 0; i < sizeof(T); ++i) p[i] = big ? b[sizeof(T) - 1 - i] : b[i];
+}
+template <class T>
+double Get(bool big, const unsigned char* p) {
+  T t;
+  auto* b = reinterpret_cast<unsigned char*>(&t);
+  for (size_t i = 0; i < sizeof(T); ++i) b[i] = big ? p[sizeof(T) - 1 - i] : p[i];
+  return static_cast<double>(t);
+}
+
 inline void PutComponent(double v, int type, bool big, unsigned char* p) {
-  unsigned char tmp[8];
-  const int n = ComponentSize(type);
   switch (ComponentKind(type)) {
-    case 0: {
-      const float f = static_cast<float>(v);
-      std::memcpy(tmp, &f, 4);
-      break;
-    }
+    case 0:
+      return Put<float>(v, big, p);
     case 1:
-      std::memcpy(tmp, &v, 8);
-      break;
-    case 2: {
-      const int32_t i = static_cast<int32_t>(v);
-      std::memcpy(tmp, &i, 4);
-      break;
-    }
-    default: {
-      const int16_t s = static_cast<int16_t>(v);
-      std::memcpy(tmp, &s, 2);
-      break;
-    }
+      return Put<double>(v, big, p);
+    case 2:
+      return Put<int32_t>(v, big, p);
+    default:
+      return Put<int16_t>(v, big, p);
   }
-  for (int i = 0; i < n; ++i) p[i] = big ? tmp[n - 1 - i] : tmp[i];
 }
 
 inline double GetComponent(int type, bool big, const unsigned char* p) {
-  unsigned char tmp[8];
-  const int n = ComponentSize(type);
-  for (int i = 0; i < n; ++i) tmp[i] = big ? p[n - 1 - i] : p[i];
   switch (ComponentKind(type)) {
-    case 0: {
-      float f;
-      std::memcpy(&f, tmp, 4);
-      return f;
-    }
-    case 1: {
-      double d;
-      std::memcpy(&d, tmp, 8);
-      return d;
-    }
-    case 2: {
-      int32_t i;
-      std::memcpy(&i, tmp, 4);
-      return i;
-    }
-    default: {
-      int16_t s;
-      std::memcpy(&s, tmp, 2);
-      return s;
-    }
+    case 0:
+      return Get<float>(big, p);
+    case 1:
+      return Get<double>(big, p);
+    case 2:
+      return Get<int32_t>(big, p);
+    default:
+      return Get<int16_t>(big, p);
   }
 }
 

@@ -181,7 +181,9 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   df.cell_type = CT_INT16;
   df.byte_order = 1;
   const std::string data = RandomBytes(static_cast<size_t>(df.data_size()), 3);  // 36 bytes
+  EXPECT_FALSE(df.holds_data());
   WriteFile(Path("src"), data + "trailing bytes are not raster data");
+  EXPECT_TRUE(df.holds_data());
   ASSERT_EQ(df.copy(Path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
   EXPECT_EQ(ReadFile(Path("dst")), data);
   ASSERT_EQ(df.copy(Path("dst5").c_str(), 5), 0);
@@ -197,6 +199,7 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   EXPECT_EQ(df.copy(Path("src").c_str(), 10), 1);  // onto itself: refused, source intact
   EXPECT_EQ(ReadFile(Path("src")).substr(0, data.size()), data);
   df.lines_per_image = 10;  // longer than the file
+  EXPECT_FALSE(df.holds_data());
   EXPECT_EQ(df.copy(Path("dst").c_str(), 10), 4);
 
   DataFile other;
