@@ -1,9 +1,15 @@
 // "main_import_ESA#": ASAR wide-swath product to five sub-swath rasters.
+#include <cstdio>
+#include <cstring>
 #include <string>
 #include <vector>
 
 #include "drivers/driver_arguments.h"
 #include "drivers/drivers.h"
+#include "drivers/find_aux.h"
+#include "profile/profile.h"
+#include "runtime/call_scope.h"
+#include "runtime/environment.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
@@ -13,13 +19,32 @@ namespace {
 
 constexpr const char* kModule = "main_import_esa";
 constexpr const char* kTitle = "Import ESA Products";
+constexpr const char* kParameterFile = "import_esa.hdr";
+// The product-type characters of the MPH product name ("WSS" in ASA_WSS_1P...).
+constexpr long kProductTypeOffset = 13;
+constexpr size_t kProductTypeLength = 3;
 
 enum ImportArgument : size_t { kProduct = 0, kDoris = 1, kXca = 2, kOutputRoot = 3, kIns = 4 };
+
+// Reads the three product-type characters of the product.
+int readProductType(const char* product, std::string& type) {
+  VLR_SCOPE("readProductType", kModule);
+  FILE* f = std::fopen(product, "rb");
+  if (f == nullptr) VLR_FAIL("File not opened!", vlr::kLibOpen);
+  char chars[kProductTypeLength + 1] = {};
+  const bool read = std::fseek(f, kProductTypeOffset, SEEK_SET) == 0 &&
+                    std::fread(chars, 1, kProductTypeLength, f) == kProductTypeLength;
+  std::fclose(f);
+  if (!read) VLR_FAIL("File reading failed!", vlr::kLibRead);
+  type = chars;
+  return 0;
+}
 
 }  // namespace
 
 int fvlr_main_import_esa(const char* argumentText) {
   using vlr::DriverArgument;
+  VLR_SCOPE("fvlr_main_import_esa", kModule);
   const std::vector<std::string> args = vlr::ReadDriverArguments(argumentText, kTitle, kModule);
   const std::string parameters = NVLR_UTILITY_Format(
       "\nINPUT ASA : [ %s ]\nINPUT DORIS : [ %s ]\nINPUT ASA_XCA : [ %s ]\nOUTPUT ROOT NAME : [ %s "
@@ -28,9 +53,37 @@ int fvlr_main_import_esa(const char* argumentText) {
       DriverArgument(args, kXca).c_str(), DriverArgument(args, kOutputRoot).c_str());
   NVLR_UTILITY_WriteStart(args, kTitle, parameters.c_str());
 
-  if (DriverArgument(args, kProduct) == vlr::kNotOK) {
+  std::string directory;
+  NVLR_UTILITY_GetEnvCode(directory, "VELORAN_CEOS_DES_FILES_DIR");
+  const std::string parameterFile = directory + kParameterFile;
+  int reportLevel = 1;
+  GetParInt(parameterFile.c_str(), "ReportLevel", 1, &reportLevel, 1, "GeneralProcessingConf");
+  const std::string outputRoot = DriverArgument(args, kOutputRoot);
+
+  const std::string& product = DriverArgument(args, kProduct);
+  if (product == vlr::kNotOK) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "ASA_XXX");
   }
+  std::string xcaPath = DriverArgument(args, kXca);
+  if (xcaPath == vlr::kNotOK) {
+    VLR_CALL(find_aux(product.c_str(), directory.c_str(), "ASA_XCA", xcaPath));
+  }
+  std::string insPath = DriverArgument(args, kIns);
+  if (insPath == vlr::kNotOK) {
+    VLR_CALL(find_aux(product.c_str(), directory.c_str(), "ASA_INS", insPath));
+  }
+  std::string orbitPath = DriverArgument(args, kDoris);
+  if (orbitPath == vlr::kNotOK) orbitPath.clear();
+
+  std::string type;
+  VLR_CALL(readProductType(product.c_str(), type));
+  if (type != "WSS") {
+    // The conversion and the list file need the five sub-swaths of a
+    // wide-swath product: any other product ends the run here.
+    VLR_REPORT("Input file is not a ASA_WSS dataset", 0);
+    NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "WSS");
+  }
+  (void)reportLevel;
   // The extraction is not part of this build.
   NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, __LINE__,
                           "extraction not available");

@@ -4,6 +4,9 @@
 
 #include "drivers/driver_arguments.h"
 #include "drivers/drivers.h"
+#include "drivers/find_aux.h"
+#include "envisat/envisat_types.h"
+#include "runtime/environment.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
@@ -13,8 +16,13 @@ namespace {
 
 constexpr const char* kModule = "main_multilook_wss";
 constexpr const char* kTitle = "Multilooking ASA WSS";
+constexpr const char* kParameterFile = "parameters_multilook.hdr";
 
 enum MultilookArgument : size_t { kProduct = 0, kOutputRoot = 1, kDoris = 2 };
+
+[[noreturn]] void stepFailed(int line, const char* step) {
+  NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, line, step);
+}
 
 }  // namespace
 
@@ -27,13 +35,28 @@ int fvlr_main_multilook_wss(const char* argumentText) {
       DriverArgument(args, kDoris).c_str());
   NVLR_UTILITY_WriteStart(args, kTitle, parameters.c_str());
 
-  if (DriverArgument(args, kProduct) == vlr::kNotOK) {
+  std::string directory;
+  NVLR_UTILITY_GetEnvCode(directory, "VELORAN_CEOS_DES_FILES_DIR");
+  const std::string parameterFile = directory + kParameterFile;
+
+  const std::string& product = DriverArgument(args, kProduct);
+  if (product == vlr::kNotOK || !EnvisatTypes::is_wss(product.c_str())) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "WSS");
   }
   if (DriverArgument(args, kOutputRoot) == vlr::kNotOK) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "OUTNAME");
   }
+  std::string xcaPath, insPath;
+  if (find_aux(product.c_str(), directory.c_str(), "ASA_XCA", xcaPath) != 0 ||
+      find_aux(product.c_str(), directory.c_str(), "ASA_INS", insPath) != 0) {
+    stepFailed(__LINE__, "findaux()");
+  }
+  const std::string& orbit = DriverArgument(args, kDoris);
+  if (orbit == vlr::kNotOK ||
+      (!EnvisatTypes::is_dorvor(orbit.c_str()) && !EnvisatTypes::is_dorpor(orbit.c_str()))) {
+    NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "DOR_VOR");
+  }
+  (void)parameterFile;
   // The import and the multilook are not part of this build.
-  NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, __LINE__,
-                          "multilook not available");
+  stepFailed(__LINE__, "multilook not available");
 }
