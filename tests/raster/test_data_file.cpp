@@ -92,6 +92,18 @@ TEST_F(DataFileTest, BufferedWritesReachTheFileAtSeekAndClose) {
     ASSERT_EQ(df.close(), 0);
     EXPECT_EQ(ReadFile(Path("w")), data);
   }
+  // Updating through a read buffer: a read after a write sees the new bytes.
+  DataFile df;
+  df.set_name(Path("w").c_str());
+  df.set_buffer_size(64);
+  ASSERT_EQ(df.open(DataFile::kOpenUpdate), 0);
+  char got[8];
+  ASSERT_EQ(df.read(got, 4), 0);
+  ASSERT_EQ(df.write("abcd", 4), 0);
+  ASSERT_EQ(df.seek(2, DataFile::kSeekSet), 0);
+  ASSERT_EQ(df.read(got, 8), 0);
+  EXPECT_EQ(std::string(got, 8), data.substr(2, 2) + "abcd" + data.substr(8, 2));
+  ASSERT_EQ(df.close(), 0);
 }
 
 TEST_F(DataFileTest, FailuresGiveTheirCodes) {
