@@ -30,6 +30,21 @@ DataFile::DataFile() {
   createElementsVector(6);
 }
 
+DataFile::DataFile(const DataFile& other) : GeneralSAR_Base(other) {
+  set_name(other.name_.c_str());
+  other.clone(this);
+}
+
+DataFile& DataFile::operator=(const DataFile& other) {
+  if (this != &other) {
+    if (is_open()) close();
+    GeneralSAR_Base::operator=(other);
+    set_name(other.name_.c_str());
+    other.clone(this);
+  }
+  return *this;
+}
+
 DataFile::~DataFile() {
   if (is_open()) close();
 }

@@ -40,8 +40,9 @@ class DataFile : public GeneralSAR_Base {
 
   DataFile();
   ~DataFile() override;
-  DataFile(const DataFile&) = delete;
-  DataFile& operator=(const DataFile&) = delete;
+  // Copies hold the name and the description; they start closed.
+  DataFile(const DataFile& other);
+  DataFile& operator=(const DataFile& other);
 
   // Description, set by the header reader or by the caller before writing.
   int32_t pixels_per_line = 0;  // "NrOfPixelsPerLine"

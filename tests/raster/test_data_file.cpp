@@ -219,6 +219,18 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   EXPECT_EQ(other.lines_per_image, 10);
   EXPECT_EQ(other.row_prefix, 2);
   EXPECT_TRUE(other.name().empty());
+
+  // A copy of an open file is closed and writes its header like the original.
+  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+  DataFile copy = df;
+  EXPECT_FALSE(copy.is_open());
+  EXPECT_EQ(copy.name(), df.name());
+  copy.set_name(Path("copy").c_str());
+  copy.lines_per_image = 11;
+  ASSERT_EQ(copy.write_hdr(), 0);
+  ASSERT_EQ(other.read_hdr(Path("copy").c_str()), 0);
+  EXPECT_EQ(other.header_offset, 6);
+  EXPECT_EQ(other.lines_per_image, 11);
 }
 
 }  // namespace
