@@ -1,6 +1,6 @@
 // Main and specific product headers and data set descriptors of ENVISAT
 // products, read as fixed-size blocks with every value taken at its fixed
-// offset.  The offsets are those of the ASAR product specification; values
+// offset.  The offsets are those of ESA's published ASAR product layouts; values
 // are scanned only within their own field, so a blank or malformed field
 // gives an empty text or a failed number, never text of a neighbouring line.
 #pragma once
