@@ -61,6 +61,12 @@ int main(int argc, char** argv) {
   try {
     return run(command);
   } catch (...) {
-    NVLR_UTILITY_RaiseError(vlr::kCodeException, kModule, __LINE__, nullptr);
+    // Outside logging mode the raise throws its error record; the process
+    // ends with the code all the same.
+    try {
+      NVLR_UTILITY_RaiseError(vlr::kCodeException, kModule, __LINE__, nullptr);
+    } catch (...) {
+    }
+    VlrTerminate(vlr::kCodeException);
   }
 }

@@ -99,6 +99,11 @@ TEST(ErrorCatalogParse, DamagedCatalogsLoadWhatTheyHold) {
             "GENERIC ERROR WRONG CODE  :  326401 [PEC 5]");
   EXPECT_EQ(NVLR_UTILITY_ErrorTextLine(good, 65280 + 9),
             "GENERIC ERROR WRONG CODE  :  65289 [1 : 8]");
+  // Texts longer than 1025 characters are cut.
+  ErrorCatalog longText = ParseErrorCatalog({"1", "K", "A", "T", std::string(3000, 't'),
+                                             "[ErrorCodeInfo_A]", "1", std::string(3000, 'x')});
+  EXPECT_EQ(longText.groups[0].title.size(), 1025u);
+  EXPECT_EQ(longText.groups[0].texts[0].size(), 1025u);
   ErrorCatalog none;
   NVLR_UTILITY_GetErrorTexts(none, 4, title, text);
   EXPECT_EQ(title, "AN ERROR OCCUR DURING Veloran INIT");
