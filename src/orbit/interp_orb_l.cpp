@@ -1,0 +1,145 @@
+#include "orbit/interp_orb_l.h"
+
+#include <cmath>
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+
+#include "envisat/product_header.h"
+#include "orbit/doris_record.h"
+#include "orbit/orbit_window.h"
+#include "orbit/rtbis.h"
+#include "runtime/call_scope.h"
+
+namespace {
+
+constexpr const char* kModule = "interp_orb";
+
+// The ascending node is searched in the three minutes before the first
+// record above the equator, to 10 microseconds.
+constexpr double kNodeSearchSpan = 180.0;
+constexpr double kNodeAccuracy = 1e-5;
+
+// Closes the file on every return path.
+class OrbitFile {
+ public:
+  explicit OrbitFile(const char* path) : f_(path != nullptr ? std::fopen(path, "rb") : nullptr) {}
+  ~OrbitFile() {
+    if (f_ != nullptr) std::fclose(f_);
+  }
+  OrbitFile(const OrbitFile&) = delete;
+  OrbitFile& operator=(const OrbitFile&) = delete;
+  std::FILE* get() const { return f_; }
+  int64_t size() const {
+    const off_t here = ftello(f_);
+    if (here < 0 || fseeko(f_, 0, SEEK_END) != 0) return -1;
+    const int64_t end = static_cast<int64_t>(ftello(f_));
+    return fseeko(f_, here, SEEK_SET) == 0 ? end : -1;
+  }
+
+ private:
+  std::FILE* f_;
+};
+
+}  // namespace
+
+int interp_orb_l(const char* path, double tc, int n, double dt, double* pos, double* vel,
+                 int* orbitOut, int wantAnx, double* anxOut) {
+  VLR_SCOPE("interp_orb_l", kModule);
+  if (n < 0 || (n > 0 && pos == nullptr) || (wantAnx == 1 && anxOut == nullptr))
+    VLR_FAIL("Invalid orbit request", 1);
+  OrbitFile file(path);
+  std::FILE* f = file.get();
+  if (f == nullptr) VLR_FAIL("File not opened!", 9);
+
+  // Main and specific product headers; the specific header of an orbit file
+  // is shorter than an image product's, the rest of the block stays zero.
+  EnvisatHeaders headers;
+  std::memset(headers.mph, 0, sizeof headers.mph);
+  std::memset(headers.sph, 0, sizeof headers.sph);
+  if (std::fread(headers.mph, 1, kMphSize, f) != kMphSize) VLR_FAIL("File reading failed!", 4);
+  if (!is_doris_product_type(headers.mph + kDorisProductType.offset)) {
+    VLR_REPORT("Not a DORIS orbit file", ARE_ERROR);
+    return 12;
+  }
+  double start = 0.0, stop = 0.0;
+  if (!parse_doris_time(headers.mph + kMphSensingStart.offset, kMphSensingStart.width, &start) ||
+      !parse_doris_time(headers.mph + kMphSensingStop.offset, kMphSensingStop.width, &stop)) {
+    VLR_REPORT("Orbit file sensing start or stop is not a date", ARE_ERROR);
+    VLR_FAIL("File reading failed!", 4);
+  }
+  if (!(start <= tc && tc <= stop))
+    VLR_FAIL(
+        "Requested orbit information at an invalid time: centr_time < start_time || centr_time > "
+        "stop_time)",
+        13);
+  if (std::fread(headers.sph, 1, kDorisSphSize, f) != kDorisSphSize)
+    VLR_FAIL("File reading failed!", 4);
+
+  // The record data set must lie inside the file.
+  const EnvisatDataSet ds = headers.dataSet(kDorisDsdOffset);
+  const int64_t fileSize = file.size();
+  const int64_t available =
+      ds.valid && fileSize >= ds.offset ? (fileSize - ds.offset) / kDorisRecordSize : -1;
+  if (!ds.valid || (ds.dsrSize != 0 && ds.dsrSize != static_cast<int64_t>(kDorisRecordSize)) ||
+      ds.numDsr > available || ds.numDsr > INT32_MAX) {
+    VLR_REPORT("Orbit data set descriptor does not match the file", ARE_ERROR);
+    VLR_FAIL("File reading failed!", 4);
+  }
+  const int numRecords = static_cast<int>(ds.numDsr);
+  if (fseeko(f, static_cast<off_t>(ds.offset), SEEK_SET) != 0) VLR_FAIL("File reading failed!", 4);
+
+  // Scan to the first record at or after tc, noting the last ascending
+  // equator crossing on the way.
+  DorisRecord previous, current;
+  int k = 0;
+  int crossing = -1;
+  double crossingTime = 0.0;
+  bool reached = false;
+  char record[kDorisRecordSize];
+  while (k < numRecords) {
+    if (std::fread(record, 1, sizeof record, f) != sizeof record)
+      VLR_FAIL("File reading failed!", 4);
+    if (!parse_doris_record(record, &current)) {
+      VLR_REPORT("Malformed orbit record", ARE_ERROR);
+      VLR_FAIL("File reading failed!", 4);
+    }
+    if (k == 0) previous = current;
+    if (k > 0 && !(current.time > previous.time)) {
+      VLR_REPORT("Orbit records are not in time order", ARE_ERROR);
+      VLR_FAIL("File reading failed!", 4);
+    }
+    if (current.position[2] > 0.0 && previous.position[2] <= 0.0) {
+      crossing = k;
+      crossingTime = current.time;
+    }
+    ++k;
+    if (current.time >= tc) {
+      reached = true;
+      break;
+    }
+    previous = current;
+  }
+  if (!reached) VLR_FAIL("File reading failed!", 4);
+
+  if (orbitOut != nullptr)
+    *orbitOut = tc - previous.time < current.time - tc ? previous.orbit : current.orbit;
+
+  VLR_CALL(read_SVs(k, numRecords, f, ds.offset));
+  for (int i = 0; i < n; ++i) {
+    const double t = tc + (i - (n - 1) * 0.5) * dt;
+    VLR_CALL(interp_orb_point(t, 'p', pos + 3 * i));
+    if (vel != nullptr) VLR_CALL(interp_orb_point(t, 'v', vel + 3 * i));
+  }
+
+  if (wantAnx == 1) {
+    *anxOut = 0.0;
+    if (crossing < 0) {
+      std::fputs("Cannot compute ascending node time: no change in orbit number\n", stderr);
+      VLR_FAIL("Cannot compute ascending node time: no change in orbit number", 1);
+    }
+    VLR_CALL(read_SVs(crossing, numRecords, f, ds.offset));
+    VLR_CALL(rtbis(orb_z_at, crossingTime - kNodeSearchSpan, crossingTime, kNodeAccuracy, anxOut));
+  }
+  return 0;
+}

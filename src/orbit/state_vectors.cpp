@@ -1,0 +1,180 @@
+#include "orbit/state_vectors.h"
+
+#include <cfloat>
+#include <climits>
+#include <cstring>
+
+#include "orbit/earth_constants.h"
+#include "orbit/gr_pt_lat_lon.h"
+#include "orbit/orbit_fit.h"
+#include "orbit/orbit_poly.h"
+#include "profile/profile_par.h"
+#include "runtime/error_codes.h"
+
+namespace {
+
+constexpr const char* kModule = "generalSAR";
+constexpr int kChannel = 1;
+constexpr const char* kSection = "StateVectorData";
+constexpr int kFields = 5;
+
+}  // namespace
+
+SAROrbitStateVectors_Obj::SAROrbitStateVectors_Obj() {
+  createElementsVector(kFields);
+}
+
+SAROrbitStateVectors_Obj::~SAROrbitStateVectors_Obj() = default;
+
+void SAROrbitStateVectors_Obj::refreshParameters() {
+  const int values = positions_.empty() ? 0 : 3 * n_;
+  addElementDouble("pSV_m", positions_.data(), values, -DBL_MAX, DBL_MAX, true);
+  addElementDouble("vSV_mOs", velocities_.data(), values, -DBL_MAX, DBL_MAX, true);
+  addElementDouble("t0SV_s", &t0_, 1, -DBL_MAX, DBL_MAX, true);
+  addElementDouble("dtSV_s", &dt_, 1, -DBL_MAX, DBL_MAX, true);
+  addElementInt("nSV_n", &n_, 1, INT_MIN, INT_MAX, true);
+}
+
+int SAROrbitStateVectors_Obj::SVCreate(double t0, double dt, int n) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::SVCreate", kModule);
+  destroyBuffers();
+  t0_ = t0;
+  n_ = n;
+  dt_ = dt;
+  VLR_CALL(createBuffers());
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVDestroy() {
+  if (!positions_.empty()) destroyBuffers();
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::createBuffers() {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::createBuffers", kModule);
+  destroyBuffers();
+  VLR_CALL(checkCount("nSV_n", n_, kMaxStateVectors));
+  const size_t n = static_cast<size_t>(n_);
+  bool ok = positions_.allocate(3 * n) && velocities_.allocate(3 * n);
+  for (vlr::CkBuffer<double>& p : polys_) ok = ok && p.allocate(n);
+  if (!ok) {
+    destroyBuffers();
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  }
+  refreshParameters();
+  setAllocationFlag(true);
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::destroyBuffers() {
+  positions_.reset();
+  velocities_.reset();
+  for (vlr::CkBuffer<double>& p : polys_) p.reset();
+  fitted_ = false;
+  refreshParameters();
+  setAllocationFlag(false);
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVPolyCompute() {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::SVPolyCompute", kModule);
+  fitted_ = false;
+  if (positions_.empty() || n_ < 1) VLR_FAIL("No state vectors", vlr::kLibInconsistent);
+  VLR_CALL(orb_interp(0.0, positions_.data(), dt_, polys_[0].data(), polys_[1].data(),
+                      polys_[2].data(), n_));
+  VLR_CALL(orb_interp(0.0, velocities_.data(), dt_, polys_[3].data(), polys_[4].data(),
+                      polys_[5].data(), n_));
+  fitted_ = true;
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVGetPos(double t, double out[3]) {
+  if (!fitted_) return 1;
+  for (int a = 0; a < 3; ++a) out[a] = POSMACRO(t - t0_, polys_[a].data(), n_);
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVGetVel(double t, double out[3]) {
+  if (!fitted_) return 1;
+  for (int a = 0; a < 3; ++a) out[a] = POSMACRO(t - t0_, polys_[3 + a].data(), n_);
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::groundPoint(double t, double tau, double lambda,
+                                          gr_pt_record* record) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::groundPoint", kModule);
+  if (positions_.empty() || n_ < 5) VLR_FAIL("You must provide at least 5 state vectors!", 1);
+  gr_pt_record& r = *record;
+  std::memcpy(r.positions, positions_.data(), sizeof r.positions);
+  r.tw = t0_;
+  r.dt = dt_;
+  r.t = t;
+  r.tau = tau;
+  r.fdc = 0.0;
+  r.lambda = lambda;
+  r.lookSign = lookSign_;
+  r.height = 0.0;
+  VLR_CALL(gr_pt_lat_lon(record, kWgs84A, kWgs84B));
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVGetLatLon(double t, double tau, double lambda, double* lat,
+                                          double* lon) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::SVGetLatLon", kModule);
+  gr_pt_record r;
+  VLR_CALL(groundPoint(t, tau, lambda, &r));
+  *lat = r.lat;
+  *lon = r.lon;
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::SVGetAngles(double t, double tau, double lambda, double* incidence,
+                                          double* look) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::SVGetAngles", kModule);
+  gr_pt_record r;
+  VLR_CALL(groundPoint(t, tau, lambda, &r));
+  *incidence = r.incidence;
+  *look = r.look;
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::writehdr(const char* file) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::writehdr", kModule);
+  VLR_CALL(writeAuxiliaryFile(file, kChannel, kSection));
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::readhdr(const char* file) {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::readhdr", kModule);
+  if (readAuxiliaryFile(file, kChannel, kSection)) return 0;
+  // Older parameter-file form.
+  double t0 = 0.0, dt = 0.0;
+  int n = 0;
+  if (GetParDouble(file, "TimeFirst", 1, &t0, 1, kSection) != 0 ||
+      GetParDouble(file, "TimeDelta", 1, &dt, 1, kSection) != 0 ||
+      GetParInt(file, "nStateVectors", 1, &n, 1, kSection) != 0) {
+    destroyBuffers();
+    VLR_FAIL("File reading failed!", vlr::kLibRead);
+  }
+  VLR_CALL(SVCreate(t0, dt, n));
+  if (n > 0 && (GetParDouble(file, "pos", 3 * n, positions_.data(), 1, kSection) != 0 ||
+                GetParDouble(file, "vel", 3 * n, velocities_.data(), 1, kSection) != 0)) {
+    destroyBuffers();
+    VLR_FAIL("File reading failed!", vlr::kLibRead);
+  }
+  refreshParameters();
+  setAllocationFlag(true);
+  return 0;
+}
+
+int SAROrbitStateVectors_Obj::clone(SAROrbitStateVectors_Obj* dst) const {
+  VLR_SCOPE("SAROrbitStateVectors_Obj::clone", kModule);
+  if (dst == nullptr || dst == this || n_ <= 0 || positions_.empty()) return 0;
+  VLR_CALL(dst->SVCreate(t0_, dt_, n_));
+  const size_t bytes = 3 * static_cast<size_t>(n_) * sizeof(double);
+  std::memcpy(dst->positions_.data(), positions_.data(), bytes);
+  std::memcpy(dst->velocities_.data(), velocities_.data(), bytes);
+  dst->lookSign_ = lookSign_;
+  VLR_CALL(dst->SVPolyCompute());
+  return 0;
+}

@@ -1,0 +1,155 @@
+// Orbit test material: the real DORIS files, DORIS files built from their
+// header with chosen records, and a closed-form circular orbit.
+#pragma once
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "time/date_text.h"
+
+namespace orbit_test {
+
+const std::string kData = ENVISAT_SAMPLE_DIR;
+const std::string kVor = kData + "DOR_VOR_AXVF-P20080331_075200_20080301_215527_20080303_002327";
+const std::string kPor = kData + "DOR_POR_AXVF-P20080404_014700_20080401_215527_20080403_002327";
+const std::string kXca = kData + "ASA_XCA_AXVIEC20070517_153558_20070204_165113_20071231_000000";
+
+constexpr size_t kHeaderSize = 1625;
+constexpr size_t kRecordSize = 129;
+
+inline std::string Slurp(const std::string& file) {
+  std::ifstream in(file, std::ios::binary);
+  std::ostringstream s;
+  s << in.rdbuf();
+  return s.str();
+}
+
+inline void Spit(const std::string& file, const std::string& text) {
+  std::ofstream(file, std::ios::binary) << text;
+}
+
+// One record as the test reads it, with the standard library only.
+struct Record {
+  double t = 0.0;
+  int orbit = 0;
+  double p[3] = {0, 0, 0};
+  double v[3] = {0, 0, 0};
+};
+
+inline Record ParseRecord(const std::string& r) {
+  Record x;
+  x.t = ascii2sec85(r.substr(0, 27).c_str());
+  x.orbit = std::stoi(r.substr(37, 6));
+  for (int a = 0; a < 3; ++a) {
+    x.p[a] = std::stod(r.substr(44 + 13 * a, 12));
+    x.v[a] = std::stod(r.substr(83 + 13 * a, 12));
+  }
+  return x;
+}
+
+// The header and the record texts of a DORIS file.
+struct DorisText {
+  std::string header;
+  std::vector<std::string> records;
+};
+
+inline DorisText SplitDoris(const std::string& file) {
+  const std::string all = Slurp(file);
+  DorisText d;
+  d.header = all.substr(0, kHeaderSize);
+  for (size_t at = kHeaderSize; at + kRecordSize <= all.size(); at += kRecordSize)
+    d.records.push_back(all.substr(at, kRecordSize));
+  return d;
+}
+
+// Replaces the value of a header line "KEY=" by `value` (same width).
+inline void SetHeaderValue(std::string* header, const std::string& key, const std::string& value) {
+  const size_t at = header->find("\n" + key + "=");
+  ASSERT_NE(at, std::string::npos) << key;
+  header->replace(at + 2 + key.size(), value.size(), value);
+}
+
+inline std::string CountText(long long n) {
+  char b[32];
+  std::snprintf(b, sizeof b, "%+011lld", n);
+  return b;
+}
+
+// A 129-byte record in the layout of the real files.
+inline std::string FormatRecord(double t, int orbit, const double p[3], const double v[3]) {
+  char date[kSec85TextSize];
+  sec852ascii(t, date);
+  char b[256];
+  std::snprintf(b, sizeof b,
+                "%s -.331385 %+06d %+012.3f %+012.3f %+012.3f %+012.6f %+012.6f %+012.6f      3\n",
+                date, orbit, p[0], p[1], p[2], v[0], v[1], v[2]);
+  return b;
+}
+
+// A circular orbit of radius r and inclination incl, seen from the rotating
+// Earth: ascending node at longitude lon0 at time tNode.
+struct CircularOrbit {
+  double r = 7159000.0;
+  double incl = 98.55 * M_PI / 180.0;
+  double tNode = 0.0;
+  double lon0 = 0.3;
+  double mean() const { return std::sqrt(3.986004418e14 / (r * r * r)); }
+  // Earth-fixed position and velocity at t.
+  void at(double t, double p[3], double v[3]) const {
+    const double we = 7.292115189334571e-5;
+    const double n = mean();
+    const double u = n * (t - tNode);
+    const double ci = std::cos(incl), si = std::sin(incl);
+    // Inertial, node on the x axis.
+    const double x = r * std::cos(u), y = r * std::sin(u) * ci, z = r * std::sin(u) * si;
+    const double vx = -r * n * std::sin(u), vy = r * n * std::cos(u) * ci,
+                 vz = r * n * std::cos(u) * si;
+    // Rotate by the node longitude and the Earth's turn since tNode.
+    const double th = lon0 - we * (t - tNode);
+    const double c = std::cos(th), s = std::sin(th);
+    p[0] = c * x - s * y;
+    p[1] = s * x + c * y;
+    p[2] = z;
+    // d/dt of the rotated vector: rotated velocity plus the frame's turn.
+    v[0] = c * vx - s * vy + we * (s * x + c * y);
+    v[1] = s * vx + c * vy - we * (c * x - s * y);
+    v[2] = vz;
+  }
+  double period() const { return 2.0 * M_PI / mean(); }
+};
+
+// A scratch directory per test.
+class ScratchTest : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    char pattern[] = "/tmp/vlr_orbit_XXXXXX";
+    ASSERT_NE(mkdtemp(pattern), nullptr);
+    dir_ = pattern;
+  }
+  void TearDown() override { std::system(("rm -rf '" + dir_ + "'").c_str()); }
+  std::string path(const std::string& name) const { return dir_ + "/" + name; }
+
+  // Writes header and records; the record count written is `count`, or the
+  // number of records when count < 0.
+  std::string WriteDoris(const std::string& name, std::string header,
+                         const std::vector<std::string>& records, long long count = -1) {
+    SetHeaderValue(&header, "NUM_DSR", CountText(count < 0 ? (long long)records.size() : count));
+    std::string text = header;
+    for (const std::string& r : records) text += r;
+    const std::string file = path(name);
+    Spit(file, text);
+    return file;
+  }
+
+  std::string dir_;
+};
+
+}  // namespace orbit_test

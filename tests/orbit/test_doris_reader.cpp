@@ -1,0 +1,310 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+#include <vector>
+
+#include "orbit/get_state_vectors_envi.h"
+#include "orbit/interp_orb_l.h"
+#include "orbit_test_files.h"
+
+using namespace orbit_test;
+
+namespace {
+
+// Value and derivative at t of the Hermite polynomial through values f and
+// derivatives d at the nodes x (divided differences on doubled nodes).
+void Hermite(const std::vector<double>& x, const std::vector<double>& f,
+             const std::vector<double>& d, double t, double* value, double* deriv) {
+  const size_t m = 2 * x.size();
+  std::vector<double> z(m);
+  std::vector<std::vector<double>> q(m, std::vector<double>(m, 0.0));
+  for (size_t i = 0; i < m; ++i) {
+    z[i] = x[i / 2];
+    q[i][0] = f[i / 2];
+  }
+  for (size_t i = 1; i < m; ++i)
+    q[i][1] = i % 2 == 1 ? d[i / 2] : (q[i][0] - q[i - 1][0]) / (z[i] - z[i - 1]);
+  for (size_t j = 2; j < m; ++j)
+    for (size_t i = j; i < m; ++i) q[i][j] = (q[i][j - 1] - q[i - 1][j - 1]) / (z[i] - z[i - j]);
+  double p = q[m - 1][m - 1], dp = 0.0;
+  for (size_t j = m - 1; j-- > 0;) {
+    dp = dp * (t - z[j]) + p;
+    p = p * (t - z[j]) + q[j][j];
+  }
+  *value = p;
+  *deriv = dp;
+}
+
+class RealOrbit : public ::testing::Test {
+ protected:
+  static void SetUpTestSuite() {
+    const DorisText text = SplitDoris(kVor);
+    records_ = new std::vector<Record>;
+    for (const std::string& r : text.records) records_->push_back(ParseRecord(r));
+  }
+  static void TearDownTestSuite() {
+    delete records_;
+    records_ = nullptr;
+  }
+  static const std::vector<Record>& records() { return *records_; }
+
+  // Independent reference: Hermite on positions and velocities of the two
+  // records on each side of t.
+  static void Reference(double t, double p[3], double v[3]) {
+    const std::vector<Record>& r = records();
+    size_t j = 0;
+    while (j + 1 < r.size() && r[j + 1].t <= t) ++j;
+    size_t first = j >= 1 ? j - 1 : 0;
+    if (first + 4 > r.size()) first = r.size() - 4;
+    const double base = r[first].t;
+    std::vector<double> x, f(4), d(4);
+    for (size_t i = 0; i < 4; ++i) x.push_back(r[first + i].t - base);
+    for (int a = 0; a < 3; ++a) {
+      for (size_t i = 0; i < 4; ++i) {
+        f[i] = r[first + i].p[a];
+        d[i] = r[first + i].v[a];
+      }
+      Hermite(x, f, d, t - base, &p[a], &v[a]);
+    }
+  }
+
+  static std::vector<Record>* records_;
+};
+
+std::vector<Record>* RealOrbit::records_ = nullptr;
+
+TEST_F(RealOrbit, RecordTimesGiveTheRecordsUnchanged) {
+  for (size_t i : {size_t(0), size_t(3), size_t(700), records().size() - 3, records().size() - 1}) {
+    const Record& r = records()[i];
+    double p[3], v[3];
+    int orbit = 0;
+    ASSERT_EQ(interp_orb_l(kVor.c_str(), r.t, 1, 60.0, p, v, &orbit, 0, nullptr), 0) << i;
+    for (int a = 0; a < 3; ++a) {
+      EXPECT_EQ(p[a], r.p[a]) << i;
+      EXPECT_EQ(v[a], r.v[a]) << i;
+    }
+    EXPECT_EQ(orbit, r.orbit);
+  }
+  // Five vectors on the record grid, centred on record 700.
+  double p[15], v[15];
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), records()[700].t, 5, 60.0, p, v, nullptr, 0, nullptr), 0);
+  for (int i = 0; i < 5; ++i)
+    for (int a = 0; a < 3; ++a) {
+      EXPECT_EQ(p[3 * i + a], records()[698 + i].p[a]);
+      EXPECT_EQ(v[3 * i + a], records()[698 + i].v[a]);
+    }
+}
+
+TEST_F(RealOrbit, BetweenRecordsAgreesWithHermiteInterpolation) {
+  const double start = records().front().t, stop = records().back().t;
+  double worstP = 0.0, worstV = 0.0;
+  // Near both ends the window is not centred on the request.
+  std::vector<double> times;
+  for (double s = 0.5; s < 600.0; s += 37.3) times.push_back(start + s);
+  for (double s = 0.5; s < 600.0; s += 37.3) times.push_back(stop - s);
+  for (double s = 0.0; s < 86400.0; s += 997.7) times.push_back(start + 3000.0 + s);
+  for (double t : times) {
+    double p[3], v[3], rp[3], rv[3];
+    ASSERT_EQ(interp_orb_l(kVor.c_str(), t, 1, 0.0, p, v, nullptr, 0, nullptr), 0);
+    Reference(t, rp, rv);
+    for (int a = 0; a < 3; ++a) {
+      worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+      worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+    }
+  }
+  EXPECT_LT(worstP, 0.01);
+  // The reference velocity is the derivative of positions given to the
+  // millimetre, good to a few 1e-4 m/s.
+  EXPECT_LT(worstV, 1e-3);
+  // A grid of 31 vectors 5 s apart, as an import asks for it.
+  const double tc = start + 40000.3;
+  double p[93], v[93];
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), tc, 31, 5.0, p, v, nullptr, 0, nullptr), 0);
+  for (int i = 0; i < 31; ++i) {
+    double rp[3], rv[3];
+    Reference(tc + (i - 15) * 5.0, rp, rv);
+    for (int a = 0; a < 3; ++a) EXPECT_NEAR(p[3 * i + a], rp[a], 0.01) << i;
+  }
+}
+
+TEST_F(RealOrbit, OrbitNumberOfTheNearerRecord) {
+  size_t j = 1;
+  while (records()[j].orbit == records()[j - 1].orbit) ++j;
+  const Record& before = records()[j - 1];
+  const Record& after = records()[j];
+  ASSERT_EQ(after.orbit, before.orbit + 1);
+  double p[3];
+  int orbit = 0;
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), before.t + 29.9, 1, 0.0, p, nullptr, &orbit, 0, nullptr), 0);
+  EXPECT_EQ(orbit, before.orbit);
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), before.t + 30.1, 1, 0.0, p, nullptr, &orbit, 0, nullptr), 0);
+  EXPECT_EQ(orbit, after.orbit);
+  // Half way: the later record.
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), before.t + 30.0, 1, 0.0, p, nullptr, &orbit, 0, nullptr), 0);
+  EXPECT_EQ(orbit, after.orbit);
+}
+
+TEST_F(RealOrbit, AscendingNodeLiesWhereZChangesSign) {
+  const double tc = records()[1000].t + 10.0;
+  size_t crossing = 0;
+  for (size_t j = 1; j <= 1001; ++j)
+    if (records()[j - 1].p[2] <= 0.0 && records()[j].p[2] > 0.0) crossing = j;
+  ASSERT_GT(crossing, 0u);
+  double p[3], anx = -1.0;
+  ASSERT_EQ(interp_orb_l(kVor.c_str(), tc, 1, 0.0, p, nullptr, nullptr, 1, &anx), 0);
+  EXPECT_GT(anx, records()[crossing - 1].t);
+  EXPECT_LE(anx, records()[crossing].t);
+  double rp[3], rv[3];
+  Reference(anx, rp, rv);
+  EXPECT_LT(std::fabs(rp[2]), 0.5);
+  // Before the first crossing of the file there is no node: code 1, but the
+  // vectors are there.
+  const Record& early = records()[3];
+  anx = -1.0;
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), early.t, 1, 0.0, p, nullptr, nullptr, 1, &anx), 1);
+  EXPECT_EQ(anx, 0.0);
+  EXPECT_EQ(p[0], early.p[0]);
+}
+
+TEST_F(RealOrbit, TimesOutsideTheValidityGive13) {
+  const double start = ascii2sec85("01-MAR-2008 21:55:27.000000");
+  const double stop = ascii2sec85("03-MAR-2008 00:23:27.000000");
+  double p[3];
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), start, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 0);
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), stop, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 0);
+  EXPECT_EQ(p[0], records().back().p[0]);
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), start - 0.001, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 13);
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), stop + 0.001, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 13);
+  EXPECT_EQ(interp_orb_l(kVor.c_str(), std::numeric_limits<double>::quiet_NaN(), 1, 0.0, p, nullptr,
+                         nullptr, 0, nullptr),
+            13);
+}
+
+class OrbitFiles : public ScratchTest {};
+
+TEST_F(OrbitFiles, OnlyTheFourOrbitProductNamesAreRead) {
+  const DorisText vor = SplitDoris(kVor);
+  const double tc = ParseRecord(vor.records[20]).t;
+  double p[3];
+  const struct {
+    const char* name;
+    int code;
+  } cases[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
+               {"DOR_NL__AX", 12}, {"ASA_WSS_1P", 12}, {"dor_vor_ax", 12}, {"DOR_VOR_1P", 12}};
+  const std::vector<std::string> some(vor.records.begin(), vor.records.begin() + 40);
+  for (const auto& c : cases) {
+    std::string header = vor.header;
+    header.replace(9, 10, c.name);
+    const std::string file = WriteDoris(c.name, header, some);
+    EXPECT_EQ(interp_orb_l(file.c_str(), tc, 1, 0.0, p, nullptr, nullptr, 0, nullptr), c.code)
+        << c.name;
+  }
+  EXPECT_EQ(interp_orb_l(kXca.c_str(), tc, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 12);
+  EXPECT_EQ(interp_orb_l(path("absent").c_str(), tc, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 9);
+  // The preliminary orbit file of the samples.
+  const DorisText por = SplitDoris(kPor);
+  int orbit = 0;
+  ASSERT_EQ(interp_orb_l(kPor.c_str(), ParseRecord(por.records[5]).t, 1, 0.0, p, nullptr, &orbit, 0,
+                         nullptr),
+            0);
+  EXPECT_EQ(p[2], ParseRecord(por.records[5]).p[2]);
+}
+
+// A DORIS file written from a closed-form orbit: the reader must give the
+// orbit back to the precision of the file, and the node where it is.
+TEST_F(OrbitFiles, ClosedFormOrbitAndItsNode) {
+  CircularOrbit orbit;
+  const double t0 = ascii2sec85("02-MAR-2008 10:00:00.000000");
+  orbit.tNode = t0 + 1234.5678;
+  std::vector<std::string> records;
+  const int count = 300;
+  for (int i = 0; i < count; ++i) {
+    const double t = t0 + 60.0 * i;
+    double p[3], v[3];
+    orbit.at(t, p, v);
+    const int number = 40000 + static_cast<int>(std::floor((t - orbit.tNode) / orbit.period()));
+    records.push_back(FormatRecord(t, number, p, v));
+  }
+  std::string header = SplitDoris(kVor).header;
+  char date[kSec85TextSize];
+  SetHeaderValue(&header, "SENSING_START", std::string("\"") + sec852ascii(t0, date));
+  SetHeaderValue(&header, "SENSING_STOP",
+                 std::string("\"") + sec852ascii(t0 + 60.0 * (count - 1), date));
+  const std::string file = WriteDoris("closed_form", header, records);
+
+  double worstP = 0.0, worstV = 0.0;
+  for (double t = t0 + 1.0; t < t0 + 60.0 * (count - 1); t += 211.7) {
+    double p[3], v[3], rp[3], rv[3];
+    ASSERT_EQ(interp_orb_l(file.c_str(), t, 1, 0.0, p, v, nullptr, 0, nullptr), 0);
+    orbit.at(t, rp, rv);
+    for (int a = 0; a < 3; ++a) {
+      worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+      worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+    }
+  }
+  // The file holds millimetres and micrometres per second.
+  EXPECT_LT(worstP, 0.002);
+  EXPECT_LT(worstV, 1e-5);
+
+  // The last node before a time two orbits later.
+  const double tc = orbit.tNode + 2.0 * orbit.period() + 500.0;
+  double p[3], anx = 0.0;
+  int number = 0;
+  ASSERT_EQ(interp_orb_l(file.c_str(), tc, 1, 0.0, p, nullptr, &number, 1, &anx), 0);
+  EXPECT_NEAR(anx, orbit.tNode + 2.0 * orbit.period(), 1e-4);
+  EXPECT_EQ(number, 40002);
+}
+
+TEST_F(RealOrbit, StateVectorObjectFromTheOrbitFile) {
+  // Early in the file, before its first ascending node: the vectors do not
+  // depend on the node.
+  for (double offset : {60.0, 30000.0}) {
+    const double t0 = records().front().t + offset;
+    SAROrbitStateVectors_Obj sv;
+    ASSERT_EQ(GetStateVectorsENVI(kVor.c_str(), t0, 5.0, 9, &sv), 0);
+    ASSERT_EQ(sv.n(), 9);
+    EXPECT_EQ(sv.t0(), t0);
+    EXPECT_EQ(sv.dt(), 5.0);
+    for (int i = 0; i < 9; ++i) {
+      double rp[3], rv[3];
+      Reference(t0 + 5.0 * i, rp, rv);
+      for (int a = 0; a < 3; ++a) {
+        EXPECT_NEAR(sv.positions()[3 * i + a], rp[a], 0.01);
+        EXPECT_NEAR(sv.velocities()[3 * i + a], rv[a], 1e-3);
+      }
+    }
+    for (double t = t0; t <= t0 + 40.0; t += 3.3) {
+      double p[3], v[3], rp[3], rv[3];
+      ASSERT_EQ(sv.SVGetPos(t, p), 0);
+      ASSERT_EQ(sv.SVGetVel(t, v), 0);
+      Reference(t, rp, rv);
+      for (int a = 0; a < 3; ++a) {
+        EXPECT_NEAR(p[a], rp[a], 0.01);
+        EXPECT_NEAR(v[a], rv[a], 1e-3);
+      }
+    }
+  }
+  SAROrbitStateVectors_Obj sv;
+  EXPECT_EQ(GetStateVectorsENVI(kVor.c_str(), records().front().t - 100.0, 5.0, 9, &sv), 13);
+}
+
+TEST(StateVectorGrid, ShortAndLongScenes) {
+  double t0 = 0, dt = 0;
+  int n = 0;
+  ASSERT_EQ(StateVectorGridENVI(1000.0, 14.9, &t0, &dt, &n), 0);
+  EXPECT_EQ(n, 5);
+  EXPECT_EQ(dt, 5.0);
+  EXPECT_DOUBLE_EQ(t0, 1000.0 + 7.45 - 10.0);
+  ASSERT_EQ(StateVectorGridENVI(1000.0, 15.0, &t0, &dt, &n), 0);
+  EXPECT_EQ(n, 7);
+  EXPECT_DOUBLE_EQ(t0, 997.0);
+  ASSERT_EQ(StateVectorGridENVI(1000.0, 100.0, &t0, &dt, &n), 0);
+  EXPECT_EQ(n, 31);
+  EXPECT_DOUBLE_EQ(t0, 980.0);
+  EXPECT_DOUBLE_EQ(t0 + (n - 1) * dt, 1130.0);
+  EXPECT_EQ(StateVectorGridENVI(1000.0, std::numeric_limits<double>::quiet_NaN(), &t0, &dt, &n), 1);
+  EXPECT_EQ(StateVectorGridENVI(1000.0, 1e12, &t0, &dt, &n), 1);
+}
+
+}  // namespace

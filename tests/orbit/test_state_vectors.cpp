@@ -1,0 +1,207 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <string>
+
+#include "orbit/earth_constants.h"
+#include "orbit/geodetic.h"
+#include "orbit/state_vectors.h"
+#include "orbit_test_files.h"
+
+using namespace orbit_test;
+
+namespace {
+
+// Fills sv with n vectors of the closed-form orbit from t0, dt apart.
+void Sample(const CircularOrbit& orbit, double t0, double dt, int n, SAROrbitStateVectors_Obj* sv) {
+  ASSERT_EQ(sv->SVCreate(t0, dt, n), 0);
+  for (int i = 0; i < n; ++i)
+    orbit.at(t0 + i * dt, sv->positions() + 3 * i, sv->velocities() + 3 * i);
+}
+
+// One polynomial through all vectors: within a millimetre up to 11 vectors
+// 5 s apart (beyond that rounding grows: 2 mm with 13, 0.15 m with 31).
+TEST(StateVectors, ClosedFormOrbitWithinAMillimetre) {
+  CircularOrbit orbit;
+  orbit.tNode = 7.3e8;
+  const struct {
+    int n;
+    double dt;
+  } grids[] = {{5, 5.0}, {7, 5.0}, {9, 5.0}, {11, 5.0}, {5, 10.0}};
+  for (const auto& g : grids) {
+    for (double start : {orbit.tNode - 300.0, orbit.tNode + 1500.0}) {
+      SAROrbitStateVectors_Obj sv;
+      Sample(orbit, start, g.dt, g.n, &sv);
+      double p[3];
+      EXPECT_EQ(sv.SVGetPos(start, p), 1);  // not fitted yet
+      ASSERT_EQ(sv.SVPolyCompute(), 0);
+      double worstP = 0.0, worstV = 0.0;
+      const double span = (g.n - 1) * g.dt;
+      for (double s = 0.0; s <= span; s += span / 97.0) {
+        double v[3], rp[3], rv[3];
+        ASSERT_EQ(sv.SVGetPos(start + s, p), 0);
+        ASSERT_EQ(sv.SVGetVel(start + s, v), 0);
+        orbit.at(start + s, rp, rv);
+        for (int a = 0; a < 3; ++a) {
+          worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+          worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+        }
+      }
+      EXPECT_LT(worstP, 1e-3) << g.n << " vectors " << g.dt << " s apart";
+      EXPECT_LT(worstV, 1e-3) << g.n << " vectors " << g.dt << " s apart";
+    }
+  }
+}
+
+TEST(StateVectors, GroundPointOfTheFirstFiveVectors) {
+  CircularOrbit orbit;
+  orbit.tNode = 7.3e8;
+  const double t0 = orbit.tNode + 800.0, dt = 5.0;
+  SAROrbitStateVectors_Obj sv;
+  Sample(orbit, t0, dt, 9, &sv);
+  const double tau = 850000.0 / kHalfSpeedOfLight;
+  const double lambda = 0.05623564240544047;
+  for (int sign : {1, -1}) {
+    sv.setLookSign(sign);
+    for (double t : {t0 - 0.5 * dt, t0 + 7.3, t0 + 4.5 * dt}) {
+      double lat = 0, lon = 0, inc = 0, look = 0;
+      ASSERT_EQ(sv.SVGetLatLon(t, tau, lambda, &lat, &lon), 0);
+      ASSERT_EQ(sv.SVGetAngles(t, tau, lambda, &inc, &look), 0);
+      // Back to Cartesian on the ellipsoid: at the slant range, at zero
+      // Doppler, on the side of the look sign.
+      const double llh[3] = {lat / kRadToDeg, lon / kRadToDeg, 0.0};
+      double g[3], p[3], v[3];
+      geo2cart(g, llh);
+      orbit.at(t, p, v);
+      const double d[3] = {p[0] - g[0], p[1] - g[1], p[2] - g[2]};
+      const double r = std::sqrt(d[0] * d[0] + d[1] * d[1] + d[2] * d[2]);
+      EXPECT_NEAR(r, 850000.0, 1e-3);
+      const double vd = (v[0] * d[0] + v[1] * d[1] + v[2] * d[2]) / r;
+      EXPECT_LT(std::fabs(vd), 1e-5);  // m/s of range rate
+      // Left of the track is along P x V.
+      const double left[3] = {p[1] * v[2] - p[2] * v[1], p[2] * v[0] - p[0] * v[2],
+                              p[0] * v[1] - p[1] * v[0]};
+      EXPECT_LT(-(d[0] * left[0] + d[1] * left[1] + d[2] * left[2]) * sign, 0.0) << sign;
+      // Look angle at the satellite, incidence at the ground.
+      const double pn = std::sqrt(p[0] * p[0] + p[1] * p[1] + p[2] * p[2]);
+      const double gn = std::sqrt(g[0] * g[0] + g[1] * g[1] + g[2] * g[2]);
+      EXPECT_NEAR(std::acos((d[0] * p[0] + d[1] * p[1] + d[2] * p[2]) / (r * pn)) * kRadToDeg, look,
+                  1e-6);
+      // The ellipsoid normal differs from the radius; the incidence is
+      // measured from the radius.
+      EXPECT_NEAR(std::acos((d[0] * g[0] + d[1] * g[1] + d[2] * g[2]) / (r * gn)) * kRadToDeg, inc,
+                  1e-6);
+    }
+  }
+  double lat, lon;
+  EXPECT_EQ(sv.SVGetLatLon(t0 - 0.51 * dt, tau, lambda, &lat, &lon), -1);
+  EXPECT_EQ(sv.SVGetLatLon(t0 + 4.51 * dt, tau, lambda, &lat, &lon), -1);
+  SAROrbitStateVectors_Obj few;
+  Sample(orbit, t0, dt, 4, &few);
+  EXPECT_EQ(few.SVGetLatLon(t0, tau, lambda, &lat, &lon), 1);
+}
+
+class StateVectorHeaders : public ScratchTest {};
+
+TEST_F(StateVectorHeaders, XmlRoundTripAndClone) {
+  CircularOrbit orbit;
+  SAROrbitStateVectors_Obj sv;
+  Sample(orbit, 7.3e8 + 0.123456, 5.0, 7, &sv);
+  const std::string file = path("sv.xml");
+  ASSERT_EQ(sv.writehdr(file.c_str()), 0);
+  const std::string text = Slurp(file);
+  for (const char* name : {"StateVectorData", "pSV_m", "vSV_mOs", "t0SV_s", "dtSV_s", "nSV_n"})
+    EXPECT_NE(text.find(name), std::string::npos) << name;
+
+  SAROrbitStateVectors_Obj back;
+  ASSERT_EQ(back.readhdr(file.c_str()), 0);
+  ASSERT_EQ(back.n(), 7);
+  EXPECT_EQ(back.t0(), sv.t0());
+  EXPECT_EQ(back.dt(), 5.0);
+  for (int i = 0; i < 21; ++i) {
+    EXPECT_EQ(back.positions()[i], sv.positions()[i]);
+    EXPECT_EQ(back.velocities()[i], sv.velocities()[i]);
+  }
+  EXPECT_FALSE(back.isFitted());  // reading does not fit
+
+  // A clone is fitted and independent of its source.
+  back.setLookSign(-1);
+  SAROrbitStateVectors_Obj copy;
+  ASSERT_EQ(back.clone(&copy), 0);
+  EXPECT_TRUE(copy.isFitted());
+  EXPECT_EQ(copy.lookSign(), -1);
+  back.SVDestroy();
+  double p[3];
+  ASSERT_EQ(copy.SVGetPos(sv.t0() + 30.0, p), 0);
+  EXPECT_NEAR(p[0], sv.positions()[18], 1e-3);
+  // Nothing to clone from an empty object.
+  SAROrbitStateVectors_Obj empty;
+  EXPECT_EQ(empty.clone(&copy), 0);
+  EXPECT_EQ(copy.n(), 7);
+}
+
+TEST_F(StateVectorHeaders, LegacyKeys) {
+  const std::string file = path("legacy.hdr");
+  Spit(file,
+       "[StateVectorData]\nTimeFirst = 730000000.5\nTimeDelta = 10\nnStateVectors = 2\n"
+       "pos = {1 2 3 4 5 6}\nvel = {-1 -2 -3 -4 -5 -6}\n");
+  SAROrbitStateVectors_Obj sv;
+  ASSERT_EQ(sv.readhdr(file.c_str()), 0);
+  EXPECT_EQ(sv.t0(), 730000000.5);
+  EXPECT_EQ(sv.dt(), 10.0);
+  ASSERT_EQ(sv.n(), 2);
+  for (int i = 0; i < 6; ++i) {
+    EXPECT_EQ(sv.positions()[i], i + 1.0);
+    EXPECT_EQ(sv.velocities()[i], -(i + 1.0));
+  }
+  EXPECT_TRUE(sv.isBufferAllocated());
+  // What it read it writes as the XML section.
+  const std::string xml = path("legacy.xml");
+  ASSERT_EQ(sv.writehdr(xml.c_str()), 0);
+  SAROrbitStateVectors_Obj back;
+  ASSERT_EQ(back.readhdr(xml.c_str()), 0);
+  EXPECT_EQ(back.velocities()[5], -6.0);
+}
+
+TEST_F(StateVectorHeaders, IncompleteOrInvalidHeaders) {
+  const struct {
+    const char* text;
+    int code;
+  } cases[] = {
+      // A scalar missing.
+      {"[StateVectorData]\nTimeFirst = 1\nnStateVectors = 1\npos = {1 2 3}\nvel = {1 2 3}\n", 4},
+      // Too few positions, no velocities.
+      {"[StateVectorData]\nTimeFirst = 1\nTimeDelta = 1\nnStateVectors = 2\npos = {1 2 3}\n"
+       "vel = {1 2 3 4 5 6}\n",
+       4},
+      {"[StateVectorData]\nTimeFirst = 1\nTimeDelta = 1\nnStateVectors = 1\npos = {1 2 3}\n", 4},
+      // Counts that no allocation should follow.
+      {"[StateVectorData]\nTimeFirst = 1\nTimeDelta = 1\nnStateVectors = 2000000000\n", 1},
+      {"[StateVectorData]\nTimeFirst = 1\nTimeDelta = 1\nnStateVectors = -3\n", 1},
+      {"no section at all\n", 4},
+  };
+  int i = 0;
+  for (const auto& c : cases) {
+    const std::string file = path("bad" + std::to_string(i++) + ".hdr");
+    Spit(file, c.text);
+    SAROrbitStateVectors_Obj sv;
+    EXPECT_EQ(sv.readhdr(file.c_str()), c.code) << c.text;
+    EXPECT_TRUE(sv.positions() == nullptr) << c.text;
+  }
+  // An XML section with a huge count.
+  SAROrbitStateVectors_Obj sv;
+  Sample(CircularOrbit(), 0.0, 1.0, 1, &sv);
+  const std::string xml = path("huge.xml");
+  ASSERT_EQ(sv.writehdr(xml.c_str()), 0);
+  std::string text = Slurp(xml);
+  const size_t at = text.find("<nSV_n>1<");
+  ASSERT_NE(at, std::string::npos);
+  text.replace(at, 9, "<nSV_n>999999999<");
+  Spit(xml, text);
+  SAROrbitStateVectors_Obj back;
+  EXPECT_NE(back.readhdr(xml.c_str()), 0);
+  EXPECT_TRUE(back.positions() == nullptr);
+  EXPECT_EQ(back.SVCreate(0.0, 1.0, -1), 1);
+}
+
+}  // namespace
