@@ -82,7 +82,3 @@ double orb_z_at(double t) {
   if (interp_orb_point(t, 'p', p) != 0) return 0.0;
   return p[2];
 }
-
-const double* orbit_window_times() {
-  return g_window.loaded ? g_window.times : nullptr;
-}

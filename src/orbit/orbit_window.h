@@ -22,6 +22,3 @@ int interp_orb_point(double t, char which, double out[3]);
 
 // The z position at t from the window (0.0 when the window is empty).
 double orb_z_at(double t);
-
-// Record times of the loaded window (nine values); null when it is empty.
-const double* orbit_window_times();

@@ -2,11 +2,6 @@
 // multiplies x^k.
 #pragma once
 
-// Solves a * x = b in place by Gauss-Jordan elimination with full pivoting:
-// a (n x n, row-major) is replaced by its inverse and b by the solution.
-// 0, or 1 "Singular matrix in ldgaussj" when a pivot is zero.
-int ldgaussj(double* a, int n, double* b);
-
 // Degree-d least-squares polynomial through the m points (x, y) from the
 // normal equations; coef receives d + 1 coefficients.  0, or 1 when d < 0,
 // m < d + 1 or the normal matrix is singular.

@@ -45,6 +45,14 @@ TEST(GroundPoint, SphericalCaseMatchesTheTriangle) {
     EXPECT_NEAR(std::sqrt(Dot(g, g)), re, 1e-3);
     // Right of a northbound track at longitude 0 is east (y > 0).
     EXPECT_GT(g[1], 0.0);
+    // Speeds and Doppler rate of a circular orbit over a sphere at zero
+    // Doppler: with gamma the Earth-central angle between satellite and
+    // ground point, R R'' = V^2 - w^2 P.(P - G) = w^2 rs re cos(gamma).
+    const double v = w * rs;
+    const double cosGamma = (rs * rs + re * re - range * range) / (2.0 * rs * re);
+    EXPECT_NEAR(rec.groundSpeed, v * re / rs, 1e-6);
+    EXPECT_NEAR(rec.effectiveSpeed, v * re * cosGamma / rs, 1e-3);
+    EXPECT_NEAR(rec.dopplerRate, -2.0 / lambda * w * w * rs * re * cosGamma / range, 1e-3);
   }
 }
 
