@@ -1,5 +1,8 @@
 #include "metadata/legacy_fields.h"
 
+#include <cstring>
+
+#include "profile/profile_cache.h"
 #include "profile/profile_values.h"
 
 namespace {
@@ -13,10 +16,13 @@ int readField(const parElement& e, const char* file, const char* section, const 
       return GetMyProfileFloatArray(section, key, static_cast<float*>(e.value), e.count, file);
     case parElement::PT_DOUBLE:
       return GetProfileDoubleArray(section, key, static_cast<double*>(e.value), e.count, file);
-    case parElement::PT_STRING:
-      if (e.stringArray || e.stringSize < 1) return 1;
-      return GetMyProfileString(section, key, static_cast<char*>(e.value),
-                                static_cast<int>(e.stringSize), file);
+    case parElement::PT_STRING: {
+      // A text that does not fit the field is refused rather than cut.
+      const char* text = GetSetProfileChar(kProfileGet, section, key, nullptr, file);
+      if (e.stringArray || text == nullptr || std::strlen(text) >= e.stringSize) return 1;
+      std::memcpy(e.value, text, std::strlen(text) + 1);
+      return 0;
+    }
     case parElement::PT_NONE:
       break;
   }

@@ -150,6 +150,21 @@ TEST_F(Sections, FreshDataSetInfoKeepsItsDefaults) {
   EXPECT_STREQ(info.ImageType, "NOT SET");
 }
 
+TEST_F(Sections, OverLongTextsOfTheOlderFormAreRefusedNotCut) {
+  DataSetInfo_Obj info;
+  fill(info, 5);
+  const std::string longText(600, 'x');
+  const std::string text =
+      legacyText(info, "DataSetInfo", {}, {"LookDirection", "SensorName", "Track"});
+  spit(path("long_optional.par"), text + "Track = 12\nSensorName = " + longText + "\n");
+  DataSetInfo_Obj optional;
+  EXPECT_EQ(optional.readhdr(path("long_optional.par").c_str()), 0);
+  EXPECT_STREQ(optional.Track, "12");
+  EXPECT_STREQ(optional.SensorName, "SENSOR UNKNOWN");
+  spit(path("long_track.par"), text + "Track = " + longText + "\n");
+  EXPECT_EQ(DataSetInfo_Obj().readhdr(path("long_track.par").c_str()), 1);
+}
+
 TEST_F(Sections, HostileCountsFailWithoutAllocating) {
   // A pattern of 10^9 samples, a negative one, 10^9 window changes: the
   // block does not read, and neither does the older form.
