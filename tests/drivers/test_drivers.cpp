@@ -121,6 +121,14 @@ TEST_F(DriverChecks, MultilookChecksProductOutputAndOrbit) {
   a[2] = run_.product;  // not an orbit file
   run("main_multilook_WSS#", a);
   EXPECT_NE(errorFile().find("[EC : 456962]\nDOR_VOR\n"), std::string::npos);
+  a = multilookArgs();
+  a[1] = "NotOK";
+  run("main_multilook_WSS#", a);
+  EXPECT_NE(errorFile().find("[EC : 456962]\nOUTNAME\n"), std::string::npos);
+  EXPECT_NE(ReadFile(inst_.working() + "Process.log")
+                .find("\nINPUT ASA_RS : [ " + run_.product +
+                      " ]\nOUTPUT ROOT NAME : [ NotOK ]\nINPUT DORIS : [ " + orbit_ + " ]\n"),
+            std::string::npos);
   // A preliminary orbit is accepted: the run gets past the checks.
   a = multilookArgs();
   a[2] = VLR_SHARED_DIR

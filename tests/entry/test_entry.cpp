@@ -139,13 +139,6 @@ TEST_F(Tool, ArgumentChecksNeedingNoFileName) {
   r = inst_.run("main_multilook_WSS#" + inst_.writeArguments(a));
   EXPECT_EQ(r.status, 255);
   EXPECT_NE(errorFile().find("[EC : 456962]\nWSS\n"), std::string::npos);
-  a = fourteen();
-  a[1] = "NotOK";
-  r = inst_.run("main_multilook_WSS#" + inst_.writeArguments(a));
-  EXPECT_NE(errorFile().find("[EC : 456962]\nOUTNAME\n"), std::string::npos);
-  EXPECT_NE(log().find("\nINPUT ASA_RS : [ /data/ASA_WSS_1PNPDE20080302_091230.N1 ]\nOUTPUT ROOT "
-                       "NAME : [ NotOK ]\nINPUT DORIS : [ NotOK ]\n"),
-            std::string::npos);
   // "NotOK" is compared whole: a longer text is a file name.
   a = fourteen();
   a[0] = "NotOKay";
