@@ -46,6 +46,32 @@ int poly::clone(poly* other) const {
   return 0;
 }
 
+// Every field of a polynomial is a double array (count 1 for the times).
+bool poly::readFromDocument(tessalxml& doc, const char* name) {
+  const std::string block = blockPath(name);
+  for (int i = 0; i < elementCount(); ++i) {
+    const parElement& e = element(i);
+    const std::string field = block + "/" + e.name;
+    if (e.type != parElement::PT_DOUBLE ||
+        doc.readDouble(kChannel, field.c_str(), static_cast<double*>(e.value), e.count) != 0)
+      return false;
+  }
+  return true;
+}
+
+int poly::writeToDocument(tessalxml& doc, const char* name) {
+  const std::string block = blockPath(name);
+  doc.removeElements(kChannel, block.c_str());
+  for (int i = 0; i < elementCount(); ++i) {
+    const parElement& e = element(i);
+    const std::string field = block + "/" + e.name;
+    if (e.type != parElement::PT_DOUBLE ||
+        doc.writeDouble(kChannel, field.c_str(), static_cast<const double*>(e.value), e.count) != 0)
+      return 1;
+  }
+  return 0;
+}
+
 int poly::writeBlock(const char* file, const char* name) {
   VLR_SCOPE("writepar", kModule);
   VLR_CALL(writeAuxiliaryFile(file, kChannel, blockPath(name).c_str()));

@@ -25,6 +25,14 @@ class poly : public GeneralSAR_Base {
   // Copies the coefficients and reference times into `other`.  Returns 0.
   int clone(poly* other) const;
 
+  // The block "PolySAR/<name>" of channel 1 in a document that the caller
+  // has loaded, so that the many data sets of one file are read or written
+  // without parsing the file again for each.  Read: true when every field
+  // was found.  Write: replaces the block (not saved); 0, or 1 when a field
+  // cannot be stored.
+  bool readFromDocument(tessalxml& doc, const char* name);
+  int writeToDocument(tessalxml& doc, const char* name);
+
   double pol[kCoefficients] = {};
   double trg0_s = 0.0;  // reference range time, s
   double taz0_s = 0.0;  // reference azimuth time, sec85

@@ -212,11 +212,16 @@ int polySAR::readhdr(const char* file) {
   }
   VLR_CALL(CreatePolys(header.ndc, header.nfr, header.nsl2gr, header.ngr2sl, header.nsl2theta,
                        header.nsl2phi, header.ndcExt, header.nfrExt));
+  // The data sets come from the document loaded once; a data set that it
+  // does not hold is read on its own (older parameter-file form).
+  tessalxml doc(file);
   int rc = 0;
   forEachFamily(*this, [&](auto& family, const char* name) {
-    for (size_t i = 0; rc == 0 && i < family.size(); ++i)
-      rc = vlr_scope_.callee(
-          family[i].readpar(file, DataSetName(name, static_cast<int>(i)).c_str()), __LINE__);
+    for (size_t i = 0; rc == 0 && i < family.size(); ++i) {
+      const std::string set = DataSetName(name, static_cast<int>(i));
+      if (!family[i].readFromDocument(doc, set.c_str()))
+        rc = vlr_scope_.callee(family[i].readpar(file, set.c_str()), __LINE__);
+    }
   });
   if (rc != 0) {
     DestroyPolys();
@@ -254,15 +259,18 @@ int polySAR::writehdr(const char* file) {
   ndcExt = static_cast<int>(dcExt.size());
   nfrExt = static_cast<int>(frExt.size());
   VLR_CALL(writeAuxiliaryFile(file, kChannel, kBlock));
+  // The data sets go into the document loaded once and saved once.
+  tessalxml doc(file);
   int first = 0;
   forEachFamily(*this, [&](auto& family, const char* name) {
     for (size_t i = 0; i < family.size(); ++i) {
-      const int rc = vlr_scope_.callee(
-          family[i].writepar(file, DataSetName(name, static_cast<int>(i)).c_str()), __LINE__);
+      const std::string set = DataSetName(name, static_cast<int>(i));
+      const int rc = vlr_scope_.callee(family[i].writeToDocument(doc, set.c_str()), __LINE__);
       if (first == 0) first = rc;
     }
   });
-  return first;
+  const int saved = vlr_scope_.callee(doc.write(), __LINE__);
+  return first != 0 ? first : saved;
 }
 
 int polySAR::clone(polySAR* other) const {
