@@ -1,0 +1,382 @@
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <cstdint>
+#include <cstring>
+#include <random>
+#include <string>
+#include <vector>
+
+#include "raster/buffer_file.h"
+#include "raster/buffer_io.h"
+#include "raster/data_file.h"
+#include "raster_fixture.h"
+
+namespace {
+
+using raster_test::PutComponent;
+using raster_test::ReadFile;
+using raster_test::WriteFile;
+
+constexpr int kPixels = 37;
+constexpr int kLines = 7;
+constexpr int kPrefix = 17;
+constexpr int kOffset = 11;
+
+class BufferFileTest : public raster_test::ScratchDir {
+ protected:
+  // A SHORT_COMPLEX raster, most significant byte first, of samples
+  // (line * 100 + sample, -sample), prefixes of the line letter and 0xAA
+  // header bytes; its description is set in *bf.
+  std::string MakeShortComplex(BufferFile* bf) {
+    std::string bytes(kOffset, static_cast<char>(0xAA));
+    for (int k = 0; k < kLines; ++k) {
+      bytes.append(kPrefix, static_cast<char>('a' + k));
+      for (int s = 0; s < kPixels; ++s) {
+        unsigned char p[4];
+        PutComponent(k * 100 + s, CT_SHORT_COMPLEX, true, p);
+        PutComponent(-s, CT_SHORT_COMPLEX, true, p + 2);
+        bytes.append(reinterpret_cast<const char*>(p), 4);
+      }
+    }
+    const std::string name = Path("sc");
+    WriteFile(name, bytes);
+    Describe(bf, name, CT_SHORT_COMPLEX, 1, kOffset);
+    return bytes;
+  }
+  static void Describe(BufferFile* bf, const std::string& name, BufferFile::UnitType type,
+                       int order, int offset) {
+    bf->setFilename(name.c_str());
+    bf->setLines(kLines);
+    bf->setSamples(kPixels);
+    bf->setRowPrefix(kPrefix);
+    bf->setType(type);
+    bf->setFileEndian(order);
+    if (offset > 0) {  // the header offset is set through the header
+      ASSERT_EQ(bf->writehdr(), 0);
+      std::string hdr = ReadFile(name + ".hdr");
+      const size_t at = hdr.find("<HeaderOffset>0</HeaderOffset>");
+      ASSERT_NE(at, std::string::npos);
+      hdr.replace(at, 30, "<HeaderOffset>" + std::to_string(offset) + "</HeaderOffset>");
+      WriteFile(name + ".hdr", hdr);
+      ASSERT_EQ(bf->readhdr(), 0);
+    }
+  }
+};
+
+TEST_F(BufferFileTest, BufferSmallerThanALineReadsTheSameBytes) {
+  BufferFile bf;
+  const std::string bytes = MakeShortComplex(&bf);
+  // Raw reads in odd pieces, then whole windows converted to FLOAT_COMPLEX.
+  std::vector<fcomplex> reference(kPixels * kLines);
+  for (int buffer : {0, 1, 7, 50, 1 << 16}) {
+    for (int history : {0, 5, 1000}) {
+      SCOPED_TRACE("buffer " + std::to_string(buffer) + " history " + std::to_string(history));
+      ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+      ASSERT_EQ(bf.initbuffer(buffer, history), 0);
+      std::string got;
+      char piece[13];
+      for (int64_t n; (n = bf.read(piece, sizeof piece)) > 0;) got.append(piece, n);
+      EXPECT_EQ(got, bytes);
+
+      std::vector<fcomplex> window(kPixels * kLines);
+      ASSERT_EQ(bf.readbuffer(window.data(), 0, kLines, 0, 0), 0);
+      if (buffer == 0 && history == 0) reference = window;
+      EXPECT_EQ(window, reference);
+      EXPECT_EQ(window[3 * kPixels + 5], fcomplex(305.0f, -5.0f));
+      std::vector<char> prefixes(kPrefix * 2);
+      ASSERT_EQ(bf.readprefix(prefixes.data(), 5, 2), 0);
+      EXPECT_EQ(std::string(prefixes.begin(), prefixes.end()),
+                std::string(kPrefix, 'f') + std::string(kPrefix, 'g'));
+      ASSERT_EQ(bf.close(), 0);
+    }
+  }
+}
+
+TEST_F(BufferFileTest, BackwardSeeksInsideTheHistoryStayInMemory) {
+  std::string bytes(300, '\0');
+  for (size_t i = 0; i < bytes.size(); ++i) bytes[i] = static_cast<char>(i);
+  const std::string name = Path("h");
+  WriteFile(name, bytes);
+  BufferFile bf;
+  bf.setFilename(name.c_str());
+  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+  ASSERT_EQ(bf.initbuffer(64, 16), 0);
+  char out[64];
+  ASSERT_EQ(bf.read(out, 30), 30);
+  ASSERT_EQ(bf.read(out, 50), 50);  // refills at 64, keeping 48..63
+  EXPECT_EQ(std::string(out, 50), bytes.substr(30, 50));
+  // Change the file behind the object: what is still in memory stays old.
+  std::string changed = bytes;
+  for (int i = 40; i < 120; ++i) changed[i] = 'X';
+  WriteFile(name, changed);
+  ASSERT_EQ(bf.seek(-32, BufferFile::kSeekCurrent), 0);  // 48: the oldest byte kept
+  EXPECT_EQ(bf.tell(), 48);
+  ASSERT_EQ(bf.read(out, 20), 20);
+  EXPECT_EQ(std::string(out, 20), bytes.substr(48, 20));
+  ASSERT_EQ(bf.seek(47, BufferFile::kSeekSet), 0);  // one byte further: from the disk
+  ASSERT_EQ(bf.read(out, 2), 2);
+  EXPECT_EQ(std::string(out, 2), "XX");
+  ASSERT_EQ(bf.seek(-10, BufferFile::kSeekEnd), 0);
+  EXPECT_EQ(bf.read(out, 64), 10);  // the end of the file ends the request
+  EXPECT_EQ(std::string(out, 10), bytes.substr(290));
+}
+
+// Any mix of seeks, reads and writes in update mode behaves like the same
+// operations on the file's bytes in memory, and every byte written reaches
+// the disk.
+TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
+  for (int buffer : {0, 1, 8, 64, 4096}) {
+    for (int history : {0, 3, 32}) {
+      SCOPED_TRACE("buffer " + std::to_string(buffer) + " history " + std::to_string(history));
+      std::mt19937 rng(static_cast<unsigned>(buffer * 131 + history));
+      std::string model(500, '\0');
+      for (char& c : model) c = static_cast<char>(rng());
+      const std::string name = Path("u");
+      WriteFile(name, model);
+      BufferFile bf;
+      bf.setFilename(name.c_str());
+      ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+      ASSERT_EQ(bf.initbuffer(buffer, history), 0);
+      int64_t pos = 0;
+      std::vector<char> data(300);
+      for (int step = 0; step < 400; ++step) {
+        const int n = static_cast<int>(rng() % (step % 7 == 0 ? 300 : 40));
+        switch (rng() % 4) {
+          case 0: {  // seek, sometimes beyond the end
+            pos = rng() % (model.size() + 30);
+            ASSERT_EQ(bf.seek(pos, BufferFile::kSeekSet), 0);
+            break;
+          }
+          case 1: {
+            const int64_t expect =
+                std::max<int64_t>(0, std::min<int64_t>(n, int64_t(model.size()) - pos));
+            ASSERT_EQ(bf.read(data.data(), n), expect) << "step " << step;
+            if (expect > 0) {
+              ASSERT_EQ(std::string(data.data(), expect), model.substr(pos, expect))
+                  << "step " << step;
+            }
+            pos += expect;
+            break;
+          }
+          default: {
+            for (int i = 0; i < n; ++i) data[i] = static_cast<char>(rng());
+            ASSERT_EQ(bf.write(data.data(), n), n);
+            if (pos + n > int64_t(model.size())) model.resize(pos + n, '\0');
+            model.replace(pos, n, data.data(), n);
+            pos += n;
+          }
+        }
+        ASSERT_EQ(bf.tell(), pos) << "step " << step;
+      }
+      ASSERT_EQ(bf.close(), 0);
+      EXPECT_EQ(ReadFile(name), model);
+    }
+  }
+}
+
+TEST_F(BufferFileTest, WindowsWrittenInUpdateModeReadBackEverywhere) {
+  BufferFile bf;
+  MakeShortComplex(&bf);
+  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+  ASSERT_EQ(bf.initbuffer(50, 20), 0);  // smaller than one line
+  std::vector<fcomplex> in(kPixels * 3);
+  for (size_t i = 0; i < in.size(); ++i) in[i] = fcomplex(i * 2.0f - 60.0f, 1000.0f - i);
+  ASSERT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 0);
+  const std::string marks(kPrefix, '#');
+  ASSERT_EQ(bf.writeprefix(marks.c_str(), 6, 1), 0);
+  // The same object sees its writes before anything is flushed.
+  std::vector<fcomplex> back(kPixels * 3);
+  ASSERT_EQ(bf.readbuffer(back.data(), 2, 3, 0, 0), 0);
+  EXPECT_EQ(back, in);
+  // A copy made now holds them too.
+  ASSERT_EQ(bf.copy(Path("copy").c_str(), 100), 0);
+  ASSERT_EQ(bf.close(), 0);
+
+  for (const std::string& name : {Path("sc"), Path("copy")}) {
+    SCOPED_TRACE(name);
+    DataFile df;
+    ASSERT_EQ(df.read_hdr(name.c_str()), 0);
+    BufferIO io(&df);
+    io.first_line = 1;
+    io.num_lines = 6;
+    io.num_samples = kPixels;
+    io.output_type = CT_FLOAT_COMPLEX;
+    std::vector<fcomplex> all(kPixels * 6);
+    ASSERT_EQ(io.readbuffer(reinterpret_cast<char*>(all.data())), 0);
+    EXPECT_EQ(all[0], fcomplex(100.0f, 0.0f));  // line 1 untouched
+    EXPECT_EQ(std::vector<fcomplex>(all.begin() + kPixels, all.begin() + 4 * kPixels), in);
+    EXPECT_EQ(all[4 * kPixels + 1], fcomplex(501.0f, -1.0f));
+    std::string prefixes(2 * kPrefix, ' ');
+    io.first_line = 5;
+    io.num_lines = 2;
+    ASSERT_EQ(io.readprefix(prefixes.data()), 0);
+    EXPECT_EQ(prefixes, std::string(kPrefix, 'f') + marks);
+  }
+}
+
+TEST_F(BufferFileTest, NewFileWithHeaderBytesAndPrefixes) {
+  const std::string name = Path("new");
+  BufferFile bf;
+  Describe(&bf, name, CT_INT16, 1, 0);
+  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
+  ASSERT_EQ(bf.initbuffer(100, 50), 0);
+  ASSERT_EQ(bf.writeOffset("HEAD", 4), 0);
+  EXPECT_EQ(bf.getOffsetSize(), 4);
+  std::vector<short> line(kPixels);
+  for (int k = kLines - 1; k >= 0; --k) {  // backwards, to move the buffer around
+    for (int s = 0; s < kPixels; ++s) line[s] = static_cast<short>(-k * 1000 - s);
+    ASSERT_EQ(bf.writebuffer(line.data(), k, 1, 0, 0), 0);
+    ASSERT_EQ(bf.writeprefix(std::string(kPrefix, 'A' + k).c_str(), k, 1), 0);
+  }
+  EXPECT_EQ(bf.read(line.data(), 2), 0);  // write mode does not read
+  ASSERT_EQ(bf.close(), 0);
+  ASSERT_EQ(bf.writehdr(), 0);
+
+  const std::string bytes = ReadFile(name);
+  ASSERT_EQ(bytes.size(), 4u + kLines * (kPrefix + 2u * kPixels));
+  EXPECT_EQ(bytes.substr(0, 4), "HEAD");
+  BufferFile check;
+  ASSERT_EQ(check.readhdr((name + ".hdr").c_str()), 0);
+  EXPECT_EQ(check.filename(), name);
+  ASSERT_EQ(check.open(BufferFile::kOpRead), 0);
+  EXPECT_EQ(check.readShort(5, 7), -5007);  // swapped from the big-endian file
+  EXPECT_EQ(check.readInt(5, 7), 0);        // not an INT32 file
+  EXPECT_EQ(check.readShort(kLines, 0), 0);
+  std::vector<char> prefix(kPrefix);
+  ASSERT_EQ(check.readprefix(prefix.data(), 3, 1), 0);
+  EXPECT_EQ(std::string(prefix.begin(), prefix.end()), std::string(kPrefix, 'D'));
+}
+
+TEST_F(BufferFileTest, TypedConversionsRoundHalfAwayFromZero) {
+  const std::vector<float> values = {2.5f, -2.5f, 1.5f, -0.5f, 0.49999997f, 3.49f, 1e6f, -1e6f};
+  const std::vector<int> ints = {3, -3, 2, -1, 0, 3, 1000000, -1000000};
+  const std::vector<short> shorts = {3, -3, 2, -1, 0, 3, 32767, -32768};
+  const int n = static_cast<int>(values.size());
+  BufferFile bf;
+  bf.setFilename(Path("f").c_str());
+  bf.setLines(1);
+  bf.setSamples(n);
+  bf.setType(CT_FLOAT32);
+  bf.setFileEndian(1);
+  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
+  ASSERT_EQ(bf.writebuffer(values.data(), 0, 1, 0, n), 0);
+  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+  std::vector<int> i(n);
+  std::vector<short> s(n);
+  std::vector<double> d(n);
+  ASSERT_EQ(bf.readbuffer(i.data(), 0, 1, 0, n), 0);
+  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
+  ASSERT_EQ(bf.readbuffer(d.data(), 0, 1, 0, n), 0);
+  EXPECT_EQ(i, ints);
+  EXPECT_EQ(s, shorts);
+  EXPECT_EQ(d[3], -0.5);
+  EXPECT_FLOAT_EQ(bf.readFloat(0, 0), 2.5f);
+  // Complex windows take complex files only; the output stays untouched.
+  std::vector<fcomplex> c(n, fcomplex(7, 7));
+  EXPECT_EQ(bf.readbuffer(c.data(), 0, 1, 0, n), 1);
+  EXPECT_EQ(c[0], fcomplex(7, 7));
+
+  // Doubles into an INT16 file, and a SHORT_COMPLEX file into doubles.
+  bf.setType(CT_INT16);
+  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
+  const std::vector<double> halves = {-1.5, 1.5, 0.5, -0.5, 2.4999, 40000, -7, 0};
+  ASSERT_EQ(bf.writebuffer(halves.data(), 0, 1, 0, n), 0);
+  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
+  EXPECT_EQ(s, (std::vector<short>{-2, 2, 1, -1, 2, 32767, -7, 0}));
+  bf.setType(CT_SHORT_COMPLEX);
+  bf.setSamples(n / 2);
+  std::vector<dcomplex> dc(n / 2);
+  ASSERT_EQ(bf.readbuffer(dc.data(), 0, 1, 1, 2), 0);
+  EXPECT_EQ(dc[0], dcomplex(1, -1));
+  EXPECT_EQ(dc[1], dcomplex(2, 32767));
+}
+
+TEST_F(BufferFileTest, HostileSizesAreRefused) {
+  BufferFile bf;
+  MakeShortComplex(&bf);
+  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+  EXPECT_EQ(bf.initbuffer(-1, 0), 1);
+  EXPECT_EQ(bf.initbuffer(INT_MAX, 0), 1);
+  EXPECT_EQ(bf.initbuffer(64, -1), 1);
+  EXPECT_EQ(bf.seek(-1, BufferFile::kSeekSet), 1);
+  EXPECT_EQ(bf.seek(0, 7), 1);
+  char byte;
+  EXPECT_EQ(bf.read(&byte, -5), 0);
+  std::vector<fcomplex> out(kPixels * kLines);
+  EXPECT_EQ(bf.readbuffer(out.data(), -1, 1, 0, 0), 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, -1, 0, 0), 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), kLines - 1, 2, 0, 0), 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, 1, -1, 0), 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, 1, 5, kPixels), 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, INT_MAX, 0, INT_MAX), 1);
+  EXPECT_EQ(bf.writebuffer(out.data(), 0, 1, 0, 0), 1);  // read mode
+  // A description claiming more lines than the file holds reads short.
+  bf.setLines(kLines + 1);
+  EXPECT_EQ(bf.readbuffer(out.data(), kLines, 1, 0, 0), 4);
+  bf.setSamples(-3);
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, 1, 0, 1), 1);
+  bf.close();
+  EXPECT_EQ(bf.readbuffer(out.data(), 0, 1, 0, 1), 9);
+
+  // Damaged headers.
+  const std::string good = ReadFile(Path("sc.hdr"));
+  auto with = [&](const std::string& from, const std::string& to) {
+    std::string h = good;
+    h.replace(h.find(from), from.size(), to);
+    WriteFile(Path("bad.hdr"), h);
+    return BufferFile().readhdr(Path("bad.hdr").c_str());
+  };
+  EXPECT_EQ(with("<NrOfLinesPerImage>7<", "<NrOfLinesPerImage>-5<"), 1);
+  EXPECT_EQ(with("<NrOfPixelsPerLine>37<", "<NrOfPixelsPerLine>2000000000<"), 1);
+  EXPECT_EQ(with("<HeaderOffset>11<", "<HeaderOffset>1e300<"), 1);
+  EXPECT_EQ(with("<CellType>6<", "<CellType>12<"), 1);
+  EXPECT_EQ(with("<NrOfLinesPerImage>7<", "<NrOfLinesPerImage>7<"), 0);
+  EXPECT_EQ(BufferFile().readhdr("a.h"), 1);
+  EXPECT_EQ(BufferFile().readhdr(Path("missing.hdr").c_str()), 1);
+}
+
+TEST_F(BufferFileTest, HeaderFormsOpenTypesAndClone) {
+  // The older parameter-file header.
+  const std::string name = Path("scene");
+  WriteFile(name + ".hdr",
+            "[RasterInfo]\nHeaderOffset = 3000000000\nRowPrefix = 17\nNrOfPixelsPerLine = 100\n"
+            "NrOfLinesPerImage = 20\nCellType = INT16\nByteOrder = MSBFirst\n");
+  BufferFile bf;
+  ASSERT_EQ(bf.readhdr((name + ".hdr").c_str()), 0);
+  EXPECT_EQ(bf.filename(), name);
+  EXPECT_EQ(bf.getOffsetSize(), 3000000000LL);
+  EXPECT_EQ(bf.getType(), CT_INT16);
+  EXPECT_EQ(bf.getFileEndian(), 1);
+  EXPECT_EQ(bf.pixelsizeof(), 2);
+  // Written as the XML block into another file and read back from there.
+  ASSERT_EQ(bf.writehdr(Path("other.hdr").c_str()), 0);
+  BufferFile again;
+  ASSERT_EQ(again.readhdr(Path("other.hdr").c_str()), 0);
+  EXPECT_EQ(again.filename(), Path("other"));
+  EXPECT_EQ(again.getOffsetSize(), 3000000000LL);
+  EXPECT_EQ(again.getRowPrefix(), 17);
+  EXPECT_EQ(again.getLines(), 20);
+
+  BufferFile copy;
+  bf.clone(&copy);
+  EXPECT_EQ(copy.filename(), name);
+  EXPECT_EQ(copy.getSamples(), 100);
+  char shortName[8];
+  EXPECT_EQ(copy.getFilename(shortName, sizeof shortName), 1);
+  EXPECT_EQ(std::string(shortName), name.substr(0, 7));
+
+  EXPECT_EQ(BufferFile().getType(), BufferFile::kTypeNotSet);
+  WriteFile(name, "data");
+  EXPECT_EQ(bf.open(0), 1);
+  EXPECT_FALSE(bf.is_open());
+  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+  EXPECT_TRUE(bf.is_writing());
+  BufferFile missing;
+  missing.setFilename(Path("nothing").c_str());
+  EXPECT_EQ(missing.open(BufferFile::kOpRead), 9);
+  EXPECT_FALSE(missing.exists());
+}
+
+}  // namespace
