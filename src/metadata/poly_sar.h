@@ -2,7 +2,8 @@
 //
 // Each family is a vector of data sets in ascending order of their reference
 // azimuth time.  The plain evaluation (EvaluateDC ...) uses one data set, the
-// first whose reference time is not before the azimuth time; the
+// first whose reference time is not before the azimuth time (the last when
+// there is none); the
 // interpolating forms (EvaluateDCinterp ...) interpolate the coefficients
 // linearly in azimuth between neighbouring data sets (see poly_selection.h).
 //
