@@ -22,18 +22,21 @@
 //   - at a seek that leaves the buffered range,
 //   - before a request that bypasses the buffer,
 //   - at flush(), initbuffer(), copy() and close() (also from the destructor).
-// Update mode follows the same rules as write mode: nothing written is ever
-// dropped, and a failing disk write is reported ("File writing failed!", 5)
-// by the call that triggered it, with the bytes kept pending.  Other readers
-// of the file (another object, another process) see the bytes after flush()
-// or close().
+// Update mode follows the same rules as write mode, so nothing written is
+// dropped: a failing disk write is reported ("File writing failed!", 5) by
+// the call that triggered it, and the bytes stay pending for the next try
+// (close() reports its failure and then lets them go with the file).  Other
+// readers of the file (another object, another process) see the bytes after
+// flush() or close().
 //
 // A forward seek in write or update mode, while bytes are pending, that
 // stays within the buffer's capacity keeps the buffer: the skipped bytes are
-// loaded from the file
-// (zeros beyond its end), so that writing a line after its prefix does not
-// cost a disk write per line.  Zeros loaded this way are written out only
-// when later writes lie beyond them (as a hole in the file would read).
+// loaded from the file (zeros beyond its end), so that writing a line after
+// its prefix does not cost a disk write per line.  Zeros loaded this way are
+// written out only when later writes lie beyond them (as a hole in the file
+// would read).
+//
+// Without a buffer every transfer goes to the file at once.
 //
 // Results: 0 success, 1 inconsistent request (bad size, window outside the
 // raster, unsupported cell type, wrong mode), 4 read failure, 5 write

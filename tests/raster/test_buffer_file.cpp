@@ -3,6 +3,8 @@
 #include <climits>
 #include <cstdint>
 #include <cstring>
+#include <filesystem>
+#include <fstream>
 #include <random>
 #include <string>
 #include <vector>
@@ -215,6 +217,24 @@ TEST_F(BufferFileTest, WindowsWrittenInUpdateModeReadBackEverywhere) {
   }
 }
 
+// A full disk: every way out of the buffer reports the failure.
+TEST_F(BufferFileTest, FailingDiskWritesAreReported) {
+  if (!std::ifstream("/dev/full")) GTEST_SKIP() << "no /dev/full";
+  BufferFile bf;
+  bf.setFilename("/dev/full");
+  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+  const char data[100] = {1};
+  EXPECT_EQ(bf.write(data, 10), 0);  // unbuffered: nothing accepted
+  ASSERT_EQ(bf.initbuffer(64, 8), 0);
+  EXPECT_EQ(bf.write(data, 10), 10);
+  EXPECT_EQ(bf.flush(), 5);
+  EXPECT_EQ(bf.seek(1000, BufferFile::kSeekSet), 5);
+  EXPECT_EQ(bf.write(data, 100), 0);  // would go past the buffer to the disk
+  EXPECT_EQ(bf.write(data, 20), 20);
+  EXPECT_EQ(bf.write(data, 40), 34);  // the rest needs the disk
+  EXPECT_EQ(bf.close(), 5);
+}
+
 TEST_F(BufferFileTest, NewFileWithHeaderBytesAndPrefixes) {
   const std::string name = Path("new");
   BufferFile bf;
@@ -335,6 +355,32 @@ TEST_F(BufferFileTest, HostileSizesAreRefused) {
   EXPECT_EQ(with("<NrOfLinesPerImage>7<", "<NrOfLinesPerImage>7<"), 0);
   EXPECT_EQ(BufferFile().readhdr("a.h"), 1);
   EXPECT_EQ(BufferFile().readhdr(Path("missing.hdr").c_str()), 1);
+}
+
+TEST_F(BufferFileTest, OffsetsBeyondFourGiB) {
+  const std::string name = Path("far");
+  WriteFile(name + ".hdr",
+            "[RasterInfo]\nHeaderOffset = 5000000000\nRowPrefix = 3\nNrOfPixelsPerLine = 4\n"
+            "NrOfLinesPerImage = 2\nCellType = INT32\nByteOrder = LSBFirst\n");
+  WriteFile(name, "");
+  std::filesystem::resize_file(name, 5000000000LL + 2 * 19);  // sparse
+  BufferFile bf;
+  ASSERT_EQ(bf.readhdr(), 1);  // no name yet
+  bf.setFilename(name.c_str());
+  ASSERT_EQ(bf.readhdr(), 0);
+  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+  ASSERT_EQ(bf.initbuffer(32, 8), 0);
+  const int line[4] = {1, -2, 3, -4};
+  ASSERT_EQ(bf.writebuffer(line, 1, 1, 0, 0), 0);
+  EXPECT_EQ(bf.readInt(1, 3), -4);
+  ASSERT_EQ(bf.close(), 0);
+  DataFile df;
+  ASSERT_EQ(df.read_hdr(name.c_str()), 0);
+  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
+  int back[4];
+  ASSERT_EQ(df.seek(5000000000LL + 19 + 3, DataFile::kSeekSet), 0);
+  ASSERT_EQ(df.read(back, sizeof back), 0);
+  EXPECT_EQ(std::vector<int>(back, back + 4), std::vector<int>(line, line + 4));
 }
 
 TEST_F(BufferFileTest, HeaderFormsOpenTypesAndClone) {
