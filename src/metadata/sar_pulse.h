@@ -1,7 +1,7 @@
 // The transmitted pulse: a linear frequency-modulated chirp.
 #pragma once
 
-#include "metadata/complex_types.h"
+#include "raster/complex_sample.h"
 #include "metadata/general_sar_base.h"
 
 class SARPulse_Obj : public GeneralSAR_Base {
