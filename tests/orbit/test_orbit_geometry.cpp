@@ -1,0 +1,203 @@
+// Direct and inverse geometry of GeneralSAROrbit on a closed-form circular
+// orbit: the satellite's true position and velocity come from the formula,
+// not from the orbit model.
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+#include "metadata/geo_coords.h"
+#include "metadata/gs_roi.h"
+#include "metadata/poly_families.h"
+#include "orbit/earth_constants.h"
+#include "orbit/general_sar_orbit.h"
+#include "orbit/gr_pt.h"
+#include "orbit_test_files.h"
+
+using namespace orbit_test;
+
+namespace {
+
+constexpr double kDt = 5.0;
+constexpr int kN = 31;
+
+double Dot(const double a[3], const double b[3]) {
+  return a[0] * b[0] + a[1] * b[1] + a[2] * b[2];
+}
+
+class Geometry : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    orbit_.tNode = 7.3e8;
+    t0_ = orbit_.tNode + 900.0;  // descending through mid latitudes
+    ASSERT_EQ(o_.SVCreate(t0_, kDt, kN), 0);
+    for (int i = 0; i < kN; ++i)
+      orbit_.at(t0_ + i * kDt, o_.positions() + 3 * i, o_.velocities() + 3 * i);
+    ASSERT_EQ(o_.computeApproximateSV(), 0);
+    // 0.3 ms (45 km of slant range) from a look angle of 30 degrees.
+    roi_.SetFastAxe(6.2e-3, 1e-8, 30000);
+    roi_.SetSlowAxe(t0_ + 50.0, 1e-3, 20000);
+    dc_.pol[0] = 300.0;
+    dc_.pol[1] = -2e5;
+    dc_.trg0_s = 6.2e-3;
+  }
+  double last() const { return t0_ + (kN - 1) * kDt; }
+  double az() const { return t0_ + 60.0; }
+  double fdc(double rt) const { return 300.0 - 2e5 * (rt - 6.2e-3); }
+
+  CircularOrbit orbit_;
+  double t0_ = 0.0;
+  GeneralSAROrbit o_;
+  ROI_Obj roi_;
+  polyDC dc_;
+};
+
+// The ground point lies on the range sphere, the ellipsoid and the Doppler
+// cone of the true orbit, on the requested side; incidence and look angle
+// are the angles of the triangle Earth centre, satellite, ground point.
+TEST_F(Geometry, GroundPointAndAnglesOfTheTrueOrbit) {
+  const double lambda = GeneralSAROrbit::kDefaultLambda;
+  for (int side : {1, -1}) {
+    o_.setLookSign(side);
+    for (double t : {t0_ + 1.0, t0_ + 71.3, last() - 0.2}) {
+      for (double tau : {5.6e-3, 6.1e-3, 6.8e-3}) {
+        for (double fdc : {0.0, 420.0, -1300.0}) {
+          double G[3], P[3], V[3];
+          ASSERT_EQ(o_.sat2earth(t, tau, fdc, G), 0);
+          orbit_.at(t, P, V);
+          const double D[3] = {G[0] - P[0], G[1] - P[1], G[2] - P[2]};
+          const double range = std::sqrt(Dot(D, D)), rs = std::sqrt(Dot(P, P)),
+                       rg = std::sqrt(Dot(G, G));
+          EXPECT_NEAR(range, tau * kHalfSpeedOfLight, 1e-4);
+          EXPECT_NEAR((G[0] * G[0] + G[1] * G[1]) / kWgs84A2 + G[2] * G[2] / kWgs84B2, 1.0, 1e-12);
+          EXPECT_NEAR(2.0 / lambda * Dot(V, D) / range, fdc, 1e-3);
+          double right[3] = {V[1] * P[2] - V[2] * P[1], V[2] * P[0] - V[0] * P[2],
+                             V[0] * P[1] - V[1] * P[0]};
+          EXPECT_GT(Dot(D, right) * side, 0.0);
+          double inc = 0.0, look = 0.0;
+          ASSERT_EQ(o_.SVGetAngles(t, tau, fdc, &inc, &look), 0);
+          const double lookTrue =
+              std::acos((rs * rs + range * range - rg * rg) / (2.0 * rs * range)) * kRadToDeg;
+          const double incTrue =
+              std::acos((rs * rs - rg * rg - range * range) / (2.0 * rg * range)) * kRadToDeg;
+          EXPECT_NEAR(look, lookTrue, 1e-4);
+          EXPECT_NEAR(inc, incTrue, 1e-4);
+        }
+      }
+    }
+  }
+}
+
+TEST_F(Geometry, RoundTripThroughTheInverseSearch) {
+  for (double fdc : {0.0, 350.0, -1200.0}) {
+    for (double t : {t0_ + 0.3, t0_ + 12.0, t0_ + 64.4, t0_ + 111.1, last() - 0.1}) {
+      for (double tau : {5.6e-3, 6.2e-3, 6.7e-3}) {
+        double G[3];
+        ASSERT_EQ(o_.sat2earth(t, tau, fdc, G), 0);
+        double ta = 0.0, ra = 0.0;
+        ASSERT_EQ(o_.earth2sat(G, &ta, &ra, fdc), 0) << t << " " << tau << " " << fdc;
+        EXPECT_NEAR(ta, t, 1e-6);
+        EXPECT_NEAR(ra, tau, 1e-10);
+        // The first search of the precise form runs on the whole orbit and
+        // may step beyond its ends for points seen at the very first or last
+        // vector.
+        if (t - t0_ > 1.0 && last() - t > 1.0) {
+          ASSERT_EQ(o_.earth2satPrecise(G, &ta, &ra, fdc), 0);
+          EXPECT_NEAR(ta, t, 1e-6);
+          EXPECT_NEAR(ra, tau, 1e-10);
+        }
+        // The straight-line estimate is good enough to choose the window.
+        ASSERT_EQ(o_.earth2satLinear(G, &ta, &ra, fdc), 0);
+        EXPECT_NEAR(ta, t, 0.5 * kDt);
+        EXPECT_NEAR(ra, tau, 1e-5);
+        if (fdc == 0.0) {
+          EXPECT_NEAR(o_.earth2satAzimuth(G[0], G[1], G[2]), t, 1e-6);
+          EXPECT_NEAR(o_.earth2satRange(G), tau, 1e-10);
+        }
+      }
+    }
+  }
+}
+
+TEST_F(Geometry, PolynomialsFollowTheDirectGeometry) {
+  polyFR fr, fr2;
+  ASSERT_EQ(o_.SVGetFRpoly(&roi_, &dc_, &fr), 0);
+  ASSERT_EQ(o_.SVGetFRpoly_v2(&roi_, &dc_, &fr2), 0);
+  EXPECT_EQ(fr.trg0_s, 6.2e-3);
+  EXPECT_EQ(fr.taz0_s, az());
+  polySL2GR sl2gr;
+  polyGR2SL gr2sl;
+  ASSERT_EQ(o_.SVGetGroundToSlantPolys(&roi_, &dc_, &sl2gr, &gr2sl), 0);
+  polySL2THETA theta;
+  polySL2PHI phi;
+  ASSERT_EQ(o_.SVGetSlantToAnglesPolys(&roi_, &dc_, &theta, &phi), 0);
+
+  // Ground range from the near edge, by fine steps of the direct geometry.
+  double previous[3];
+  ASSERT_EQ(o_.sat2earth(az(), 6.2e-3, fdc(6.2e-3), previous), 0);
+  double ground = 0.0;
+  for (int i = 1; i <= 60; ++i) {
+    const double rt = 6.2e-3 + i * 5e-6;
+    double G[3];
+    ASSERT_EQ(o_.sat2earth(az(), rt, fdc(rt), G), 0);
+    const double d[3] = {G[0] - previous[0], G[1] - previous[1], G[2] - previous[2]};
+    ground += std::sqrt(Dot(d, d));
+    for (int a = 0; a < 3; ++a) previous[a] = G[a];
+    if (i % 7 != 3) continue;
+    double value = 0.0;
+    sl2gr.EvaluatePoly(rt, az(), &value);
+    // A parabola over 70 km of ground: within 3e-4 of the ground range.
+    EXPECT_NEAR(value, ground, 25.0) << rt;
+    gr2sl.EvaluatePoly(ground, az(), &value);
+    EXPECT_NEAR(value, rt, 3e-8) << rt;  // 4.5 m of slant range
+    const double rate = o_.SVGetFR(az(), rt, fdc(rt));
+    fr.EvaluatePoly(rt, az(), &value);
+    EXPECT_NEAR(value, rate, 1e-4 * std::fabs(rate)) << rt;
+    fr2.EvaluatePoly(rt, az(), &value);
+    EXPECT_NEAR(value, rate, 1e-4 * std::fabs(rate)) << rt;
+    double inc = 0.0, look = 0.0;
+    ASSERT_EQ(o_.SVGetAngles(az(), rt, fdc(rt), &inc, &look), 0);
+    theta.EvaluatePoly(rt, az(), &value);
+    EXPECT_NEAR(value, inc, 5e-4) << rt;
+    phi.EvaluatePoly(rt, az(), &value);
+    EXPECT_NEAR(value, look, 5e-4) << rt;
+  }
+}
+
+// Points and times outside the orbit, ranges short of the Earth and empty
+// regions.
+TEST_F(Geometry, BadQueriesGiveTheirCodes) {
+  double P[3], V[3], G[3], t = 0.0, tau = 0.0, lat = 0.0, lon = 0.0;
+  orbit_.at(last() + 120.0, P, V);  // seen two minutes after the last vector
+  ASSERT_EQ(gr_pt(P, V, 5.6e-3, 0.0, 0.05, 0.0, 1, kWgs84A, kWgs84B, G), 0);
+  EXPECT_EQ(o_.earth2sat(G, &t, &tau), 12);
+  EXPECT_EQ(t, -1.0);
+  EXPECT_EQ(tau, -1.0);
+  EXPECT_EQ(o_.earth2satPrecise(G, &t, &tau), 12);
+  EXPECT_EQ(o_.earth2satAzimuth(G), -1.0);
+  const double bad[3] = {NAN, 0.0, 0.0};
+  EXPECT_EQ(o_.earth2sat(bad, &t, &tau), 12);
+  EXPECT_EQ(o_.SVGetLatLon(last() + 0.6 * kDt, 5.6e-3, &lat, &lon), -1);
+  EXPECT_EQ(o_.SVGetLatLon(t0_ - 0.5 * kDt, 5.6e-3, &lat, &lon), 0);
+  EXPECT_EQ(o_.sat2earth(t0_ - 100.0, 5.6e-3, G), -1);
+  EXPECT_TRUE(std::isnan(o_.sat2earthX(t0_ - 100.0, 5.6e-3)));
+  EXPECT_EQ(o_.sat2earth(t0_ + 50.0, 1e-3, G), 2);
+
+  polyFR fr;
+  ROI_Obj flat = roi_, late = roi_;
+  flat.SetFastAxe(6.2e-3, 0.0, 100);
+  EXPECT_EQ(o_.SVGetFRpoly(&flat, &dc_, &fr), 1);
+  flat.FastTimeLength = NAN;
+  EXPECT_EQ(o_.SVGetFRpoly_v2(&flat, &dc_, &fr), 1);
+  late.SlowStartTime = last() + 100.0;
+  EXPECT_EQ(o_.SVGetFRpoly(&late, &dc_, &fr), -1);
+  geoCoords_Obj gc;
+  GSRoi_Obj region;
+  region.roi = roi_;
+  region.roi.SlowTimeLength = -1.0;
+  EXPECT_EQ(o_.SVGetGeoCoords(&gc, &region), 1);
+  region.roi = roi_;
+  region.roi.SlowStartTime = 0.0;  // relative times are not on the orbit
+  EXPECT_EQ(o_.SVGetGeoCoords(&gc, &region), -1);
+}
+
+}  // namespace

@@ -1,0 +1,150 @@
+// The orbit geometry against the generator's own zero-Doppler geometry: the
+// generator follows the real DORIS orbit with its own interpolation and
+// intersects each line of sight with the ellipsoid by itself; its truth file
+// holds the corners and centres of every sub-swath.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <string>
+
+#include "metadata/geo_coords.h"
+#include "metadata/gs_roi.h"
+#include "orbit/earth_constants.h"
+#include "orbit/general_sar_orbit.h"
+#include "orbit/geodetic.h"
+#include "synth_run.h"
+
+namespace {
+
+using synth_test::SynthRun;
+
+std::string Text(const SynthRun& run, const std::string& section, const std::string& key) {
+  const auto s = run.truth.find(section);
+  if (s == run.truth.end() || s->second.count(key) == 0) return "nan";
+  return s->second.at(key);
+}
+
+double Value(const SynthRun& run, const std::string& section, const std::string& key) {
+  return std::atof(Text(run, section, key).c_str());
+}
+
+// Earth-fixed point of a latitude and longitude (degrees) on the ellipsoid.
+void Cartesian(double lat, double lon, double out[3]) {
+  const double llh[3] = {lat / kRadToDeg, lon / kRadToDeg, 0.0};
+  geo2cart(out, llh);
+}
+
+double Distance(const double a[3], const double b[3]) {
+  return std::sqrt((a[0] - b[0]) * (a[0] - b[0]) + (a[1] - b[1]) * (a[1] - b[1]) +
+                   (a[2] - b[2]) * (a[2] - b[2]));
+}
+
+// One truth point of a sub-swath.
+struct TruthPoint {
+  const char* name;  // key prefix of latitude and longitude
+  const char* time;
+  const char* range;
+};
+const TruthPoint kPoints[] = {{"FirstNear", "FirstLineTime", "NearRangeTime"},
+                              {"FirstFar", "FirstLineTime", "FarRangeTime"},
+                              {"LastNear", "LastLineTime", "NearRangeTime"},
+                              {"LastFar", "LastLineTime", "FarRangeTime"},
+                              {"Centre", "CentreTime", "CentreRangeTime"}};
+
+class SynthTruth : public ::testing::TestWithParam<const char*> {
+ protected:
+  static void SetUpTestSuite() {
+    runs_[0] = new SynthRun(synth_test::run_synth("--pass descending --pattern flat"));
+    runs_[1] = new SynthRun(synth_test::run_synth("--pass ascending --pattern flat"));
+  }
+  static void TearDownTestSuite() {
+    for (SynthRun*& r : runs_) {
+      synth_test::remove_run(*r);
+      delete r;
+      r = nullptr;
+    }
+  }
+  void SetUp() override {
+    run_ = runs_[std::string(GetParam()) == "ascending" ? 1 : 0];
+    ASSERT_EQ(run_->exit_code, 0);
+    const double start = Value(*run_, "SubSwath1", "FirstLineTime");
+    const double stop = Value(*run_, "SubSwath1", "LastLineTime");
+    const std::string file = run_->dir + Text(*run_, "Scene", "OrbitFile");
+    ASSERT_EQ(orbit_.GetStateVectorsENVI(file.c_str(), start, stop - start), 0) << file;
+    ASSERT_EQ(orbit_.isAscending(), std::string(GetParam()) == "ascending");
+  }
+  std::string Swath(int k) const { return "SubSwath" + std::to_string(k); }
+
+  static SynthRun* runs_[2];
+  const SynthRun* run_ = nullptr;
+  GeneralSAROrbit orbit_;
+};
+
+SynthRun* SynthTruth::runs_[2] = {nullptr, nullptr};
+
+TEST_P(SynthTruth, GroundPointsOfEverySubSwath) {
+  for (int k = 1; k <= 5; ++k) {
+    for (const TruthPoint& p : kPoints) {
+      const double t = Value(*run_, Swath(k), p.time);
+      const double tau = Value(*run_, Swath(k), p.range);
+      double truth[3], g[3], lat = 0.0, lon = 0.0, h[3];
+      Cartesian(Value(*run_, Swath(k), std::string(p.name) + "Lat"),
+                Value(*run_, Swath(k), std::string(p.name) + "Lon"), truth);
+      ASSERT_EQ(orbit_.sat2earth(t, tau, g), 0);
+      EXPECT_LT(Distance(g, truth), 0.1) << Swath(k) << " " << p.name;
+      ASSERT_EQ(orbit_.SVGetLatLon(t, tau, &lat, &lon), 0);
+      Cartesian(lat, lon, h);
+      EXPECT_LT(Distance(h, truth), 0.1) << Swath(k) << " " << p.name;
+    }
+    // The look angle from the geocentric nadir, as the generator measures it.
+    double inc = 0.0, look = 0.0;
+    ASSERT_EQ(orbit_.SVGetAngles(Value(*run_, Swath(k), "CentreTime"),
+                                 Value(*run_, Swath(k), "CentreRangeTime"), &inc, &look),
+              0);
+    EXPECT_NEAR(look, Value(*run_, Swath(k), "CentreLookAngle"), 1e-4) << Swath(k);
+  }
+}
+
+TEST_P(SynthTruth, CornersOfEverySubSwath) {
+  for (int k = 1; k <= 5; ++k) {
+    GSRoi_Obj region;
+    const double near = Value(*run_, Swath(k), "NearRangeTime");
+    const double first = Value(*run_, Swath(k), "FirstLineTime");
+    region.roi.FastStartTime = near;
+    region.roi.FastTimeLength = Value(*run_, Swath(k), "FarRangeTime") - near;
+    region.roi.SlowStartTime = first;
+    region.roi.SlowTimeLength = Value(*run_, Swath(k), "LastLineTime") - first;
+    geoCoords_Obj gc;
+    ASSERT_EQ(orbit_.SVGetGeoCoords(&gc, &region), 0);
+    // Right-looking: an ascending pass sees the west at near range and goes
+    // north; a descending one sees the west at far range and goes south.
+    const bool ascending = std::string(GetParam()) == "ascending";
+    const struct {
+      const geopoint* point;
+      const char* truth;
+    } corners[] = {{&gc.NorthWest, ascending ? "LastNear" : "FirstFar"},
+                   {&gc.NorthEast, ascending ? "LastFar" : "FirstNear"},
+                   {&gc.SouthWest, ascending ? "FirstNear" : "LastFar"},
+                   {&gc.SouthEast, ascending ? "FirstFar" : "LastNear"},
+                   {&gc.Center, "Centre"}};
+    for (const auto& c : corners) {
+      double truth[3], got[3];
+      Cartesian(Value(*run_, Swath(k), std::string(c.truth) + "Lat"),
+                Value(*run_, Swath(k), std::string(c.truth) + "Lon"), truth);
+      Cartesian(c.point->latitude, c.point->longitude, got);
+      EXPECT_LT(Distance(got, truth), 1.0) << Swath(k) << " " << c.truth;
+      EXPECT_EQ(c.point->height, 0.0);
+      EXPECT_GT(c.point->incidence, c.point->lookAngle);
+    }
+    // The names fit the map.
+    EXPECT_GT(gc.NorthWest.latitude, gc.SouthWest.latitude);
+    EXPECT_GT(gc.NorthEast.latitude, gc.SouthEast.latitude);
+    EXPECT_LT(gc.NorthWest.longitude, gc.NorthEast.longitude);
+    EXPECT_LT(gc.SouthWest.longitude, gc.SouthEast.longitude);
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Passes, SynthTruth, ::testing::Values("descending", "ascending"));
+
+}  // namespace
