@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 
+#include "orbit/earth_constants.h"
 #include "orbit/get_state_vectors_envi.h"
 #include "orbit/orbit_fit.h"
 #include "orbit/orbit_poly.h"
@@ -114,7 +115,7 @@ int GeneralSAROrbit::computeRotationMatrix(const double v[3], double R[9], doubl
   if (!all_finite(v, 3) || !(h > 0.0)) VLR_FAIL("Degenerate track direction", 1);
   // A track due north or south (vx = 0) takes the limit from vx > 0.
   const double s = v[0] < 0.0 ? -1.0 : 1.0;
-  const double a = v[0] != 0.0 ? std::atan(-v[1] / v[0]) : (v[1] > 0.0 ? -M_PI / 2 : M_PI / 2);
+  const double a = v[0] != 0.0 ? std::atan(-v[1] / v[0]) : (v[1] > 0.0 ? -kPi / 2 : kPi / 2);
   const double b = std::atan(-v[2] / (s * h));
   const double ca = std::cos(a), sa = std::sin(a), cb = std::cos(b), sb = std::sin(b);
   const double m[9] = {ca * cb, sa, sb * ca, -sa * cb, ca, -sa * sb, -sb, 0.0, cb};

@@ -18,7 +18,6 @@
 class geoCoords_Obj;
 class GSRoi_Obj;
 class ROI_Obj;
-class poly;
 class polyDC;
 class polyFR;
 class polySL2GR;
@@ -71,8 +70,9 @@ class GeneralSAROrbit : public GeneralSAR_Base {
 
   // Block "StateVectorData" of channel 1, or else the parameter-file keys
   // "TimeFirst", "TimeDelta", "nStateVectors", "pos", "vel" of that section
-  // (4 when one is missing); then computeApproximateSV.  Write: 0 or the
-  // writer's code.
+  // (read as the state vector section does: 4 when one is missing, 1 for an
+  // invalid count); then SVCreate (1 with fewer than five vectors) and
+  // computeApproximateSV.  Write: 0 or the writer's code.
   int readhdr(const char* file) override;
   int writehdr(const char* file) override;
   using GeneralSAR_Base::writehdr;
@@ -151,7 +151,9 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   // failure both results are -1.0.
   int earth2sat(const double G[3], double* t, double* tau, double fdc = 0.0);
   // The same with a first search on the global polynomials of the whole
-  // orbit instead of the straight-line estimate.
+  // orbit instead of the straight-line estimate.  That search may step
+  // beyond the orbit and fail with 12 for points seen within about a second
+  // of the first or last vector.
   int earth2satPrecise(const double G[3], double* t, double* tau, double fdc = 0.0);
   // The straight-line estimate only (mean track, then the chord of the
   // window there).  0; 1 without vectors.
@@ -199,10 +201,11 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   int checkSpan(double t) const;
   // Fills `record` with the window of t and solves it.
   int groundPoint(double t, double tau, double fdc, gr_pt_record* record);
-  // The straight-line estimate of earth2satLinear, relative to vector k
-  // with the track v: time after vector k and the delay.
-  int linearEstimate(const double G[3], int k, const double v[3], double fdc, double* t,
-                     double* tau) const;
+  // The straight-line estimate of earth2satLinear, relative to vector k on
+  // the track v with its rotation R and signed speed: time after vector k
+  // and the delay.
+  int linearEstimate(const double G[3], int k, const double v[3], const double R[9], double speed,
+                     double fdc, double* t, double* tau) const;
   // The result buffer, filled with NaN when `code` is not 0.
   const double* resultOrNaN(int code);
   // m ground points of a region for the polynomial products: range offsets

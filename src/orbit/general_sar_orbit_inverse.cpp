@@ -13,11 +13,9 @@ constexpr const char* kModule = "generalSARorbit";
 
 }  // namespace
 
-int GeneralSAROrbit::linearEstimate(const double G[3], int k, const double v[3], double fdc,
-                                    double* t, double* tau) const {
+int GeneralSAROrbit::linearEstimate(const double G[3], int k, const double v[3], const double R[9],
+                                    double speed, double fdc, double* t, double* tau) const {
   VLR_SCOPE("GeneralSAROrbit::linearEstimate", kModule);
-  double R[9], speed = 0.0;
-  VLR_CALL(computeRotationMatrix(v, R, &speed));
   const double* p = positions_.data() + 3 * k;
   const double d[3] = {G[0] - p[0], G[1] - p[1], G[2] - p[2]};
   // Coordinates in the track frame: x along the track.
@@ -48,14 +46,15 @@ int GeneralSAROrbit::earth2satLinear(const double G[3], double* t, double* tau, 
   double v[3];
   const double* p = positions_.data();
   for (int a = 0; a < 3; ++a) v[a] = (p[3 * (n_ - 1) + a] - p[a]) / ((n_ - 1) * dt_);
-  double tl = 0.0, taul = 0.0;
-  VLR_CALL(linearEstimate(G, 0, v, fdc, &tl, &taul));
+  double tl = 0.0, taul = 0.0, R[9], speed = 0.0;
+  VLR_CALL(linearEstimate(G, 0, v, rotation_, trackSpeed_, fdc, &tl, &taul));
   if (!std::isfinite(tl)) VLR_FAIL("Point not seen within the orbit", 12);
   int k = static_cast<int>(std::fmax(-1e6, std::fmin(std::round(tl / dt_), 1e6))) - 2;
   if (k < 1) k = 0;
   if (k > n_ - 5) k = n_ - 5;
   for (int a = 0; a < 3; ++a) v[a] = (p[3 * (k + 4) + a] - p[3 * k + a]) / (4.0 * dt_);
-  VLR_CALL(linearEstimate(G, k, v, fdc, &tl, &taul));
+  VLR_CALL(computeRotationMatrix(v, R, &speed));
+  VLR_CALL(linearEstimate(G, k, v, R, speed, fdc, &tl, &taul));
   *t = t0_ + k * dt_ + tl;
   *tau = taul;
   return 0;
