@@ -13,29 +13,12 @@
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/working_file.h"
 
 namespace {
 
 constexpr const char* kModule = "vlr_generic_utility";
-constexpr int kOpenAttempts = 10;
 constexpr int kMaxPercent = 99;
-constexpr size_t kLineMax = 1025;
-
-std::string readLine(FILE* f, bool& got) {
-  char buffer[kLineMax + 2];
-  got = std::fgets(buffer, sizeof buffer, f) != nullptr;
-  if (!got) return "";
-  std::string line = buffer;
-  if (!line.empty() && line.back() == '\n') {
-    line.pop_back();
-  } else {
-    int c;
-    while ((c = std::fgetc(f)) != EOF && c != '\n') {
-    }
-  }
-  if (!line.empty() && line.back() == '\r') line.pop_back();
-  return line;
-}
 
 void traceStreamState(FILE* f, int attempt) {
   if (!NVLR_UTILITY_IsTraceOn()) return;
@@ -62,21 +45,20 @@ int getAndSetPerc(int previous, int current, const char* message) {
     NVLR_UTILITY_TracePrint(" attempt create : %d\n", 1);
     f = std::fopen(working.c_str(), "w+");
   } else {
-    for (int attempt = 1; attempt <= kOpenAttempts; ++attempt) {
+    for (int attempt = 1; attempt <= kWorkingOpenAttempts; ++attempt) {
       f = std::fopen(working.c_str(), "r+");
       if (f != nullptr) break;
       traceStreamState(f, attempt);
       const int error = errno;
-      if (error != EINTR && error != EAGAIN && error != EBUSY) break;
+      if (!VlrTransientOpenError(error)) break;
       sleep(static_cast<unsigned>(attempt - 1));
     }
   }
   if (f == nullptr) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
   }
-  bool got = false;
-  const std::string first = readLine(f, got);
-  const std::string second = readLine(f, got);
+  const std::string first = VlrReadWorkingLine(f);
+  const std::string second = VlrReadWorkingLine(f);
   if (std::atoi(first.c_str()) > 100) {
     std::fclose(f);
     NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());

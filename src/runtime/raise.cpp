@@ -15,6 +15,7 @@
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/suite_state.h"
+#include "runtime/working_file.h"
 
 using vlr_detail::suite;
 
@@ -24,34 +25,11 @@ constexpr size_t kLabelMax = 24999;
 constexpr size_t kFileMax = 259;
 constexpr size_t kTextMax = 1025;
 constexpr size_t kExtraMax = 1027;
-constexpr int kOpenAttempts = 10;
-constexpr size_t kWorkingLineMax = 1025;
 
 std::string cut(const char* s, size_t n) {
   std::string r = s ? s : "";
   if (r.size() > n) r.resize(n);
   return r;
-}
-
-// Reads one line of at most kWorkingLineMax characters, without its end.
-std::string readLine(FILE* f) {
-  char buffer[kWorkingLineMax + 2];
-  if (std::fgets(buffer, sizeof buffer, f) == nullptr) return "";
-  std::string line = buffer;
-  if (!line.empty() && line.back() == '\n') {
-    line.pop_back();
-  } else {
-    int c;
-    while ((c = std::fgetc(f)) != EOF && c != '\n') {
-    }
-  }
-  return line;
-}
-
-// Opening fails on Linux for lasting reasons (missing file, permissions);
-// only transient failures are worth the host's retry schedule.
-bool transient(int error) {
-  return error == EINTR || error == EAGAIN || error == EBUSY || error == ETXTBSY;
 }
 
 }  // namespace
@@ -122,15 +100,15 @@ std::string NVLR_UTILITY_RecordError(int code, const char* extra1, const char* e
       std::fclose(f);
     }
     FILE* w = nullptr;
-    for (int attempt = 0; attempt < kOpenAttempts; ++attempt) {
+    for (int attempt = 0; attempt < kWorkingOpenAttempts; ++attempt) {
       w = std::fopen(s.workingFile.c_str(), "r+");
-      if (w != nullptr || !transient(errno)) break;
+      if (w != nullptr || !VlrTransientOpenError(errno)) break;
       sleep(static_cast<unsigned>(attempt));
     }
     const std::string status = code == vlr::kCodeWarnings ? "-2\n" : "-1\n";
     if (w != nullptr) {
-      readLine(w);
-      const std::string second = readLine(w);
+      VlrReadWorkingLine(w);
+      const std::string second = VlrReadWorkingLine(w);
       std::rewind(w);
       std::fputs(status.c_str(), w);
       std::fputs((second + "\n").c_str(), w);
