@@ -74,6 +74,9 @@ TEST_F(Tool, UnknownCommandWordsEndWith456963) {
 TEST_F(Tool, MissingInstallationWritesNothing) {
   RunResult r = inst_.run("main_import_ESA#x", {{"VELORAN_INIT_DIR", ""}});
   EXPECT_EQ(r.status, 255);
+  // Only the standard error stream tells the code before the catalogs exist.
+  EXPECT_NE(r.err.find("AN ERROR OCCUR DURING Veloran INIT  : [783360]\n"), std::string::npos);
+  EXPECT_NE(r.err.find("\nwindir\n"), std::string::npos);
   EXPECT_FALSE(Exists(inst_.working() + "Process.log"));
   EXPECT_FALSE(Exists(inst_.workingFile() + "_error"));
   // windir is the second place looked at.
@@ -87,11 +90,18 @@ TEST_F(Tool, BrokenConfigurationFails) {
   const std::string good = ReadFile(ini);
   // Missing configuration: 261122; thirteen lines or an over-long line: 783360.
   std::remove(ini.c_str());
-  EXPECT_EQ(inst_.run("main_import_ESA#x").status, 255);
+  RunResult r = inst_.run("main_import_ESA#x");
+  EXPECT_EQ(r.status, 255);
+  EXPECT_NE(r.err.find("[EC : 261122]\n" + ini + "\n"), std::string::npos) << r.err;
   WriteFile(ini, good.substr(0, good.rfind("NaN")));
-  EXPECT_EQ(inst_.run("main_import_ESA#x").status, 255);
+  r = inst_.run("main_import_ESA#x");
+  EXPECT_EQ(r.status, 255);
+  EXPECT_NE(r.err.find("[783360]\n [EC : 783360]\n"), std::string::npos) << r.err;
   WriteFile(ini, std::string(600, 'w') + "/\n" + good);
-  EXPECT_EQ(inst_.run("main_import_ESA#x").status, 255);
+  r = inst_.run("main_import_ESA#x");
+  EXPECT_EQ(r.status, 255);
+  EXPECT_NE(r.err.find("[EC : 783360]\n"), std::string::npos);
+  EXPECT_NE(r.err.find("too long\n"), std::string::npos) << r.err;
   EXPECT_FALSE(Exists(inst_.working() + "Process.log"));
 }
 
