@@ -1,5 +1,5 @@
 // Helpers of the raster tests: a scratch directory and an independent
-// encoder of sample values in either byte order.
+// encoder of sample values and whole rasters in either byte order.
 #pragma once
 
 #include <gtest/gtest.h>
@@ -7,14 +7,15 @@
 #include <unistd.h>
 
 #include <cstdint>
-#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <string>
-#include <vector>
 
 namespace raster_test {
+
+constexpr int kPrefix = 17;  // the line header of ENVISAT image lines
+constexpr int kOffset = 11;  // header bytes before the first line
 
 class ScratchDir : public ::testing::Test {
  protected:
@@ -39,13 +40,10 @@ inline std::string ReadFile(const std::string& path) {
   return std::string(std::istreambuf_iterator<char>(f), std::istreambuf_iterator<char>());
 }
 
-// Component type and count of the cell types 0..7.
-inline int ComponentKind(int type) {
-  return type / 2;
-}  // 0 float, 1 double, 2 int32, 3 int16
+// Cell types 0..7: components float, double, int32, int16; even types complex.
 inline int ComponentSize(int type) {
   static const int sizes[4] = {4, 8, 4, 2};
-  return sizes[ComponentKind(type)];
+  return sizes[type / 2];
 }
 inline int Components(int type) {
   return type % 2 == 0 ? 2 : 1;
@@ -58,16 +56,9 @@ void Put(double v, bool big, unsigned char* p) {
   const auto* b = reinterpret_cast<const unsigned char*>(&t);
   for (size_t i = 0; i < sizeof(T); ++i) p[i] = big ? b[sizeof(T) - 1 - i] : b[i];
 }
-template <class T>
-double Get(bool big, const unsigned char* p) {
-  T t;
-  auto* b = reinterpret_cast<unsigned char*>(&t);
-  for (size_t i = 0; i < sizeof(T); ++i) b[i] = big ? p[sizeof(T) - 1 - i] : p[i];
-  return static_cast<double>(t);
-}
 
 inline void PutComponent(double v, int type, bool big, unsigned char* p) {
-  switch (ComponentKind(type)) {
+  switch (type / 2) {
     case 0:
       return Put<float>(v, big, p);
     case 1:
@@ -79,17 +70,39 @@ inline void PutComponent(double v, int type, bool big, unsigned char* p) {
   }
 }
 
-inline double GetComponent(int type, bool big, const unsigned char* p) {
-  switch (ComponentKind(type)) {
-    case 0:
-      return Get<float>(big, p);
-    case 1:
-      return Get<double>(big, p);
-    case 2:
-      return Get<int32_t>(big, p);
-    default:
-      return Get<int16_t>(big, p);
+// Small whole numbers, exact in every cell type.
+inline double Re(int line, int sample) {
+  return line * 10 + sample - 7;
+}
+inline double Im(int line, int sample) {
+  return -2 * (line * 10 + sample) + 5;
+}
+
+// Samples first_sample.. of one line as `type` in the given byte order;
+// imaginary parts 0 when `real_only`.
+inline std::string Samples(int type, bool big, int line, int first_sample, int samples,
+                           bool real_only = false) {
+  const int size = ComponentSize(type);
+  std::string out(static_cast<size_t>(samples * size * Components(type)), '\0');
+  auto* p = reinterpret_cast<unsigned char*>(&out[0]);
+  for (int s = first_sample; s < first_sample + samples; ++s, p += size * Components(type)) {
+    PutComponent(Re(line, s), type, big, p);
+    if (Components(type) == 2) PutComponent(real_only ? 0.0 : Im(line, s), type, big, p + size);
   }
+  return out;
+}
+
+// A raster: kOffset header bytes 0xAA, then per line kPrefix letters
+// 'A' + line and the samples.  Header and prefixes are zero bytes when
+// `blank`, as in a file that only had its samples written.
+inline std::string MakeRaster(int type, bool big, int lines, int pixels, bool blank = false,
+                              bool real_only = false) {
+  std::string bytes(kOffset, blank ? '\0' : '\xAA');
+  for (int k = 0; k < lines; ++k) {
+    bytes.append(kPrefix, blank ? '\0' : static_cast<char>('A' + k));
+    bytes += Samples(type, big, k, 0, pixels, real_only);
+  }
+  return bytes;
 }
 
 }  // namespace raster_test
