@@ -6,7 +6,6 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
-#include <cstring>
 #include <map>
 #include <set>
 #include <string>
@@ -15,6 +14,29 @@
 
 namespace section_test {
 
+// Value k of a field as the parameter-file text, with every digit needed to
+// restore it exactly.
+inline std::string valueText(const parElement& e, int k) {
+  char item[600] = "";
+  switch (e.type) {
+    case parElement::PT_INT:
+      std::snprintf(item, sizeof item, "%d", static_cast<int*>(e.value)[k]);
+      break;
+    case parElement::PT_FLOAT:
+      std::snprintf(item, sizeof item, "%.9g", static_cast<float*>(e.value)[k]);
+      break;
+    case parElement::PT_DOUBLE:
+      std::snprintf(item, sizeof item, "%.17g", static_cast<double*>(e.value)[k]);
+      break;
+    case parElement::PT_STRING:
+      std::snprintf(item, sizeof item, "%s", static_cast<char*>(e.value));
+      break;
+    case parElement::PT_NONE:
+      break;
+  }
+  return item;
+}
+
 // Field i gets values derived from i and `seed`, so that two fills with
 // different seeds differ everywhere.
 inline void fill(GeneralSAR_BaseXML& s, int seed) {
@@ -22,22 +44,11 @@ inline void fill(GeneralSAR_BaseXML& s, int seed) {
     const parElement& e = s.element(i);
     for (int k = 0; k < e.count; ++k) {
       const int v = seed * 100 + i * 10 + k + 1;
-      switch (e.type) {
-        case parElement::PT_INT:
-          static_cast<int*>(e.value)[k] = v;
-          break;
-        case parElement::PT_FLOAT:
-          static_cast<float*>(e.value)[k] = v * 0.5f;
-          break;
-        case parElement::PT_DOUBLE:
-          static_cast<double*>(e.value)[k] = v * 1.25 + 1e-9;
-          break;
-        case parElement::PT_STRING:
-          std::snprintf(static_cast<char*>(e.value), e.stringSize, "text %d", v);
-          break;
-        case parElement::PT_NONE:
-          break;
-      }
+      if (e.type == parElement::PT_INT) static_cast<int*>(e.value)[k] = v;
+      if (e.type == parElement::PT_FLOAT) static_cast<float*>(e.value)[k] = v * 0.5f;
+      if (e.type == parElement::PT_DOUBLE) static_cast<double*>(e.value)[k] = v * 1.25 + 1e-9;
+      if (e.type == parElement::PT_STRING)
+        std::snprintf(static_cast<char*>(e.value), e.stringSize, "text %d", v);
     }
   }
 }
@@ -49,24 +60,7 @@ inline void expectSameFields(GeneralSAR_BaseXML& a, GeneralSAR_BaseXML& b) {
     const parElement& y = b.element(i);
     ASSERT_EQ(x.name, y.name);
     ASSERT_EQ(x.count, y.count) << x.name;
-    for (int k = 0; k < x.count; ++k) {
-      switch (x.type) {
-        case parElement::PT_INT:
-          EXPECT_EQ(static_cast<int*>(x.value)[k], static_cast<int*>(y.value)[k]) << x.name;
-          break;
-        case parElement::PT_FLOAT:
-          EXPECT_EQ(static_cast<float*>(x.value)[k], static_cast<float*>(y.value)[k]) << x.name;
-          break;
-        case parElement::PT_DOUBLE:
-          EXPECT_EQ(static_cast<double*>(x.value)[k], static_cast<double*>(y.value)[k]) << x.name;
-          break;
-        case parElement::PT_STRING:
-          EXPECT_STREQ(static_cast<char*>(x.value), static_cast<char*>(y.value)) << x.name;
-          break;
-        case parElement::PT_NONE:
-          break;
-      }
-    }
+    for (int k = 0; k < x.count; ++k) EXPECT_EQ(valueText(x, k), valueText(y, k)) << x.name;
   }
 }
 
@@ -81,23 +75,7 @@ inline std::string legacyText(GeneralSAR_BaseXML& s, const std::string& section,
     if (e.count < 1 || skip.count(e.name) != 0) continue;
     const auto renamed = keys.find(e.name);
     std::string value;
-    for (int k = 0; k < e.count; ++k) {
-      char item[600];
-      switch (e.type) {
-        case parElement::PT_INT:
-          std::snprintf(item, sizeof item, "%d", static_cast<int*>(e.value)[k]);
-          break;
-        case parElement::PT_FLOAT:
-          std::snprintf(item, sizeof item, "%.9g", static_cast<float*>(e.value)[k]);
-          break;
-        case parElement::PT_DOUBLE:
-          std::snprintf(item, sizeof item, "%.17g", static_cast<double*>(e.value)[k]);
-          break;
-        default:
-          std::snprintf(item, sizeof item, "%s", static_cast<char*>(e.value));
-      }
-      value += (k ? " " : "") + std::string(item);
-    }
+    for (int k = 0; k < e.count; ++k) value += (k ? " " : "") + valueText(e, k);
     if (e.count > 1) value = "{" + value + "}";
     text += (renamed != keys.end() ? renamed->second : e.name) + " = " + value + "\n";
   }

@@ -171,6 +171,8 @@ TEST_F(PolySarTest, WrittenAndReadBack) {
   fill(s.dcExt), fill(s.frExt);
   ASSERT_EQ(s.writehdr(file.c_str()), 0);
   EXPECT_EQ(s.writehdr(path("no/such/dir.xml").c_str()), 5);
+  // A plain data set is too short for an extended one.
+  EXPECT_EQ(extended_polyDC().readpar(file.c_str(), "DopplerCentroid-0"), 10);
 
   polySAR r;
   ASSERT_EQ(r.readhdr(file.c_str()), 0);
@@ -266,19 +268,19 @@ TEST_F(PolySarTest, DamagedHeaders) {
 
   polySAR s;
   EXPECT_EQ(s.readhdr(path("absent.xml").c_str()), 1);
-  const std::string legacy = path("legacy.hdr");
-  spit(legacy, "[PolySAR]\nnDopCenDataSet = 1000000000\n");
-  EXPECT_EQ(s.readhdr(legacy.c_str()), 1);
-  const std::string text = path("text.hdr");
-  spit(text, "[PolySAR]\nnDopCenDataSet = many\nnFMRateDataSet = 1\n");
-  EXPECT_EQ(s.readhdr(text.c_str()), 1);
-  const std::string negative = path("negative.hdr");
-  spit(negative, "[PolySAR]\nnSlant2Theta = -1\nnFMRateDataSet = 1\n");
-  EXPECT_EQ(s.readhdr(negative.c_str()), 1);
-  const std::string shortOne = path("short.hdr");
-  spit(shortOne, "[PolySAR]\nnSlant2Ground = 2\n[SlantToGround-0]\nSL2GRpoly_azt0 = 1\n");
-  EXPECT_EQ(s.readhdr(shortOne.c_str()), 10);
-  EXPECT_TRUE(s.sl2gr.empty());
+  const std::pair<const char*, int> legacy[] = {
+      {"[PolySAR]\nnDopCenDataSet = 1000000000\n", 1},
+      {"[PolySAR]\nnDopCenDataSet = many\nnFMRateDataSet = 1\n", 1},
+      {"[PolySAR]\nnSlant2Theta = -1\nnFMRateDataSet = 1\n", 1},
+      {"[PolySAR]\nnSlant2Ground = 2\n[SlantToGround-0]\nSL2GRpoly_azt0 = 1\n", 10},
+  };
+  int n = 0;
+  for (const auto& [text, code] : legacy) {
+    const std::string file = path("legacy" + std::to_string(++n) + ".hdr");
+    spit(file, text);
+    EXPECT_EQ(s.readhdr(file.c_str()), code) << text;
+    EXPECT_TRUE(s.sl2gr.empty() && s.dc.empty()) << text;
+  }
 
   // Invalid counts given by a caller change nothing.
   ASSERT_EQ(s.CreatePolys(1, 1), 0);

@@ -1,6 +1,5 @@
 // The chirp of the transmitted pulse.
 #include <cmath>
-#include <cstring>
 #include <vector>
 
 #include "metadata/sar_pulse.h"
@@ -22,10 +21,7 @@ TEST(Chirp, SamplesAreSymmetricAboutTheCentreAndNormalised) {
   ASSERT_EQ(p.chirpSamples(), 200);
   std::vector<fcomplex> c(200);
   ASSERT_EQ(p.generateChirp(c.data(), 200), 0);
-  for (int n = 0; n < 100; ++n) {
-    EXPECT_NEAR(c[n].real(), c[199 - n].real(), 1e-6f) << n;
-    EXPECT_NEAR(c[n].imag(), c[199 - n].imag(), 1e-6f) << n;
-  }
+  for (int n = 0; n < 100; ++n) EXPECT_LT(std::abs(c[n] - c[199 - n]), 1e-6f) << n;
   // |sample| = 1 / sqrt(N fs / B); phase pi B/T t^2 at the first sample.
   const double g = std::sqrt(200 * 20e6 / 16e6);
   EXPECT_NEAR(std::abs(c[37]), 1.0 / g, 1e-6);
@@ -67,13 +63,10 @@ TEST_F(ChirpFile, ChirpIsWrittenAsOneComplexLine) {
   DataFile raster;
   ASSERT_EQ(raster.read_hdr(file.c_str()), 0);
   EXPECT_EQ(raster.pixels_per_line, 200);
-  EXPECT_EQ(raster.lines_per_image, 1);
   EXPECT_EQ(raster.cell_type, CT_FLOAT_COMPLEX);
-  const std::string bytes = slurp(file);
-  ASSERT_EQ(bytes.size(), 200 * sizeof(fcomplex));
   std::vector<fcomplex> c(200);
   p.generateChirp(c.data());
-  EXPECT_EQ(std::memcmp(bytes.data(), c.data(), bytes.size()), 0);
+  EXPECT_EQ(slurp(file), std::string(reinterpret_cast<const char*>(c.data()), 200 * sizeof c[0]));
   EXPECT_EQ(SARPulse_Obj().writeChirp(path("none").c_str()), 1);
 }
 

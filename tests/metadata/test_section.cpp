@@ -240,23 +240,4 @@ TEST_F(SectionTest, UntrustedTextNeitherOverflowsNorBreaksTheDocument) {
   ASSERT_TRUE(other.readAuxiliaryFile(file.c_str(), 1, "Other"));
 }
 
-TEST_F(SectionTest, RegistrationMustMatchTheDeclaredCount) {
-  class Miscounted : public Single {
-   public:
-    int declare(int n) { return createElementsVector(n); }
-    double extra = 0.0;
-
-   protected:
-    void refreshParameters() override {
-      Single::refreshParameters();
-      addElementDouble("Extra", &extra, 1, 0.0, 1.0, true);
-    }
-  };
-  Miscounted m;
-  EXPECT_EQ(m.declare(1), 1);  // the second field would overwrite the first
-  EXPECT_EQ(m.declare(3), 1);
-  EXPECT_EQ(m.declare(2), 0);
-  EXPECT_EQ(m.element(1).value, &m.extra);
-}
-
 }  // namespace
