@@ -5,9 +5,9 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <cstdio>
+#include <filesystem>
 #include <fstream>
-#include <sstream>
+#include <iterator>
 #include <string>
 
 #include "profile/profile.h"
@@ -24,24 +24,18 @@ class ProfileTest : public ::testing::Test {
   void TearDown() override {
     FreeProfile();
     set_flg_report(0);
-    std::string command = "rm -rf '" + dir_ + "'";
-    ASSERT_EQ(std::system(command.c_str()), 0);
+    std::filesystem::remove_all(dir_);
   }
 
   std::string Path(const char* name) const { return dir_ + "/" + name; }
-
   // Writes `text` to a file of the scratch directory and returns its path.
   std::string WriteFile(const char* name, const std::string& text) const {
-    const std::string path = Path(name);
-    std::ofstream out(path, std::ios::binary);
-    out << text;
-    return path;
+    std::ofstream(Path(name), std::ios::binary) << text;
+    return Path(name);
   }
   static std::string ReadFile(const std::string& path) {
     std::ifstream in(path, std::ios::binary);
-    std::ostringstream text;
-    text << in.rdbuf();
-    return text.str();
+    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
   }
   // The cached value, or "<absent>".
   static std::string Value(const std::string& file, const char* section, const char* key) {

@@ -1,73 +1,68 @@
 // Parser layouts and the written form of parameter files.
+#include <utility>
+#include <vector>
+
 #include "profile_fixture.h"
 
 namespace {
 
 using ProfileParser = ProfileTest;
 
-TEST_F(ProfileParser, BlanksAroundKeyAndValueAreTrimmedTabsKept) {
-  const std::string f = WriteFile("a.par",
-                                  "[S]\n"
-                                  "K1=Value\n"
-                                  "K2 = Value\n"
-                                  "   K3    =    Value   \n"
-                                  "K4 =\tValue\n"
-                                  "K5 = two  words \n");
-  EXPECT_EQ(Value(f, "S", "K1"), "Value");
-  EXPECT_EQ(Value(f, "S", "K2"), "Value");
-  EXPECT_EQ(Value(f, "S", "K3"), "Value");
-  EXPECT_EQ(Value(f, "S", "K4"), "\tValue");
-  EXPECT_EQ(Value(f, "S", "K5"), "two  words");
-  // Matching is exact and case-sensitive.
-  EXPECT_EQ(Value(f, "s", "K1"), "<absent>");
-  EXPECT_EQ(Value(f, "S", "k1"), "<absent>");
-}
+// A file's text, the values its keys read as ("<absent>" when not found),
+// and the file SyncProfile writes from it (nothing checked when empty).
+struct Layout {
+  const char* text;
+  std::vector<std::pair<std::string, std::string>> values;  // "section/key", value
+  const char* written;
+};
 
-TEST_F(ProfileParser, IgnoredTextAndSpecialCharactersInValues) {
-  const std::string f = WriteFile("a.par",
-                                  "K = before any section\n"
-                                  "[ S ] rest = ignored\n"
-                                  "= a line starting with equals\n"
-                                  "E = a=b [c] d\n"
-                                  "Empty =\n");
-  EXPECT_EQ(Value(f, "S", "K"), "<absent>");
-  EXPECT_EQ(Value(f, "S", "rest"), "<absent>");
-  EXPECT_EQ(Value(f, "S", "E"), "a=b [c] d");
-  EXPECT_EQ(Value(f, "S", "Empty"), "");
-}
-
-TEST_F(ProfileParser, LinesWithoutEqualsJoinTheNextKey) {
-  const std::string f = WriteFile("a.par",
-                                  "[S]\n"
-                                  "A = 1\n"
-                                  "a comment\n"
-                                  "B = 2\n"
-                                  "\n"
-                                  "C = 3\n");
-  EXPECT_EQ(Value(f, "S", "A"), "1");
-  EXPECT_EQ(Value(f, "S", "B"), "<absent>");
-  EXPECT_EQ(Value(f, "S", "a comment\nB"), "2");
-  EXPECT_EQ(Value(f, "S", "\nC"), "3");
-  // Written back, the joined lines come out as they were.
-  ASSERT_EQ(SyncProfile(f.c_str()), 0);
-  EXPECT_EQ(ReadFile(f), "\n[S]\nA = 1\na comment\nB = 2\n\nC = 3\n");
-}
-
-TEST_F(ProfileParser, BracketInsideKeyStartsSection) {
-  const std::string f = WriteFile("a.par",
-                                  "[S]\n"
-                                  "A[T] = 1\n"
-                                  "C = 2\n");
-  EXPECT_EQ(Value(f, "S", "A"), "<absent>");
-  EXPECT_EQ(Value(f, "T", "C"), "2");
-  EXPECT_EQ(Value(f, "S", "C"), "<absent>");
+TEST_F(ProfileParser, Layouts) {
+  // clang-format off
+  const std::vector<Layout> layouts = {
+      // Blanks around key and value are trimmed, tabs after '=' kept;
+      // matching is exact and case-sensitive.
+      {"[S]\nK1=Value\nK2 = Value\n   K3    =    Value   \nK4 =\tValue\nK5 = two  words \n",
+       {{"S/K1", "Value"}, {"S/K3", "Value"}, {"S/K4", "\tValue"}, {"S/K5", "two  words"},
+        {"s/K1", "<absent>"}, {"S/k1", "<absent>"}},
+       ""},
+      // Text before any section and after ']' is ignored; '=' and brackets
+      // inside a value are part of it.
+      {"K = before any section\n[ S ] rest = ignored\n= a line starting with equals\n"
+       "E = a=b [c] d\nEmpty =\n",
+       {{"S/K", "<absent>"}, {"S/rest", "<absent>"}, {"S/E", "a=b [c] d"}, {"S/Empty", ""}},
+       ""},
+      // Lines without '=' join the next key, and are written back as they were.
+      {"[S]\nA = 1\na comment\nB = 2\n\nC = 3\n",
+       {{"S/A", "1"}, {"S/B", "<absent>"}, {"S/a comment\nB", "2"}, {"S/\nC", "3"}},
+       "\n[S]\nA = 1\na comment\nB = 2\n\nC = 3\n"},
+      // A '[' inside a key starts a section.
+      {"[S]\nA[T] = 1\nC = 2\n", {{"S/A", "<absent>"}, {"T/C", "2"}, {"S/C", "<absent>"}}, ""},
+      // A carriage return before a newline is dropped, elsewhere kept.
+      {"[S]\r\nA = 1\r\nB = x\ry\r\n", {{"S/A", "1"}, {"S/B", "x\ry"}}, ""},
+      // At the end: a value in progress is kept, a key without '=' dropped,
+      // a section without ']' neither matched nor written.
+      {"[S]\nA = last", {{"S/A", "last"}}, ""},
+      {"[S]\nA = 1\nB\n[T", {{"S/B", "<absent>"}, {"T/A", "<absent>"}}, "\n[S]\nA = 1\n"},
+  };
+  // clang-format on
+  for (const Layout& layout : layouts) {
+    SCOPED_TRACE(layout.text);
+    FreeProfile();
+    const std::string f = WriteFile("a.par", layout.text);
+    for (const auto& [where, value] : layout.values) {
+      const size_t slash = where.find('/');
+      EXPECT_EQ(Value(f, where.substr(0, slash).c_str(), where.substr(slash + 1).c_str()), value)
+          << where;
+    }
+    if (layout.written[0] != '\0') {
+      ASSERT_EQ(SyncProfile(f.c_str()), 0);
+      EXPECT_EQ(ReadFile(f), layout.written);
+    }
+  }
 }
 
 TEST_F(ProfileParser, SectionsOfTheSameNameSearchTheLaterFirst) {
-  const std::string f = WriteFile("a.par",
-                                  "[S]\nA = 1\nB = 1\n"
-                                  "[Other]\nA = x\n"
-                                  "[S]\nA = 2\n");
+  const std::string f = WriteFile("a.par", "[S]\nA = 1\nB = 1\n[Other]\nA = x\n[S]\nA = 2\n");
   EXPECT_EQ(Value(f, "S", "A"), "2");
   EXPECT_EQ(Value(f, "S", "B"), "1");
   // A key absent from the later section is written there, even when an
@@ -77,36 +72,12 @@ TEST_F(ProfileParser, SectionsOfTheSameNameSearchTheLaterFirst) {
   EXPECT_EQ(WriteMyProfileString("S", "A", "3", f.c_str()), 0);
   EXPECT_EQ(Value(f, "S", "B"), "b");
   ASSERT_EQ(SyncProfile(f.c_str()), 0);
-  EXPECT_EQ(ReadFile(f),
-            "\n[S]\nA = 1\nB = 1\n"
-            "\n[Other]\nA = x\n"
-            "\n[S]\nA = 3\nNew = n\nB = b\n");
-}
-
-TEST_F(ProfileParser, LineEndsAndEndOfFile) {
-  const std::string crlf = WriteFile("crlf.par", "[S]\r\nA = 1\r\nB = x\ry\r\n");
-  EXPECT_EQ(Value(crlf, "S", "A"), "1");
-  EXPECT_EQ(Value(crlf, "S", "B"), "x\ry");
-  // A value in progress at the end is kept, a key without '=' dropped, a
-  // section without ']' neither matched nor written.
-  const std::string open = WriteFile("open.par", "[S]\nA = last");
-  EXPECT_EQ(Value(open, "S", "A"), "last");
-  const std::string dangling = WriteFile("dangling.par", "[S]\nA = 1\nB\n[T");
-  EXPECT_EQ(Value(dangling, "S", "B"), "<absent>");
-  EXPECT_EQ(Value(dangling, "T", "A"), "<absent>");
-  ASSERT_EQ(SyncProfile(dangling.c_str()), 0);
-  EXPECT_EQ(ReadFile(dangling), "\n[S]\nA = 1\n");
+  EXPECT_EQ(ReadFile(f), "\n[S]\nA = 1\nB = 1\n\n[Other]\nA = x\n\n[S]\nA = 3\nNew = n\nB = b\n");
 }
 
 TEST_F(ProfileParser, WrittenFormByteForByte) {
-  const std::string f = WriteFile("w.par",
-                                  "# header text\n"
-                                  "[First]\n"
-                                  "A = 1\n"
-                                  "B=2\n"
-                                  "\n"
-                                  "[Second]\n"
-                                  "X = y\n");
+  const std::string f =
+      WriteFile("w.par", "# header text\n[First]\nA = 1\nB=2\n\n[Second]\nX = y\n");
   EXPECT_EQ(WriteMyProfileInt("First", "C", 3, f.c_str()), 0);
   EXPECT_EQ(WriteMyProfileInt("First", "A", 10, f.c_str()), 0);
   EXPECT_EQ(WriteMyProfileString("Third", "K", "v", f.c_str()), 0);
@@ -114,10 +85,7 @@ TEST_F(ProfileParser, WrittenFormByteForByte) {
   // Writers change only the cache.
   EXPECT_EQ(ReadFile(f).substr(0, 13), "# header text");
   ASSERT_EQ(SyncProfile(f.c_str()), 0);
-  EXPECT_EQ(ReadFile(f),
-            "\n[First]\nA = 11\nB = 2\nC = 3\n"
-            "\n[Second]\nX = y\n"
-            "\n[Third]\nK = v\n");
+  EXPECT_EQ(ReadFile(f), "\n[First]\nA = 11\nB = 2\nC = 3\n\n[Second]\nX = y\n\n[Third]\nK = v\n");
 }
 
 TEST_F(ProfileParser, CacheIsNotReReadUntilFreed) {
@@ -129,29 +97,22 @@ TEST_F(ProfileParser, CacheIsNotReReadUntilFreed) {
   EXPECT_EQ(Value(f, "S", "A"), "2");
 }
 
-TEST_F(ProfileParser, MissingFileStartsEmptyAndSyncCreatesIt) {
+TEST_F(ProfileParser, MissingFilesAndSyncResults) {
+  // A missing file starts empty and SyncProfile creates it.
   const std::string f = Path("new.par");
   EXPECT_EQ(Value(f, "S", "A"), "<absent>");
   EXPECT_EQ(errno, 0);
   EXPECT_EQ(WriteMyProfileString("S", "A", "1", f.c_str()), 0);
-  EXPECT_EQ(WriteMyProfileString("S", "B", "2", f.c_str()), 0);
-  ASSERT_EQ(SyncProfile(f.c_str()), 0);
-  EXPECT_EQ(ReadFile(f), "\n[S]\nA = 1\nB = 2\n");
-}
-
-TEST_F(ProfileParser, SyncResults) {
   EXPECT_EQ(SyncProfile(Path("never_accessed.par").c_str()), 0);
+  // One file that cannot be written fails the sync of all, not the others.
   const std::string bad = dir_ + "/no_such_dir/x.par";
   EXPECT_EQ(WriteMyProfileString("S", "A", "1", bad.c_str()), 0);
   EXPECT_EQ(SyncProfile(bad.c_str()), 1);
-  const std::string good = Path("good.par");
-  EXPECT_EQ(WriteMyProfileString("S", "A", "1", good.c_str()), 0);
   EXPECT_EQ(SyncProfile(), -1);
-  EXPECT_EQ(ReadFile(good), "\n[S]\nA = 1\n");
+  EXPECT_EQ(ReadFile(f), "\n[S]\nA = 1\n");
   FreeProfile(bad.c_str());
   EXPECT_EQ(SyncProfile(), 0);
 }
-
 TEST_F(ProfileParser, DeleteKeyAndSection) {
   const std::string f = WriteFile("d.par", "[S]\nA = 1\nB = 2\n[T]\nC = 3\n[S]\nA = 4\n");
   testing::internal::CaptureStderr();
