@@ -1,4 +1,7 @@
 // The XML auxiliary document on its own: layout, list form, damaged files.
+#include <string>
+#include <vector>
+
 #include "metadata/tessal_xml.h"
 #include "metadata_fixture.h"
 
@@ -57,9 +60,7 @@ TEST_F(TessalXmlTest, OlderListFormIsReadLikeValChildren) {
   tessalxml doc(file.c_str());
   double d[3] = {0, 0, 0};
   ASSERT_EQ(doc.readDouble(1, "S/D", d, 3), 0);
-  EXPECT_EQ(d[0], 1.5);
-  EXPECT_EQ(d[1], -2500.0);
-  EXPECT_EQ(d[2], 3.0);
+  EXPECT_EQ(std::vector<double>(d, d + 3), (std::vector<double>{1.5, -2500.0, 3.0}));
   int i[3] = {0, 0, 0};
   ASSERT_EQ(doc.readInt(1, "S/I", i, 3), 0);
   EXPECT_EQ(i[2], 9);
@@ -71,14 +72,12 @@ TEST_F(TessalXmlTest, OlderListFormIsReadLikeValChildren) {
   char a[16], b[16], c[16];
   char* t[3] = {a, b, c};
   ASSERT_EQ(doc.readString(1, "S/T", t, 3, sizeof a), 0);
-  EXPECT_STREQ(a, "alpha");
-  EXPECT_STREQ(b, "beta gamma");
-  EXPECT_STREQ(c, "delta");
+  EXPECT_EQ(std::vector<std::string>(t, t + 3),
+            (std::vector<std::string>{"alpha", "beta gamma", "delta"}));
   // Fewer items than asked: the items present are stored, the rest kept.
   float f[3] = {-1, -1, -1};
   EXPECT_EQ(doc.readFloat(1, "S/Short", f, 3), 1);
-  EXPECT_EQ(f[1], 2.0f);
-  EXPECT_EQ(f[2], -1.0f);
+  EXPECT_EQ(std::vector<float>(f, f + 3), (std::vector<float>{1, 2, -1}));
   // val children are placed by N; without N by their order; out-of-range N ignored.
   int u[2] = {0, 0};
   ASSERT_EQ(doc.readInt(1, "S/Unordered", u, 2), 0);
