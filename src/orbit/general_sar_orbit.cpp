@@ -1,7 +1,5 @@
 #include "orbit/general_sar_orbit.h"
 
-#include <cfloat>
-#include <climits>
 #include <cmath>
 #include <cstring>
 #include <limits>
@@ -18,7 +16,6 @@ namespace {
 constexpr const char* kModule = "generalSARorbit";
 constexpr int kChannel = 1;
 constexpr const char* kSection = "StateVectorData";
-constexpr int kFields = 5;
 // A window holds five vectors.
 constexpr int kWindow = 5;
 // Hysteresis of the window selection, in spacings from the window start.
@@ -33,24 +30,11 @@ bool all_finite(const double* v, size_t count) {
 
 }  // namespace
 
-GeneralSAROrbit::GeneralSAROrbit() {
-  createElementsVector(kFields);
-}
+GeneralSAROrbit::GeneralSAROrbit() : StateVectorStore(0.0, 0.0, 0) {}
 
-GeneralSAROrbit::GeneralSAROrbit(double lambda) : lambda_(lambda) {
-  createElementsVector(kFields);
-}
+GeneralSAROrbit::GeneralSAROrbit(double lambda) : StateVectorStore(0.0, 0.0, 0), lambda_(lambda) {}
 
 GeneralSAROrbit::~GeneralSAROrbit() = default;
-
-void GeneralSAROrbit::refreshParameters() {
-  const int values = positions_.empty() ? 0 : 3 * n_;
-  addElementDouble("pSV_m", positions_.data(), values, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("vSV_mOs", velocities_.data(), values, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("t0SV_s", &t0_, 1, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("dtSV_s", &dt_, 1, -DBL_MAX, DBL_MAX, true);
-  addElementInt("nSV_n", &n_, 1, INT_MIN, INT_MAX, true);
-}
 
 bool GeneralSAROrbit::isAscending() const {
   return !velocities_.empty() && n_ > 0 && velocities_[2] > 0.0;
@@ -69,11 +53,6 @@ int GeneralSAROrbit::SVCreate(double t0, double dt, int n) {
   return 0;
 }
 
-int GeneralSAROrbit::SVDestroy() {
-  if (!positions_.empty()) destroyBuffers();
-  return 0;
-}
-
 int GeneralSAROrbit::createBuffers() {
   VLR_SCOPE("GeneralSAROrbit::createBuffers", kModule);
   if (n_ == 0) return 0;
@@ -81,9 +60,8 @@ int GeneralSAROrbit::createBuffers() {
   if (n_ > 0 && n_ < kWindow)
     VLR_FAIL("You must provide at least 5 state vectors!", vlr::kLibInconsistent);
   VLR_CALL(checkCount("nSV_n", n_, kMaxStateVectors));
-  const size_t n = static_cast<size_t>(n_);
   windowCount_ = n_ - 4;
-  bool ok = positions_.allocate(3 * n) && velocities_.allocate(3 * n);
+  bool ok = allocateVectors();
   for (vlr::CkBuffer<double>& w : windowPolys_)
     ok = ok && w.allocate(kWindow * static_cast<size_t>(windowCount_));
   if (!ok) {
@@ -96,8 +74,7 @@ int GeneralSAROrbit::createBuffers() {
 }
 
 int GeneralSAROrbit::destroyBuffers() {
-  positions_.reset();
-  velocities_.reset();
+  releaseVectors();
   for (vlr::CkBuffer<double>& w : windowPolys_) w.reset();
   windowCount_ = 0;
   fitted_ = false;
@@ -252,9 +229,7 @@ int GeneralSAROrbit::readhdr(const char* file) {
     VLR_CALL(rc);
   }
   VLR_CALL(SVCreate(stored.t0(), stored.dt(), stored.n()));
-  const size_t bytes = 3 * static_cast<size_t>(n_) * sizeof(double);
-  std::memcpy(positions_.data(), stored.positions(), bytes);
-  std::memcpy(velocities_.data(), stored.velocities(), bytes);
+  copyVectorsFrom(stored);
   VLR_CALL(computeApproximateSV());
   return 0;
 }
@@ -267,9 +242,7 @@ int GeneralSAROrbit::clone(GeneralSAROrbit* dst) const {
   dst->lookSign_ = lookSign_;
   if (positions_.empty() || n_ < kWindow) return 0;
   VLR_CALL(dst->SVCreate(t0_, dt_, n_));
-  const size_t bytes = 3 * static_cast<size_t>(n_) * sizeof(double);
-  std::memcpy(dst->positions_.data(), positions_.data(), bytes);
-  std::memcpy(dst->velocities_.data(), velocities_.data(), bytes);
+  dst->copyVectorsFrom(*this);
   VLR_CALL(dst->computeApproximateSV());
   return 0;
 }

@@ -12,8 +12,7 @@
 // out a query fails with -1.
 #pragma once
 
-#include "metadata/general_sar_base.h"
-#include "runtime/call_scope.h"
+#include "orbit/state_vector_store.h"
 
 class geoCoords_Obj;
 class GSRoi_Obj;
@@ -24,9 +23,8 @@ class polySL2GR;
 class polyGR2SL;
 class polySL2THETA;
 class polySL2PHI;
-struct gr_pt_record;
 
-class GeneralSAROrbit : public GeneralSAR_Base {
+class GeneralSAROrbit : public StateVectorStore {
  public:
   // Wavelength of the ASAR carrier (c / 5.331004416 GHz), m.
   static constexpr double kDefaultLambda = 0.05623564240544047;
@@ -34,15 +32,9 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   GeneralSAROrbit();
   explicit GeneralSAROrbit(double lambda);
   ~GeneralSAROrbit() override;
-  // The buffers and window pointers are owned: copy with clone().
-  GeneralSAROrbit(const GeneralSAROrbit&) = delete;
-  GeneralSAROrbit& operator=(const GeneralSAROrbit&) = delete;
 
   void setLambda(double lambda) { lambda_ = lambda; }
-  // +1 (right of the track) or -1 (left); any other value counts as +1.
-  void setLookSign(int sign) { lookSign_ = sign < 0 ? -1 : 1; }
   double lambda() const { return lambda_; }
-  int lookSign() const { return lookSign_; }
   // True when the z velocity of vector 0 is positive.
   bool isAscending() const;
 
@@ -52,7 +44,6 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   // provide at least 5 state vectors!" for n < 5, 1 for more than
   // kMaxStateVectors vectors or a spacing that is not positive; 7.
   int SVCreate(double t0, double dt, int n);
-  int SVDestroy();
   // Allocates positions, velocities and the window polynomials for the
   // current n (nothing with n = 0).  0, 1 (n invalid), 7.
   int createBuffers() override;
@@ -80,13 +71,6 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   // when this holds no vectors: dst is then emptied) or the first code.
   int clone(GeneralSAROrbit* dst) const;
 
-  double* positions() { return positions_.data(); }
-  const double* positions() const { return positions_.data(); }
-  double* velocities() { return velocities_.data(); }
-  const double* velocities() const { return velocities_.data(); }
-  double t0() const { return t0_; }
-  double dt() const { return dt_; }
-  int n() const { return n_; }
   // Time of the first vector of the current window (0 before any query).
   double windowStart() const { return tw_; }
 
@@ -190,9 +174,6 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   // Incidence and look angle (degrees) from range time, degree 4, 10 points.
   int SVGetSlantToAnglesPolys(ROI_Obj* roi, polyDC* dc, polySL2THETA* theta, polySL2PHI* phi);
 
- protected:
-  void refreshParameters() override;
-
  private:
   // Selects the window for t (see the file comment).  0, or 1 without
   // fitted vectors.
@@ -217,11 +198,6 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   // The Doppler rate polynomial from m samples.
   int dopplerRatePoly(ROI_Obj* roi, polyDC* dc, int m, polyFR* fr);
 
-  vlr::CkBuffer<double> positions_;
-  vlr::CkBuffer<double> velocities_;
-  double t0_ = 0.0;
-  double dt_ = 0.0;
-  int n_ = 0;
   double lambda_ = kDefaultLambda;
   // Current window: its first vector, time and coefficient sets.
   const double* windowPositions_ = nullptr;
@@ -245,5 +221,4 @@ class GeneralSAROrbit : public GeneralSAR_Base {
   int windowCount_ = 0;
   bool fitted_ = false;
   double result_[3] = {};
-  int lookSign_ = 1;
 };

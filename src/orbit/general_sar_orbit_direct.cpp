@@ -1,7 +1,6 @@
 // Direct geometry of the orbit: from (azimuth time, range delay, Doppler) to
 // the ground point and what is seen there.
 #include <cmath>
-#include <cstring>
 #include <limits>
 
 #include "metadata/geo_coords.h"
@@ -23,17 +22,7 @@ constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 int GeneralSAROrbit::groundPoint(double t, double tau, double fdc, gr_pt_record* record) {
   VLR_SCOPE("GeneralSAROrbit::groundPoint", kModule);
   if (updatePolys(t) != 0) VLR_FAIL("You must provide at least 5 state vectors!", 1);
-  gr_pt_record& r = *record;
-  std::memcpy(r.positions, windowPositions_, sizeof r.positions);
-  r.tw = tw_;
-  r.dt = dt_;
-  r.t = t;
-  r.tau = tau;
-  r.fdc = fdc;
-  r.lambda = lambda_;
-  r.lookSign = lookSign_;
-  r.height = 0.0;
-  VLR_CALL(gr_pt_lat_lon(record, kWgs84A, kWgs84B));
+  VLR_CALL(solveGroundPoint(windowPositions_, tw_, t, tau, fdc, lambda_, record));
   return 0;
 }
 

@@ -48,6 +48,12 @@ struct GeneralSAROrbit::RegionSamples {
   std::vector<gr_pt_record> point;
   double r0 = 0.0;
   double az = 0.0;
+  // One output of every point, in range order.
+  std::vector<double> values(double gr_pt_record::*field) const {
+    std::vector<double> v(point.size());
+    for (size_t i = 0; i < point.size(); ++i) v[i] = point[i].*field;
+    return v;
+  }
 };
 
 int GeneralSAROrbit::sampleRegion(const ROI_Obj* roi, const polyDC* dc, int m, RegionSamples* out) {
@@ -76,9 +82,7 @@ int GeneralSAROrbit::dopplerRatePoly(ROI_Obj* roi, polyDC* dc, int m, polyFR* fr
   if (fr == nullptr) VLR_FAIL("Missing polynomial", 1);
   RegionSamples s;
   VLR_CALL(sampleRegion(roi, dc, m, &s));
-  std::vector<double> rate(m);
-  for (int i = 0; i < m; ++i) rate[i] = s.point[i].dopplerRate;
-  VLR_CALL(fit_range_poly(s.offset, rate, 2, s.r0, s.az, fr));
+  VLR_CALL(fit_range_poly(s.offset, s.values(&gr_pt_record::dopplerRate), 2, s.r0, s.az, fr));
   return 0;
 }
 
@@ -121,12 +125,7 @@ int GeneralSAROrbit::SVGetSlantToAnglesPolys(ROI_Obj* roi, polyDC* dc, polySL2TH
   if (theta == nullptr || phi == nullptr) VLR_FAIL("Missing polynomial", 1);
   RegionSamples s;
   VLR_CALL(sampleRegion(roi, dc, kPoints, &s));
-  std::vector<double> incidence(kPoints), look(kPoints);
-  for (int i = 0; i < kPoints; ++i) {
-    incidence[i] = s.point[i].incidence;
-    look[i] = s.point[i].look;
-  }
-  VLR_CALL(fit_range_poly(s.offset, incidence, 4, s.r0, s.az, theta));
-  VLR_CALL(fit_range_poly(s.offset, look, 4, s.r0, s.az, phi));
+  VLR_CALL(fit_range_poly(s.offset, s.values(&gr_pt_record::incidence), 4, s.r0, s.az, theta));
+  VLR_CALL(fit_range_poly(s.offset, s.values(&gr_pt_record::look), 4, s.r0, s.az, phi));
   return 0;
 }

@@ -1,10 +1,5 @@
 #include "orbit/state_vectors.h"
 
-#include <cfloat>
-#include <climits>
-#include <cstring>
-
-#include "orbit/earth_constants.h"
 #include "orbit/gr_pt_lat_lon.h"
 #include "orbit/orbit_fit.h"
 #include "orbit/orbit_poly.h"
@@ -16,24 +11,15 @@ namespace {
 constexpr const char* kModule = "generalSAR";
 constexpr int kChannel = 1;
 constexpr const char* kSection = "StateVectorData";
-constexpr int kFields = 5;
+// Grid values before any read.
+constexpr double kUnset = -999.0;
 
 }  // namespace
 
-SAROrbitStateVectors_Obj::SAROrbitStateVectors_Obj() {
-  createElementsVector(kFields);
-}
+SAROrbitStateVectors_Obj::SAROrbitStateVectors_Obj()
+    : StateVectorStore(kUnset, kUnset, static_cast<int>(kUnset)) {}
 
 SAROrbitStateVectors_Obj::~SAROrbitStateVectors_Obj() = default;
-
-void SAROrbitStateVectors_Obj::refreshParameters() {
-  const int values = positions_.empty() ? 0 : 3 * n_;
-  addElementDouble("pSV_m", positions_.data(), values, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("vSV_mOs", velocities_.data(), values, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("t0SV_s", &t0_, 1, -DBL_MAX, DBL_MAX, true);
-  addElementDouble("dtSV_s", &dt_, 1, -DBL_MAX, DBL_MAX, true);
-  addElementInt("nSV_n", &n_, 1, INT_MIN, INT_MAX, true);
-}
 
 int SAROrbitStateVectors_Obj::SVCreate(double t0, double dt, int n) {
   VLR_SCOPE("SAROrbitStateVectors_Obj::SVCreate", kModule);
@@ -45,18 +31,12 @@ int SAROrbitStateVectors_Obj::SVCreate(double t0, double dt, int n) {
   return 0;
 }
 
-int SAROrbitStateVectors_Obj::SVDestroy() {
-  if (!positions_.empty()) destroyBuffers();
-  return 0;
-}
-
 int SAROrbitStateVectors_Obj::createBuffers() {
   VLR_SCOPE("SAROrbitStateVectors_Obj::createBuffers", kModule);
   destroyBuffers();
   VLR_CALL(checkCount("nSV_n", n_, kMaxStateVectors));
-  const size_t n = static_cast<size_t>(n_);
-  bool ok = positions_.allocate(3 * n) && velocities_.allocate(3 * n);
-  for (vlr::CkBuffer<double>& p : polys_) ok = ok && p.allocate(n);
+  bool ok = allocateVectors();
+  for (vlr::CkBuffer<double>& p : polys_) ok = ok && p.allocate(static_cast<size_t>(n_));
   if (!ok) {
     destroyBuffers();
     VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
@@ -67,8 +47,7 @@ int SAROrbitStateVectors_Obj::createBuffers() {
 }
 
 int SAROrbitStateVectors_Obj::destroyBuffers() {
-  positions_.reset();
-  velocities_.reset();
+  releaseVectors();
   for (vlr::CkBuffer<double>& p : polys_) p.reset();
   fitted_ = false;
   refreshParameters();
@@ -104,17 +83,7 @@ int SAROrbitStateVectors_Obj::groundPoint(double t, double tau, double lambda,
                                           gr_pt_record* record) {
   VLR_SCOPE("SAROrbitStateVectors_Obj::groundPoint", kModule);
   if (positions_.empty() || n_ < 5) VLR_FAIL("You must provide at least 5 state vectors!", 1);
-  gr_pt_record& r = *record;
-  std::memcpy(r.positions, positions_.data(), sizeof r.positions);
-  r.tw = t0_;
-  r.dt = dt_;
-  r.t = t;
-  r.tau = tau;
-  r.fdc = 0.0;
-  r.lambda = lambda;
-  r.lookSign = lookSign_;
-  r.height = 0.0;
-  VLR_CALL(gr_pt_lat_lon(record, kWgs84A, kWgs84B));
+  VLR_CALL(solveGroundPoint(positions_.data(), t0_, t, tau, 0.0, lambda, record));
   return 0;
 }
 
@@ -171,9 +140,7 @@ int SAROrbitStateVectors_Obj::clone(SAROrbitStateVectors_Obj* dst) const {
   VLR_SCOPE("SAROrbitStateVectors_Obj::clone", kModule);
   if (dst == nullptr || dst == this || n_ <= 0 || positions_.empty()) return 0;
   VLR_CALL(dst->SVCreate(t0_, dt_, n_));
-  const size_t bytes = 3 * static_cast<size_t>(n_) * sizeof(double);
-  std::memcpy(dst->positions_.data(), positions_.data(), bytes);
-  std::memcpy(dst->velocities_.data(), velocities_.data(), bytes);
+  dst->copyVectorsFrom(*this);
   dst->lookSign_ = lookSign_;
   VLR_CALL(dst->SVPolyCompute());
   return 0;

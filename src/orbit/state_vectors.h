@@ -3,29 +3,17 @@
 // in time from t0, and one polynomial per component through all of them.
 #pragma once
 
-#include "metadata/general_sar_base.h"
-#include "runtime/call_scope.h"
+#include "orbit/state_vector_store.h"
 
-struct gr_pt_record;
-
-// Largest number of vectors a header may declare.
-constexpr int kMaxStateVectors = 100000;
-
-class SAROrbitStateVectors_Obj : public GeneralSAR_Base {
+class SAROrbitStateVectors_Obj : public StateVectorStore {
  public:
   SAROrbitStateVectors_Obj();
   ~SAROrbitStateVectors_Obj() override;
-  // The buffers are owned: copy with clone().
-  SAROrbitStateVectors_Obj(const SAROrbitStateVectors_Obj&) = delete;
-  SAROrbitStateVectors_Obj& operator=(const SAROrbitStateVectors_Obj&) = delete;
 
   // Releases the buffers, stores the grid and allocates n vectors (values
   // undefined until a reader fills them).  0, 1 for a negative or too large
   // n, 7 when the allocation fails.
   int SVCreate(double t0, double dt, int n);
-  // Releases the buffers.  Returns 0.
-  int SVDestroy();
-
   // Allocates 3 n positions and velocities and the six coefficient sets for
   // the current n and registers the fields.  0, 1 (n invalid), 7.
   int createBuffers() override;
@@ -59,33 +47,14 @@ class SAROrbitStateVectors_Obj : public GeneralSAR_Base {
   // nothing when this holds no vectors.  0 or the first failing code.
   int clone(SAROrbitStateVectors_Obj* dst) const;
 
-  double* positions() { return positions_.data(); }
-  const double* positions() const { return positions_.data(); }
-  double* velocities() { return velocities_.data(); }
-  const double* velocities() const { return velocities_.data(); }
-  double t0() const { return t0_; }
-  double dt() const { return dt_; }
-  int n() const { return n_; }
-  int lookSign() const { return lookSign_; }
-  // +1 or -1: the side of the radar beam (any other value counts as +1).
-  void setLookSign(int sign) { lookSign_ = sign < 0 ? -1 : 1; }
   bool isFitted() const { return fitted_; }
-
- protected:
-  void refreshParameters() override;
 
  private:
   // Fills `record` for the first five vectors and solves it.
   int groundPoint(double t, double tau, double lambda, gr_pt_record* record);
 
-  vlr::CkBuffer<double> positions_;
-  vlr::CkBuffer<double> velocities_;
   // x, y, z position and vx, vy, vz velocity polynomials, n coefficients
   // each in descending order.
   vlr::CkBuffer<double> polys_[6];
-  double t0_ = -999.0;
-  double dt_ = -999.0;
-  int n_ = -999;
-  int lookSign_ = 1;
   bool fitted_ = false;
 };
