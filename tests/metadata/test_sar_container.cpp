@@ -179,16 +179,15 @@ TEST_F(SarContainer, MissingDamagedAndHostileHeaders) {
     ASSERT_EQ(gs.GSread(path(name).c_str()), 0);
     EXPECT_TRUE(enabledSet(gs).empty()) << name;
   }
-  // Absurd counts disable the sections that hold them and nothing else.
+  // Absurd counts disable the sections that hold them and nothing else (the
+  // readers' own refusals are covered with each section).
   struct Hostile {
     const char *from, *to;
     std::set<int> off;
   };
   const Hostile cases[] = {
       {"<ndc>2</ndc>", "<ndc>1000000000</ndc>", {GS::GS_POLYSAR}},
-      {"<nfrExt>1</nfrExt>", "<nfrExt>-4</nfrExt>", {GS::GS_POLYSAR}},
       {"<PatternSamples>5<", "<PatternSamples>1000000000<", {GS::GS_ANTENNA}},
-      {"<Swst_changes>0<", "<Swst_changes>2000000000<", {GS::GS_SWATHINFO}},
       {"<NrOfPixelsPerLine>120<", "<NrOfPixelsPerLine>-7<", {GS::GS_DATAFILE, GS::GS_BUFFERFILE}},
       {"<nSV_n>7<", "<nSV_n>1000000000<", {GS::GS_STATEVECTORS, GS::GS_ORBIT}},
       {"<nSV_n>7<", "<nSV_n>3<", {GS::GS_ORBIT}},  // fewer vectors than the orbit needs
