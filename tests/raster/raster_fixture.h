@@ -58,16 +58,9 @@ void Put(double v, bool big, unsigned char* p) {
 }
 
 inline void PutComponent(double v, int type, bool big, unsigned char* p) {
-  switch (type / 2) {
-    case 0:
-      return Put<float>(v, big, p);
-    case 1:
-      return Put<double>(v, big, p);
-    case 2:
-      return Put<int32_t>(v, big, p);
-    default:
-      return Put<int16_t>(v, big, p);
-  }
+  static void (*const put[4])(double, bool, unsigned char*) = {Put<float>, Put<double>,
+                                                               Put<int32_t>, Put<int16_t>};
+  put[type / 2](v, big, p);
 }
 
 // Small whole numbers, exact in every cell type.

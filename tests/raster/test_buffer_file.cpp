@@ -5,9 +5,9 @@
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
+#include <limits>
 #include <random>
 #include <string>
-#include <tuple>
 #include <vector>
 
 #include "raster/buffer_file.h"
@@ -143,44 +143,30 @@ TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
   }
 }
 
-TEST_F(BufferFileTest, WindowsWrittenInUpdateModeReadBackEverywhere) {
+TEST_F(BufferFileTest, WindowsWrittenInUpdateModeReachTheFileAndItsCopy) {
   BufferFile bf;
-  MakeShortComplex(&bf);
+  std::string expected = MakeShortComplex(&bf);
   ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
   ASSERT_EQ(bf.initbuffer(50, 20), 0);  // smaller than one line
-  std::vector<fcomplex> in(kPixels * 3);
-  for (size_t i = 0; i < in.size(); ++i) in[i] = fcomplex(i * 2.0f - 60.0f, 1000.0f - i);
+  // Lines 2-4 take the values of lines 4-6; line 6 a new prefix.
+  std::vector<fcomplex> in;
+  for (int k = 4; k <= 6; ++k) {
+    for (int s = 0; s < kPixels; ++s) in.emplace_back(Re(k, s), Im(k, s));
+    expected.replace(kOffset + (k - 2) * (kPrefix + 4 * kPixels) + kPrefix, 4 * kPixels,
+                     Samples(CT_SHORT_COMPLEX, true, k, 0, kPixels));
+  }
+  expected.replace(kOffset + 6 * (kPrefix + 4 * kPixels), kPrefix, kPrefix, '#');
   ASSERT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 0);
-  const std::string marks(kPrefix, '#');
-  ASSERT_EQ(bf.writeprefix(marks.c_str(), 6, 1), 0);
-  // The same object sees its writes before anything is flushed.
+  ASSERT_EQ(bf.writeprefix(std::string(kPrefix, '#').c_str(), 6, 1), 0);
+  // The same object sees its writes before anything is flushed, and a copy
+  // made now holds them too.
   std::vector<fcomplex> back(kPixels * 3);
   ASSERT_EQ(bf.readbuffer(back.data(), 2, 3, 0, 0), 0);
   EXPECT_EQ(back, in);
-  // A copy made now holds them too.
   ASSERT_EQ(bf.copy(Path("copy").c_str(), 100), 0);
   ASSERT_EQ(bf.close(), 0);
-
-  for (const std::string& name : {Path("sc"), Path("copy")}) {
-    SCOPED_TRACE(name);
-    DataFile df;
-    ASSERT_EQ(df.read_hdr(name.c_str()), 0);
-    BufferIO io(&df);
-    io.first_line = 1;
-    io.num_lines = 6;
-    io.num_samples = kPixels;
-    io.output_type = CT_FLOAT_COMPLEX;
-    std::vector<fcomplex> all(kPixels * 6);
-    ASSERT_EQ(io.readbuffer(reinterpret_cast<char*>(all.data())), 0);
-    EXPECT_EQ(all[0], fcomplex(Re(1, 0), Im(1, 0)));  // line 1 untouched
-    EXPECT_EQ(std::vector<fcomplex>(all.begin() + kPixels, all.begin() + 4 * kPixels), in);
-    EXPECT_EQ(all[4 * kPixels + 1], fcomplex(Re(5, 1), Im(5, 1)));
-    std::string prefixes(2 * kPrefix, ' ');
-    io.first_line = 5;
-    io.num_lines = 2;
-    ASSERT_EQ(io.readprefix(&prefixes[0]), 0);
-    EXPECT_EQ(prefixes, std::string(kPrefix, 'F') + marks);
-  }
+  EXPECT_EQ(ReadFile(Path("sc")), expected);
+  EXPECT_EQ(ReadFile(Path("copy")), expected);
 }
 
 // A full disk: every way out of the buffer reports the failure.
@@ -239,9 +225,11 @@ TEST_F(BufferFileTest, NewFileWithHeaderBytesAndPrefixes) {
 }
 
 TEST_F(BufferFileTest, TypedConversionsRoundHalfAwayFromZero) {
-  const std::vector<float> values = {2.5f, -2.5f, 1.5f, -0.5f, 0.49999997f, 3.49f, 1e6f, -1e6f};
-  const std::vector<int> ints = {3, -3, 2, -1, 0, 3, 1000000, -1000000};
-  const std::vector<short> shorts = {3, -3, 2, -1, 0, 3, 32767, -32768};
+  const float nan = std::numeric_limits<float>::quiet_NaN();
+  const std::vector<float> values = {2.5f,  -2.5f, 1.5f, -0.5f, 0.49999997f,
+                                     3.49f, 1e10f, nan,  1e6f,  -1e6f};
+  const std::vector<int> ints = {3, -3, 2, -1, 0, 3, INT_MAX, 0, 1000000, -1000000};
+  const std::vector<short> shorts = {3, -3, 2, -1, 0, 3, 32767, 0, 32767, -32768};
   const int n = static_cast<int>(values.size());
   BufferFile bf;
   bf.setFilename(Path("f").c_str());
@@ -267,17 +255,25 @@ TEST_F(BufferFileTest, TypedConversionsRoundHalfAwayFromZero) {
   // Doubles into an INT16 file, and a SHORT_COMPLEX file into doubles.
   bf.setType(CT_INT16);
   ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
-  const std::vector<double> halves = {-1.5, 1.5, 0.5, -0.5, 2.4999, 40000, -7, 0};
+  const std::vector<double> halves = {-1.5, 1.5, 0.5, -0.5, 2.4999, 40000, -7, 0, -4e4, 1e300};
   ASSERT_EQ(bf.writebuffer(halves.data(), 0, 1, 0, n), 0);
   ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
   ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
-  EXPECT_EQ(s, (std::vector<short>{-2, 2, 1, -1, 2, 32767, -7, 0}));
+  EXPECT_EQ(s, (std::vector<short>{-2, 2, 1, -1, 2, 32767, -7, 0, -32768, 32767}));
   bf.setType(CT_SHORT_COMPLEX);
   bf.setSamples(n / 2);
   std::vector<dcomplex> dc(n / 2);
   ASSERT_EQ(bf.readbuffer(dc.data(), 0, 1, 1, 2), 0);
   EXPECT_EQ(dc[0], dcomplex(1, -1));
   EXPECT_EQ(dc[1], dcomplex(2, 32767));
+  // Integers narrowed: saturated.
+  bf.setType(CT_INT32);
+  bf.setSamples(n);
+  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
+  ASSERT_EQ(bf.writebuffer(ints.data(), 0, 1, 0, n), 0);
+  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
+  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
+  EXPECT_EQ(s, shorts);
 }
 
 TEST_F(BufferFileTest, HostileSizesAreRefused) {
@@ -316,51 +312,29 @@ TEST_F(BufferFileTest, HostileSizesAreRefused) {
   EXPECT_EQ(bf.getFilename(shortName, sizeof shortName), 1);  // cut, terminated
   EXPECT_EQ(std::string(shortName), Path("sc").substr(0, 7));
 
-  // Damaged XML headers.
-  bf.setLines(kLines);
-  bf.setSamples(kPixels);
-  ASSERT_EQ(bf.writehdr(Path("good.hdr").c_str()), 0);
-  const std::string good = ReadFile(Path("good.hdr"));
-  for (const auto& [from, to, result] : std::vector<std::tuple<std::string, std::string, int>>{
-           {"<NrOfLinesPerImage>7<", "<NrOfLinesPerImage>-5<", 1},
-           {"<NrOfPixelsPerLine>37<", "<NrOfPixelsPerLine>2000000000<", 1},
-           {"<HeaderOffset>11<", "<HeaderOffset>1e300<", 1},
-           {"<CellType>6<", "<CellType>12<", 1},
-           {"<CellType>6<", "<CellType>6<", 0}}) {
-    std::string h = good;
-    h.replace(h.find(from), from.size(), to);
-    WriteFile(Path("bad.hdr"), h);
-    EXPECT_EQ(BufferFile().readhdr(Path("bad.hdr").c_str()), result) << to;
-  }
+  // Header names (damaged headers: with those of DataFile).
   EXPECT_EQ(BufferFile().readhdr("a.h"), 1);
   EXPECT_EQ(BufferFile().readhdr(Path("missing.hdr").c_str()), 1);
 }
 
 // The older parameter-file header rewritten as the XML block, and a sparse
-// file updated beyond 4 GiB.
+// file updated beyond 4 GiB through a clone of what that block describes.
 TEST_F(BufferFileTest, HeaderFormsAndOffsetsBeyondFourGiB) {
-  const std::string name = Path("far");
-  WriteFile(name + ".hdr",
+  WriteFile(Path("far.hdr"),
             "[RasterInfo]\nHeaderOffset = 5000000000\nRowPrefix = 3\nNrOfPixelsPerLine = 4\n"
             "NrOfLinesPerImage = 2\nCellType = INT32\nByteOrder = LSBFirst\n");
   BufferFile legacy;
-  ASSERT_EQ(legacy.readhdr((name + ".hdr").c_str()), 0);
-  EXPECT_EQ(legacy.filename(), name);
+  ASSERT_EQ(legacy.readhdr(Path("far.hdr").c_str()), 0);
+  EXPECT_EQ(legacy.filename(), Path("far"));
   ASSERT_EQ(legacy.writehdr(Path("xml.hdr").c_str()), 0);
   BufferFile bf;
   ASSERT_EQ(bf.readhdr(), 1);  // no name yet
   ASSERT_EQ(bf.readhdr(Path("xml.hdr").c_str()), 0);
-  EXPECT_EQ(bf.filename(), Path("xml"));
   EXPECT_EQ(bf.getOffsetSize(), 5000000000LL);
-  EXPECT_EQ(bf.getRowPrefix(), 3);
-  EXPECT_EQ(bf.getSamples(), 4);
-  EXPECT_EQ(bf.getLines(), 2);
-  EXPECT_EQ(bf.getType(), CT_INT32);
-  EXPECT_EQ(bf.getFileEndian(), 0);
   BufferFile copy;
-  legacy.clone(&copy);
+  bf.clone(&copy);
+  const std::string name = Path("xml");
   EXPECT_EQ(copy.filename(), name);
-  EXPECT_EQ(copy.getOffsetSize(), 5000000000LL);
 
   WriteFile(name, "");
   std::filesystem::resize_file(name, 5000000000LL + 2 * 19);  // sparse

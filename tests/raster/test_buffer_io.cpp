@@ -1,8 +1,6 @@
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <cstdint>
-#include <limits>
 #include <string>
 
 #include "raster/buffer_io.h"
@@ -76,38 +74,6 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
       }
     }
   }
-}
-
-// Reads one line of `n` native-order samples of `file_type` as `out_type`.
-int ReadLine(const std::string& path, const void* samples, size_t bytes, int file_type, int n,
-             int out_type, void* out) {
-  WriteFile(path, std::string(static_cast<const char*>(samples), bytes));
-  DataFile df;
-  df.set_name(path.c_str());
-  df.pixels_per_line = n;
-  df.lines_per_image = 1;
-  df.cell_type = file_type;
-  BufferIO io(&df);
-  io.num_samples = n;
-  io.num_lines = 1;
-  io.output_type = out_type;
-  return io.readbuffer(static_cast<char*>(out));
-}
-
-TEST_F(BufferIOTest, ConversionsRoundAndSaturate) {
-  const double nan = std::numeric_limits<double>::quiet_NaN();
-  const double doubles[6] = {2.5, -2.5, 1e10, -1e10, nan, 0.49};
-  int32_t ints[6];
-  ASSERT_EQ(ReadLine(Path("d"), doubles, sizeof doubles, CT_FLOAT64, 6, CT_INT32, ints), 0);
-  const int32_t expected[6] = {3, -3, INT32_MAX, INT32_MIN, 0, 0};
-  for (int i = 0; i < 6; ++i) EXPECT_EQ(ints[i], expected[i]) << i;
-
-  const int32_t wide[3] = {40000, -40000, 5};
-  int16_t shorts[3];
-  ASSERT_EQ(ReadLine(Path("i"), wide, sizeof wide, CT_INT32, 3, CT_INT16, shorts), 0);
-  EXPECT_EQ(shorts[0], 32767);
-  EXPECT_EQ(shorts[1], -32768);
-  EXPECT_EQ(shorts[2], 5);
 }
 
 TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {

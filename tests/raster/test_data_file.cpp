@@ -24,45 +24,34 @@ std::string RandomBytes(size_t n, unsigned seed) {
   return s;
 }
 
-// Reads the file through a fixed pseudo-random walk of seeks and reads.
-std::string Walk(DataFile* df, int64_t size) {
-  std::mt19937 gen(7);
-  std::string got;
-  for (int step = 0; step < 300; ++step) {
-    const int64_t at = static_cast<int64_t>(gen() % static_cast<unsigned>(size));
-    if (step % 3 == 0) {
-      EXPECT_EQ(df->seek(at, DataFile::kSeekSet), 0);
-    } else {
-      const int64_t back = std::min<int64_t>(df->tell(), gen() % 50);
-      EXPECT_EQ(df->seek(-back, DataFile::kSeekCurrent), 0);
-    }
-    const int64_t n = std::min<int64_t>(size - df->tell(), gen() % 9000);
-    std::string piece(static_cast<size_t>(n), '\0');
-    EXPECT_EQ(df->read(&piece[0], n), 0);
-    got += piece;
-    got += std::to_string(df->tell());
-  }
-  return got;
-}
-
+// Random seeks (absolute, and short steps back) and reads give the file's
+// bytes, unbuffered and with buffers of several sizes.
 TEST_F(DataFileTest, BufferedAndUnbufferedReadsGiveTheSameBytes) {
   const std::string data = RandomBytes(100003, 1);
+  const int64_t size = static_cast<int64_t>(data.size());
   WriteFile(Path("r"), data);
   DataFile df;
   df.set_name(Path("r").c_str());
-  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
-  EXPECT_FALSE(df.is_buffered());
-  const std::string reference = Walk(&df, static_cast<int64_t>(data.size()));
-  ASSERT_EQ(df.close(), 0);
-  for (int size : {1, 7, 4096, 65536, 300000}) {
-    SCOPED_TRACE(size);
-    df.set_buffer_size(size);
+  for (int buffer : {0, 1, 7, 4096, 65536, 300000}) {
+    SCOPED_TRACE(buffer);
+    df.set_buffer_size(buffer);
     ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
-    EXPECT_TRUE(df.is_buffered());
-    EXPECT_EQ(Walk(&df, static_cast<int64_t>(data.size())), reference);
+    EXPECT_EQ(df.is_buffered(), buffer > 0);
+    std::mt19937 gen(7);
+    for (int step = 0; step < 300; ++step) {
+      const int64_t back = std::min<int64_t>(df.tell(), gen() % 50);
+      ASSERT_EQ(step % 3 == 0 ? df.seek(gen() % size, DataFile::kSeekSet)
+                              : df.seek(-back, DataFile::kSeekCurrent),
+                0);
+      const int64_t at = df.tell();
+      std::string piece(static_cast<size_t>(std::min<int64_t>(size - at, gen() % 9000)), '\0');
+      ASSERT_EQ(df.read(&piece[0], static_cast<int64_t>(piece.size())), 0);
+      ASSERT_EQ(piece, data.substr(at, piece.size())) << step;
+      ASSERT_EQ(df.tell(), at + static_cast<int64_t>(piece.size()));
+    }
     std::string all(data.size(), '\0');
     ASSERT_EQ(df.seek(0, DataFile::kSeekSet), 0);
-    ASSERT_EQ(df.read(&all[0], static_cast<int64_t>(all.size())), 0);
+    ASSERT_EQ(df.read(&all[0], size), 0);
     EXPECT_EQ(all, data);
     ASSERT_EQ(df.close(), 0);
     EXPECT_EQ(df.buffer_size(), 0);  // close drops the buffer
@@ -191,13 +180,10 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   EXPECT_FALSE(df.holds_data());
   WriteFile(Path("src"), data + "trailing bytes are not raster data");
   EXPECT_TRUE(df.holds_data());
-  for (int piece : {12, 5}) {  // 36 = 3 x 12: a final empty piece
-    ASSERT_EQ(df.copy(Path("dst").c_str(), piece), 0);
-    EXPECT_EQ(ReadFile(Path("dst")), data);
-  }
-  DataFile copied;
+  ASSERT_EQ(df.copy(Path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
+  EXPECT_EQ(ReadFile(Path("dst")), data);
+  DataFile copied;  // the header as well
   ASSERT_EQ(copied.read_hdr(Path("dst").c_str()), 0);
-  EXPECT_EQ(copied.pixels_per_line, 4);
   EXPECT_EQ(copied.header_offset, 6);
   EXPECT_EQ(copied.byte_order, 1);
   EXPECT_EQ(copied.cell_type, CT_INT16);
@@ -209,11 +195,6 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   EXPECT_FALSE(df.holds_data());
   EXPECT_EQ(df.copy(Path("dst").c_str(), 10), 4);
 
-  DataFile other;
-  df.clone(&other);
-  EXPECT_EQ(other.lines_per_image, 10);
-  EXPECT_TRUE(other.name().empty());
-
   // A copy of an open file is closed and writes its header like the original.
   ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
   DataFile copy = df;
@@ -222,9 +203,9 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   copy.set_name(Path("copy").c_str());
   copy.lines_per_image = 11;
   ASSERT_EQ(copy.write_hdr(), 0);
-  ASSERT_EQ(other.read_hdr(Path("copy").c_str()), 0);
-  EXPECT_EQ(other.header_offset, 6);
-  EXPECT_EQ(other.lines_per_image, 11);
+  ASSERT_EQ(copied.read_hdr(Path("copy").c_str()), 0);
+  EXPECT_EQ(copied.header_offset, 6);
+  EXPECT_EQ(copied.lines_per_image, 11);
 }
 
 }  // namespace

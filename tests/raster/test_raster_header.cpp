@@ -5,6 +5,7 @@
 #include <utility>
 #include <vector>
 
+#include "raster/buffer_file.h"
 #include "raster/data_file.h"
 #include "raster_fixture.h"
 
@@ -37,11 +38,14 @@ class RasterHeaderTest : public raster_test::ScratchDir {
     return {{"HeaderOffset", "12"},      {"RowPrefix", "17"},   {"NrOfPixelsPerLine", "100"},
             {"NrOfLinesPerImage", "20"}, {"CellType", "INT16"}, {"ByteOrder", "MSBFirst"}};
   }
-  // read_hdr of a header file with the given text.
+  // read_hdr of a header file with the given text; BufferFile's reader
+  // must come to the same verdict.
   int ReadHeader(const std::string& text, DataFile* df) {
     const std::string name = Path("h" + std::to_string(++count_));
     WriteFile(name + ".hdr", text);
-    return df->read_hdr(name.c_str());
+    const int result = df->read_hdr(name.c_str());
+    EXPECT_EQ(BufferFile().readhdr((name + ".hdr").c_str()), result);
+    return result;
   }
   int count_ = 0;
 };
