@@ -9,15 +9,14 @@
 #include <cstring>
 
 #include "raster/byte_order.h"
+#include "raster/file_messages.h"
 #include "runtime/error_codes.h"
 
 namespace {
 
 constexpr const char* kModule = "bufferfile";
 
-constexpr const char* kNotOpened = "File not opened!";
-constexpr const char* kReadFailed = "File reading failed!";
-constexpr const char* kWriteFailed = "File writing failed!";
+using namespace raster_messages;
 
 }  // namespace
 

@@ -42,13 +42,11 @@ void BufferFile::describe(DataFile* df) const {
   df->byte_order = byte_order_;
 }
 
-// The limits of DataFile, checked here without building one: window
-// transfers check the description on every call.
+// The limits of DataFile, checked without building one: window transfers
+// check the description on every call.
 int BufferFile::check_description() const {
-  if (lines_ < 0 || samples_ < 0 || row_prefix_ < 0) return 1;
-  if (header_offset_ < 0 || header_offset_ > DataFile::kMaxHeaderOffset) return 1;
-  if (!cell_type_is_valid(unit_type_) || (byte_order_ != 0 && byte_order_ != 1)) return 1;
-  return line_length() > DataFile::kMaxLineLength ? 1 : 0;
+  return DataFile::check_description(lines_, samples_, row_prefix_, header_offset_, unit_type_,
+                                     byte_order_);
 }
 
 int BufferFile::readhdr(const char* file) {

@@ -4,6 +4,7 @@
 #include <cstring>
 
 #include "raster/buffer_file.h"
+#include "raster/file_messages.h"
 #include "raster/sample_convert.h"
 #include "runtime/error_codes.h"
 
@@ -11,9 +12,7 @@ namespace {
 
 constexpr const char* kModule = "bufferfile";
 
-constexpr const char* kNotOpened = "File not opened!";
-constexpr const char* kReadFailed = "File reading failed!";
-constexpr const char* kWriteFailed = "File writing failed!";
+using namespace raster_messages;
 
 // File bytes converted per step.
 constexpr int64_t kChunkBytes = 64 * 1024;

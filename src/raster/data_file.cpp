@@ -8,15 +8,14 @@
 #include <cerrno>
 #include <cstring>
 
+#include "raster/file_messages.h"
 #include "runtime/error_codes.h"
 
 namespace {
 
 constexpr const char* kModule = "datafile";
 
-constexpr const char* kNotOpened = "File not opened!";
-constexpr const char* kReadFailed = "File reading failed!";
-constexpr const char* kWriteFailed = "File writing failed!";
+using namespace raster_messages;
 
 // Smallest refill of a read buffer.
 constexpr int64_t kMinRefill = 16 * 1024;
@@ -59,11 +58,17 @@ int64_t DataFile::line_length() const {
 }
 
 int DataFile::check_description() const {
-  if (pixels_per_line < 0 || lines_per_image < 0 || row_prefix < 0) return 1;
+  return check_description(lines_per_image, pixels_per_line, row_prefix, header_offset, cell_type,
+                           byte_order);
+}
+
+int DataFile::check_description(int lines, int pixels, int row_prefix, int64_t header_offset,
+                                int cell_type, int byte_order) {
+  if (pixels < 0 || lines < 0 || row_prefix < 0) return 1;
   if (header_offset < 0 || header_offset > kMaxHeaderOffset) return 1;
   if (!cell_type_is_valid(cell_type)) return 1;
   if (byte_order != 0 && byte_order != 1) return 1;
-  if (line_length() > kMaxLineLength) return 1;
+  if (int64_t{pixels} * cell_type_size(cell_type) + row_prefix > kMaxLineLength) return 1;
   // lines x L < 2^31 x 2^31: the file size fits easily in 64 bits.
   return 0;
 }

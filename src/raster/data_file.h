@@ -117,6 +117,10 @@ class DataFile : public GeneralSAR_Base {
   // type and byte order, line and file size within the limits above),
   // else 1.
   int check_description() const;
+  // The same check on a description given by its values (for classes that
+  // hold the description in members of their own).
+  static int check_description(int lines, int pixels, int row_prefix, int64_t header_offset,
+                               int cell_type, int byte_order);
 
   // Copies the description (not the name, not the open state) into `other`.
   int clone(DataFile* other) const;

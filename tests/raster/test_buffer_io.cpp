@@ -118,36 +118,27 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   DataFile df;
   Describe(&df, Path("w"), CT_INT16, false);
   BufferIO io(&df);
-  io.output_type = CT_FLOAT32;
-  io.num_lines = 1;
   float out[kPixels + 1] = {0};
-  auto read = [&](int room = -1) {
-    return room < 0 ? io.readbuffer(reinterpret_cast<char*>(out))
-                    : io.readbuffer(reinterpret_cast<char*>(out), room);
+  struct Window {
+    int first_line, num_lines, first_sample, num_samples, type, room, result;
   };
-
-  io.first_sample = 3;
-  io.num_samples = 3;  // one past the line end
-  EXPECT_EQ(read(), 1);
-  io.first_sample = -1;
-  io.num_samples = 2;
-  EXPECT_EQ(read(), 1);
-  io.first_sample = 0;
-  io.first_line = kLines;  // past the last line
-  EXPECT_EQ(read(), 1);
-  io.first_line = 0;
-  io.output_type = CT_INT8;
-  EXPECT_EQ(read(), 1);
-  io.output_type = CT_FLOAT32;
-  EXPECT_EQ(read(4), 1);  // room for one float only
-  EXPECT_EQ(out[0], 0.0f);
-  io.num_lines = INT32_MAX;
-  io.num_samples = INT32_MAX;
-  EXPECT_EQ(read(INT32_MAX), 1);
-  io.num_lines = 1;
-  io.num_samples = 2;
-  EXPECT_EQ(read(8), 0);
-  EXPECT_EQ(out[1], static_cast<float>(Re(0, 1)));
+  const Window windows[] = {{0, 1, 3, 3, CT_FLOAT32, -1, 1},       // one past the line end
+                            {0, 1, -1, 2, CT_FLOAT32, -1, 1},      // before the line start
+                            {kLines, 1, 0, 2, CT_FLOAT32, -1, 1},  // past the last line
+                            {0, 1, 0, 2, CT_INT8, -1, 1},          // no such conversion
+                            {0, 1, 0, 2, CT_FLOAT32, 4, 1},        // room for one float only
+                            {0, INT32_MAX, 0, INT32_MAX, CT_FLOAT32, INT32_MAX, 1},
+                            {0, 1, 0, 2, CT_FLOAT32, 8, 0}};
+  for (const Window& w : windows) {
+    io.first_line = w.first_line;
+    io.num_lines = w.num_lines;
+    io.first_sample = w.first_sample;
+    io.num_samples = w.num_samples;
+    io.output_type = w.type;
+    char* o = reinterpret_cast<char*>(out);
+    EXPECT_EQ(w.room < 0 ? io.readbuffer(o) : io.readbuffer(o, w.room), w.result) << w.first_line;
+    EXPECT_EQ(out[1], w.result == 0 ? static_cast<float>(Re(0, 1)) : 0.0f);  // untouched
+  }
   BufferIO none;
   EXPECT_EQ(none.readbuffer(reinterpret_cast<char*>(out)), 1);
 
@@ -155,7 +146,8 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   df.close();
   df.lines_per_image = kLines + 1;
   io.first_line = kLines;
-  EXPECT_EQ(read(), 4);
+  io.num_lines = 1;
+  EXPECT_EQ(io.readbuffer(reinterpret_cast<char*>(out)), 4);
   df.close();
 
   // A file opened for writing only cannot be read.
