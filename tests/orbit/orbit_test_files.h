@@ -83,23 +83,12 @@ inline std::string CountText(long long n) {
   return b;
 }
 
-// A 129-byte record in the layout of the real files.
-inline std::string FormatRecord(double t, int orbit, const double p[3], const double v[3]) {
-  char date[kSec85TextSize];
-  sec852ascii(t, date);
-  char b[256];
-  std::snprintf(b, sizeof b,
-                "%s -.331385 %+06d %+012.3f %+012.3f %+012.3f %+012.6f %+012.6f %+012.6f      3\n",
-                date, orbit, p[0], p[1], p[2], v[0], v[1], v[2]);
-  return b;
-}
-
 // A circular orbit of radius r and inclination incl, seen from the rotating
 // Earth: ascending node at longitude lon0 at time tNode.
 struct CircularOrbit {
   double r = 7159000.0;
   double incl = 98.55 * M_PI / 180.0;
-  double tNode = 0.0;
+  double tNode = 7.3e8;
   double lon0 = 0.3;
   double mean() const { return std::sqrt(3.986004418e14 / (r * r * r)); }
   // Earth-fixed position and velocity at t.
@@ -123,8 +112,33 @@ struct CircularOrbit {
     v[1] = s * vx + c * vy - we * (c * x - s * y);
     v[2] = vz;
   }
-  double period() const { return 2.0 * M_PI / mean(); }
 };
+
+// n vectors of the orbit from t0, dt apart, into a section with SVCreate.
+template <class Section>
+void Sample(const CircularOrbit& orbit, double t0, double dt, int n, Section* s) {
+  ASSERT_EQ(s->SVCreate(t0, dt, n), 0);
+  for (int i = 0; i < n; ++i)
+    orbit.at(t0 + i * dt, s->positions() + 3 * i, s->velocities() + 3 * i);
+}
+
+// Largest position and velocity errors (m, m/s) of the section's SVGetPos
+// and SVGetVel against the orbit at the given times.
+template <class Section>
+void WorstErrors(const CircularOrbit& orbit, Section* s, const std::vector<double>& times,
+                 double* worstP, double* worstV) {
+  *worstP = *worstV = 0.0;
+  for (double t : times) {
+    double p[3], v[3], rp[3], rv[3];
+    ASSERT_EQ(s->SVGetPos(t, p), 0) << t;
+    ASSERT_EQ(s->SVGetVel(t, v), 0) << t;
+    orbit.at(t, rp, rv);
+    for (int a = 0; a < 3; ++a) {
+      *worstP = std::fmax(*worstP, std::fabs(p[a] - rp[a]));
+      *worstV = std::fmax(*worstV, std::fabs(v[a] - rv[a]));
+    }
+  }
+}
 
 // A scratch directory per test.
 class ScratchTest : public ::testing::Test {

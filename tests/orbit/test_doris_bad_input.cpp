@@ -30,8 +30,19 @@ class BadDoris : public ScratchTest {
   std::vector<std::string> records_;
 };
 
-TEST_F(BadDoris, TheUnchangedExcerptReads) {
-  EXPECT_EQ(read(WriteDoris("good", vor_.header, records_), time(20)), 0);
+TEST_F(BadDoris, OnlyTheFourOrbitProductNamesAreRead) {
+  const struct {
+    const char* name;
+    int code;
+  } cases[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
+               {"DOR_NL__AX", 12}, {"ASA_WSS_1P", 12}, {"dor_vor_ax", 12}, {"DOR_VOR_1P", 12}};
+  for (const auto& c : cases) {
+    std::string header = vor_.header;
+    header.replace(9, 10, c.name);
+    EXPECT_EQ(read(WriteDoris(c.name, header, records_), time(20)), c.code) << c.name;
+  }
+  EXPECT_EQ(read(kXca, time(20)), 12);
+  EXPECT_EQ(read(path("absent"), time(20)), 9);
 }
 
 TEST_F(BadDoris, FewerThanNineRecordsGive4) {
@@ -96,43 +107,34 @@ TEST_F(BadDoris, TruncatedFilesAndOverstatedCountsGive4) {
   for (long long count : {41LL, 1589LL, 2147483647LL, 9999999999LL}) {
     EXPECT_EQ(read(WriteDoris("over", vor_.header, records_, count), time(20)), 4) << count;
   }
-  // A negative count and a malformed one.
-  for (const char* count : {"-0000000005", "+00000x0040", "           "}) {
-    std::string header = vor_.header;
-    SetHeaderValue(&header, "NUM_DSR", count);
-    std::string text = header;
-    for (const std::string& r : records_) text += r;
-    Spit(path("bad_count"), text);
-    EXPECT_EQ(read(path("bad_count"), time(20)), 4) << count;
-  }
-  std::string header;
-  std::string text;
-  // A data set offset beyond the file.
-  header = vor_.header;
-  SetHeaderValue(&header, "DS_OFFSET", "+00000000000099999999");
-  text = header;
-  for (const std::string& r : records_) text += r;
-  Spit(path("far_offset"), text);
-  EXPECT_EQ(read(path("far_offset"), time(20)), 4);
   // Records that end before the requested time, which the header's validity
   // still covers.
   EXPECT_EQ(read(WriteDoris("short", vor_.header, records_), time(100)), 4);
-  // Headers cut short.
-  Spit(path("short_mph"), vor_.header.substr(0, 1000));
-  EXPECT_EQ(read(path("short_mph"), time(20)), 4);
-  Spit(path("short_sph"), vor_.header.substr(0, 1400));
-  EXPECT_EQ(read(path("short_sph"), time(20)), 4);
-  Spit(path("empty"), "");
-  EXPECT_EQ(read(path("empty"), time(20)), 4);
+  // Headers cut short: empty, in the main header, in the specific one.
+  for (size_t size : {0, 1000, 1400}) {
+    Spit(path("short_header"), vor_.header.substr(0, size));
+    EXPECT_EQ(read(path("short_header"), time(20)), 4) << size;
+  }
 }
 
-TEST_F(BadDoris, MalformedValidityTimesGive4) {
-  std::string header = vor_.header;
-  SetHeaderValue(&header, "SENSING_START", "\"xx-MAR-2008");
-  EXPECT_EQ(read(WriteDoris("bad_start", header, records_), time(20)), 4);
-  header = vor_.header;
-  SetHeaderValue(&header, "SENSING_STOP", "\"                           ");
-  EXPECT_EQ(read(WriteDoris("blank_stop", header, records_), time(20)), 4);
+TEST_F(BadDoris, MalformedHeaderValuesGive4) {
+  const struct {
+    const char* key;
+    const char* value;
+  } cases[] = {{"NUM_DSR", "-0000000005"},
+               {"NUM_DSR", "+00000x0040"},
+               {"NUM_DSR", "           "},
+               {"DS_OFFSET", "+00000000000099999999"},  // beyond the file
+               {"SENSING_START", "\"xx-MAR-2008"},
+               {"SENSING_STOP", "\"                           "}};
+  for (const auto& c : cases) {
+    std::string header = vor_.header;
+    SetHeaderValue(&header, "NUM_DSR", CountText(static_cast<long long>(records_.size())));
+    SetHeaderValue(&header, c.key, c.value);
+    for (const std::string& r : records_) header += r;
+    Spit(path("bad_header"), header);
+    EXPECT_EQ(read(path("bad_header"), time(20)), 4) << c.key << c.value;
+  }
 }
 
 TEST_F(BadDoris, InvalidRequestsGive1) {

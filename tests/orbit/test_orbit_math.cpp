@@ -6,6 +6,9 @@
 #include "orbit/geodetic.h"
 #include "orbit/gr_pt.h"
 #include "orbit/gr_pt_lat_lon.h"
+#include "orbit/orbit_fit.h"
+#include "orbit/poly_fit.h"
+#include "orbit/rtbis.h"
 
 namespace {
 
@@ -56,28 +59,13 @@ TEST(GroundPoint, SphericalCaseMatchesTheTriangle) {
   }
 }
 
-TEST(GroundPoint, SatisfiesRangeDopplerAndEllipsoid) {
+// The satisfied equations are checked through the orbit's sat2earth.
+TEST(GroundPoint, RangeShortOfTheEarthOrNoVelocityFail) {
   const double P[3] = {6494931.106, 578715.148, -2977719.455};
-  const double V[3] = {3188.730641, -1416.295158, 6692.698996};
-  const double lambda = 0.05623564240544047;
-  for (double fdc : {0.0, 350.0, -1200.0}) {
-    for (int sign : {1, -1}) {
-      double G[3];
-      const double tau = 5.9e-3;
-      ASSERT_EQ(gr_pt(P, V, tau, fdc, lambda, 0.0, sign, kWgs84A, kWgs84B, G), 0);
-      const double D[3] = {P[0] - G[0], P[1] - G[1], P[2] - G[2]};
-      const double r = std::sqrt(Dot(D, D));
-      EXPECT_NEAR(r, tau * kHalfSpeedOfLight, 1e-4);
-      EXPECT_NEAR(-2.0 / lambda * Dot(V, D) / r, fdc, 1e-6);
-      EXPECT_NEAR((G[0] * G[0] + G[1] * G[1]) / kWgs84A2 + G[2] * G[2] / kWgs84B2, 1.0, 1e-13);
-    }
-  }
-  // A range that does not reach the Earth.
+  const double V[3] = {3188.730641, -1416.295158, 6692.698996}, still[3] = {0.0, 0.0, 0.0};
   double G[3];
-  EXPECT_EQ(gr_pt(P, V, 1e-4, 0.0, lambda, 0.0, 1, kWgs84A, kWgs84B, G), 2);
-  // No velocity: no Doppler plane.
-  const double still[3] = {0.0, 0.0, 0.0};
-  EXPECT_EQ(gr_pt(P, still, 5.9e-3, 0.0, lambda, 0.0, 1, kWgs84A, kWgs84B, G), 1);
+  EXPECT_EQ(gr_pt(P, V, 1e-4, 0.0, 0.0562, 0.0, 1, kWgs84A, kWgs84B, G), 2);
+  EXPECT_EQ(gr_pt(P, still, 5.9e-3, 0.0, 0.0562, 0.0, 1, kWgs84A, kWgs84B, G), 1);
 }
 
 TEST(Geodetic, RoundTripsAndPoles) {
@@ -103,6 +91,81 @@ TEST(Geodetic, RoundTripsAndPoles) {
   EXPECT_EQ(out[0], kPi / 2.0);
   xyz2geo(south, out, kWgs84A, kWgs84B);
   EXPECT_EQ(out[0], -kPi / 2.0);
+}
+
+TEST(PolyFit, RecoversAPolynomialAndItsResidualOrFails) {
+  // y = 2 - 3x + 0.5x^2 + 0.25x^3 at ten points.
+  double x[10], y[10];
+  for (int i = 0; i < 10; ++i) {
+    x[i] = -2.0 + 0.7 * i;
+    y[i] = 2.0 - 3.0 * x[i] + 0.5 * x[i] * x[i] + 0.25 * x[i] * x[i] * x[i];
+  }
+  const double want[4] = {2.0, -3.0, 0.5, 0.25};
+  double c[4], d[4];
+  ASSERT_EQ(dpolfit(x, y, 10, c, 3), 0);
+  ASSERT_EQ(polfit(x, y, 10, d, 3), 0);
+  for (int k = 0; k < 4; ++k) {
+    EXPECT_NEAR(c[k], want[k], 1e-12) << k;
+    EXPECT_NEAR(d[k], want[k], 1e-12) << k;
+  }
+  // A line through (0,0), (1,1), (2,0): y = 1/3, residual 2/3.
+  const double lx[3] = {0, 1, 2}, ly[3] = {0, 1, 0};
+  double sse = -1.0;
+  ASSERT_EQ(gen_polfit(2, lx, ly, 3, c, &sse), 0);
+  EXPECT_NEAR(c[0], 1.0 / 3.0, 1e-14);
+  EXPECT_NEAR(c[1], 0.0, 1e-14);
+  EXPECT_NEAR(sse, 2.0 / 3.0, 1e-14);
+  // Too few or coincident points.
+  const double same[3] = {1, 1, 1};
+  for (int degree : {3, 1, -1}) EXPECT_EQ(dpolfit(same, ly, 3, c, degree), 1) << degree;
+  EXPECT_EQ(polfit(same, ly, 0, c, 0), 1);
+}
+
+TEST(OrbitFit, CoefficientLayouts) {
+  // Axis a: y = (a + 1) + (a - 1) t + 0.01 a t^2, sampled at t = 10 + 2 i.
+  const int m = 6;
+  double pos[3 * m], vel[3 * m];
+  for (int i = 0; i < m; ++i) {
+    const double t = 10.0 + 2.0 * i;
+    for (int a = 0; a < 3; ++a) {
+      pos[3 * i + a] = (a + 1) + (a - 1) * t + 0.01 * a * t * t;
+      vel[3 * i + a] = (a - 1) + 0.02 * a * t;
+    }
+  }
+  double cpos[9], cvel[9], ssePos[3], sseVel[3];
+  ASSERT_EQ(orbffit(pos, vel, 10.0, 2.0, m, cpos, cvel, 3, ssePos, sseVel), 0);
+  for (int a = 0; a < 3; ++a) {
+    EXPECT_NEAR(cpos[a], a + 1, 1e-9);
+    EXPECT_NEAR(cpos[3 + a], a - 1, 1e-10);
+    EXPECT_NEAR(cpos[6 + a], 0.01 * a, 1e-12);
+    EXPECT_NEAR(cvel[a], a - 1, 1e-10);
+    EXPECT_NEAR(cvel[3 + a], 0.02 * a, 1e-12);
+    EXPECT_LT(ssePos[a], 1e-16);
+    EXPECT_LT(sseVel[a], 1e-16);
+  }
+  // Velocities are optional.
+  ASSERT_EQ(orbffit(pos, nullptr, 10.0, 2.0, m, cpos, nullptr, 3, nullptr, nullptr), 0);
+  EXPECT_EQ(orbffit(pos, nullptr, 10.0, 2.0, m, cpos, nullptr, 7, nullptr, nullptr), 1);
+}
+
+double shifted_cos(double x) {
+  return std::cos(x);
+}
+double always_positive(double x) {
+  return 1.0 + x * x;
+}
+
+TEST(Rtbis, RootOrAFailureCode) {
+  double root = 0.0;
+  ASSERT_EQ(rtbis(shifted_cos, 0.0, 3.0, 1e-10, &root), 0);
+  EXPECT_NEAR(root, M_PI / 2.0, 1e-10);
+  ASSERT_EQ(rtbis(shifted_cos, 3.0, 0.0, 1e-10, &root), 0);
+  EXPECT_NEAR(root, M_PI / 2.0, 1e-10);
+  root = -1.0;
+  EXPECT_EQ(rtbis(always_positive, -1.0, 1.0, 1e-6, &root), 1);
+  EXPECT_EQ(root, -1.0);
+  // An accuracy that halving never reaches.
+  EXPECT_EQ(rtbis(shifted_cos, 0.0, 3.0, 0.0, &root), 1);
 }
 
 }  // namespace
