@@ -288,12 +288,9 @@ TEST_F(BufferFileTest, HostileSizesAreRefused) {
   char byte;
   EXPECT_EQ(bf.read(&byte, -5), 0);
   std::vector<fcomplex> out(kPixels * kLines);
-  for (const auto& w : std::vector<std::vector<int>>{{-1, 1, 0, 0},
-                                                     {0, -1, 0, 0},
-                                                     {kLines - 1, 2, 0, 0},
-                                                     {0, 1, -1, 0},
-                                                     {0, 1, 5, kPixels},
-                                                     {0, INT_MAX, 0, INT_MAX}}) {
+  const int windows[][4] = {{-1, 1, 0, 0}, {0, -1, 0, 0},      {kLines - 1, 2, 0, 0},
+                            {0, 1, -1, 0}, {0, 1, 5, kPixels}, {0, INT_MAX, 0, INT_MAX}};
+  for (const auto& w : windows) {
     EXPECT_EQ(bf.readbuffer(out.data(), w[0], w[1], w[2], w[3]), 1) << w[0] << " " << w[1];
   }
   EXPECT_EQ(bf.writebuffer(out.data(), 0, 1, 0, 0), 1);  // read mode
