@@ -61,28 +61,18 @@ int GeneralSAROrbit::createBuffers() {
     VLR_FAIL("You must provide at least 5 state vectors!", vlr::kLibInconsistent);
   VLR_CALL(checkCount("nSV_n", n_, kMaxStateVectors));
   windowCount_ = n_ - 4;
-  bool ok = allocateVectors();
-  for (vlr::CkBuffer<double>& w : windowPolys_)
-    ok = ok && w.allocate(kWindow * static_cast<size_t>(windowCount_));
-  if (!ok) {
-    destroyBuffers();
+  if (!allocateVectors(windowPolys_, kAxes, kWindow * static_cast<size_t>(windowCount_)))
     VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
-  }
-  refreshParameters();
-  setAllocationFlag(true);
   return 0;
 }
 
 int GeneralSAROrbit::destroyBuffers() {
-  releaseVectors();
-  for (vlr::CkBuffer<double>& w : windowPolys_) w.reset();
   windowCount_ = 0;
   fitted_ = false;
   windowPositions_ = windowVelocities_ = nullptr;
   cx_ = cy_ = cz_ = nullptr;
   tw_ = 0.0;
-  refreshParameters();
-  setAllocationFlag(false);
+  releaseVectors(windowPolys_, kAxes);
   return 0;
 }
 

@@ -217,7 +217,8 @@ class GeneralSAROrbit : public StateVectorStore {
   double rotation_[9] = {};
   double trackSpeed_ = 0.0;
   // x, y, z coefficient sets of every window (5 each, descending order).
-  vlr::CkBuffer<double> windowPolys_[3];
+  static constexpr int kAxes = 3;
+  vlr::CkBuffer<double> windowPolys_[kAxes];
   int windowCount_ = 0;
   bool fitted_ = false;
   double result_[3] = {};

@@ -33,14 +33,25 @@ int StateVectorStore::SVDestroy() {
   return 0;
 }
 
-bool StateVectorStore::allocateVectors() {
+bool StateVectorStore::allocateVectors(vlr::CkBuffer<double>* extra, int count, size_t size) {
   const size_t values = 3 * static_cast<size_t>(n_);
-  return positions_.allocate(values) && velocities_.allocate(values);
+  bool ok = positions_.allocate(values) && velocities_.allocate(values);
+  for (int i = 0; i < count; ++i) ok = ok && extra[i].allocate(size);
+  if (!ok) {
+    destroyBuffers();
+    return false;
+  }
+  refreshParameters();
+  setAllocationFlag(true);
+  return true;
 }
 
-void StateVectorStore::releaseVectors() {
+void StateVectorStore::releaseVectors(vlr::CkBuffer<double>* extra, int count) {
   positions_.reset();
   velocities_.reset();
+  for (int i = 0; i < count; ++i) extra[i].reset();
+  refreshParameters();
+  setAllocationFlag(false);
 }
 
 void StateVectorStore::copyVectorsFrom(const StateVectorStore& src) {

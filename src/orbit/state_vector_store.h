@@ -40,10 +40,14 @@ class StateVectorStore : public GeneralSAR_Base {
   // Positions, velocities, t0, dt and n, in this order.
   void refreshParameters() override;
 
-  // Allocates 3 n positions and velocities for the current n (checked by
-  // the caller); false when the allocation fails.
-  bool allocateVectors();
-  void releaseVectors();
+  // Allocates 3 n positions and velocities and `count` further buffers of
+  // `size` values for the current n (checked by the caller), then registers
+  // the fields and marks the buffers allocated.  False, after
+  // destroyBuffers(), when an allocation fails.
+  bool allocateVectors(vlr::CkBuffer<double>* extra, int count, size_t size);
+  // Releases the vectors and the further buffers, registers the empty
+  // fields and marks the buffers released.
+  void releaseVectors(vlr::CkBuffer<double>* extra, int count);
   // Copies the positions and velocities of src, which holds as many.
   void copyVectorsFrom(const StateVectorStore& src);
   // Fills `record` with the five vectors from `window` (the first of them

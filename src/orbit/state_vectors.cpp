@@ -35,23 +35,14 @@ int SAROrbitStateVectors_Obj::createBuffers() {
   VLR_SCOPE("SAROrbitStateVectors_Obj::createBuffers", kModule);
   destroyBuffers();
   VLR_CALL(checkCount("nSV_n", n_, kMaxStateVectors));
-  bool ok = allocateVectors();
-  for (vlr::CkBuffer<double>& p : polys_) ok = ok && p.allocate(static_cast<size_t>(n_));
-  if (!ok) {
-    destroyBuffers();
+  if (!allocateVectors(polys_, kPolys, static_cast<size_t>(n_)))
     VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
-  }
-  refreshParameters();
-  setAllocationFlag(true);
   return 0;
 }
 
 int SAROrbitStateVectors_Obj::destroyBuffers() {
-  releaseVectors();
-  for (vlr::CkBuffer<double>& p : polys_) p.reset();
   fitted_ = false;
-  refreshParameters();
-  setAllocationFlag(false);
+  releaseVectors(polys_, kPolys);
   return 0;
 }
 

@@ -55,6 +55,7 @@ class SAROrbitStateVectors_Obj : public StateVectorStore {
 
   // x, y, z position and vx, vy, vz velocity polynomials, n coefficients
   // each in descending order.
-  vlr::CkBuffer<double> polys_[6];
+  static constexpr int kPolys = 6;
+  vlr::CkBuffer<double> polys_[kPolys];
   bool fitted_ = false;
 };
