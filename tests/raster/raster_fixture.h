@@ -12,6 +12,8 @@
 #include <iterator>
 #include <string>
 
+#include "raster/data_file.h"
+
 namespace raster_test {
 
 constexpr int kPrefix = 17;  // the line header of ENVISAT image lines
@@ -38,6 +40,18 @@ inline void WriteFile(const std::string& path, const std::string& bytes) {
 inline std::string ReadFile(const std::string& path) {
   std::ifstream f(path, std::ios::binary);
   return std::string(std::istreambuf_iterator<char>(f), std::istreambuf_iterator<char>());
+}
+
+// Sets the description of *df.
+inline void Describe(DataFile* df, const std::string& name, int type, bool big, int lines,
+                     int pixels, int prefix = kPrefix, int64_t offset = kOffset) {
+  df->set_name(name.c_str());
+  df->lines_per_image = lines;
+  df->pixels_per_line = pixels;
+  df->row_prefix = prefix;
+  df->header_offset = offset;
+  df->cell_type = type;
+  df->byte_order = big ? 1 : 0;
 }
 
 // Cell types 0..7: components float, double, int32, int16; even types complex.

@@ -14,16 +14,6 @@ using namespace raster_test;
 constexpr int kPixels = 5;
 constexpr int kLines = 3;
 
-void Describe(DataFile* df, const std::string& name, int type, bool big) {
-  df->set_name(name.c_str());
-  df->pixels_per_line = kPixels;
-  df->lines_per_image = kLines;
-  df->row_prefix = kPrefix;
-  df->header_offset = kOffset;
-  df->cell_type = type;
-  df->byte_order = big ? 1 : 0;
-}
-
 class BufferIOTest : public ScratchDir {};
 
 // Each pair read as a window (lines 1-2, samples 1-3) from an independently
@@ -37,7 +27,7 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
         SCOPED_TRACE("file type " + std::to_string(file) + ", memory type " + std::to_string(mem) +
                      (big ? ", big-endian" : ", little-endian"));
         DataFile df;
-        Describe(&df, Path("in"), file, big);
+        Describe(&df, Path("in"), file, big, kLines, kPixels);
         BufferIO io(&df);
         io.first_sample = 1;
         io.num_samples = 3;
@@ -56,7 +46,7 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
         }
 
         DataFile target;
-        Describe(&target, Path("out"), file, big);
+        Describe(&target, Path("out"), file, big, kLines, kPixels);
         BufferIO writer(&target);
         writer.num_samples = kPixels;
         writer.num_lines = kLines;
@@ -80,7 +70,7 @@ TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {
   const std::string raster = MakeRaster(CT_SHORT_COMPLEX, true, kLines, kPixels);
   WriteFile(Path("p"), raster);
   DataFile df;
-  Describe(&df, Path("p"), CT_SHORT_COMPLEX, true);
+  Describe(&df, Path("p"), CT_SHORT_COMPLEX, true, kLines, kPixels);
   BufferIO io(&df);
   io.first_line = 1;
   io.num_lines = 2;
@@ -116,7 +106,7 @@ TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {
 TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   WriteFile(Path("w"), MakeRaster(CT_INT16, false, kLines, kPixels));
   DataFile df;
-  Describe(&df, Path("w"), CT_INT16, false);
+  Describe(&df, Path("w"), CT_INT16, false, kLines, kPixels);
   BufferIO io(&df);
   float out[kPixels + 1] = {0};
   struct Window {
@@ -152,7 +142,7 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
 
   // A file opened for writing only cannot be read.
   DataFile created;
-  Describe(&created, Path("new"), CT_INT16, false);
+  Describe(&created, Path("new"), CT_INT16, false, kLines, kPixels);
   ASSERT_EQ(created.open(DataFile::kOpenCreate), 0);
   BufferIO writer(&created);
   writer.num_samples = 1;

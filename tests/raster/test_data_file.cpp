@@ -12,8 +12,7 @@
 
 namespace {
 
-using raster_test::ReadFile;
-using raster_test::WriteFile;
+using namespace raster_test;
 
 class DataFileTest : public raster_test::ScratchDir {};
 
@@ -130,11 +129,7 @@ TEST_F(DataFileTest, FailuresGiveTheirCodes) {
 TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
   // A sparse raster of 600000 lines of 1024 FLOAT_COMPLEX samples (4.9 GB).
   DataFile df;
-  df.set_name(Path("big").c_str());
-  df.pixels_per_line = 1024;
-  df.lines_per_image = 600000;
-  df.row_prefix = 17;
-  df.cell_type = CT_FLOAT_COMPLEX;
+  Describe(&df, Path("big"), CT_FLOAT_COMPLEX, false, 600000, 1024, kPrefix, 0);
   const int64_t line = 590001;
   ASSERT_GT(df.line_offset(line), int64_t{1} << 32);
   std::vector<float> in(2048);
@@ -165,13 +160,7 @@ TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
 
 TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   DataFile df;
-  df.set_name(Path("src").c_str());
-  df.pixels_per_line = 4;
-  df.lines_per_image = 3;
-  df.row_prefix = 2;
-  df.header_offset = 6;
-  df.cell_type = CT_INT16;
-  df.byte_order = 1;
+  Describe(&df, Path("src"), CT_INT16, true, 3, 4, 2, 6);
   const std::string data = RandomBytes(static_cast<size_t>(df.data_size()), 3);  // 36 bytes
   EXPECT_FALSE(df.holds_data());
   WriteFile(Path("src"), data + "trailing bytes are not raster data");

@@ -57,13 +57,8 @@ TEST_F(RasterHeaderTest, XmlHeaderRoundTripKeepsOtherBlocks) {
             "<Description>My description</Description><Channel Number=\"1\"><Other><A>5</A>"
             "</Other></Channel></TessalXmlDoc>\n");
   DataFile df;
-  df.set_name(name.c_str());
-  df.pixels_per_line = 5000;
-  df.lines_per_image = 42;
-  df.row_prefix = 17;
-  df.header_offset = 3000000000LL;  // beyond 2 GiB: product data sets start there
-  df.cell_type = CT_SHORT_COMPLEX;
-  df.byte_order = 1;
+  // A header offset beyond 2 GiB: product data sets start there.
+  raster_test::Describe(&df, name, CT_SHORT_COMPLEX, true, 42, 5000, 17, 3000000000LL);
   ASSERT_EQ(df.write_hdr(), 0);
   ASSERT_EQ(df.write_hdr(), 0);  // rewriting keeps one block
 
