@@ -110,7 +110,7 @@ TEST_F(BadDoris, TruncatedFilesAndOverstatedCountsGive4) {
   // Records that end before the requested time, which the header's validity
   // still covers.
   EXPECT_EQ(read(WriteDoris("short", vor_.header, records_), time(100)), 4);
-  // Headers cut short: empty, in the main header, in the specific one.
+  // Headers cut short: empty, inside the MPH, inside the SPH.
   for (size_t size : {0, 1000, 1400}) {
     Spit(path("short_header"), vor_.header.substr(0, size));
     EXPECT_EQ(read(path("short_header"), time(20)), 4) << size;
