@@ -126,21 +126,39 @@ TEST_F(PolySarTest, EveryFamilyEvaluatesItsOwnDataSets) {
   ASSERT_EQ(s.CreatePolys(1, 1, 1, 1, 1, 1), 0);
   s.dc[0].pol[0] = 1, s.fr[0].pol[0] = 2, s.sl2gr[0].pol[0] = 3;
   s.gr2sl[0].pol[0] = 4, s.sl2theta[0].pol[0] = 5, s.sl2phi[0].pol[0] = 6;
-  using Plain = double (polySAR::*)(double, double);
-  const Plain plain[] = {&polySAR::EvaluateDC,       &polySAR::EvaluateFR,
-                         &polySAR::EvaluateSL2GR,    &polySAR::EvaluateGR2SL,
-                         &polySAR::EvaluateSL2THETA, &polySAR::EvaluateSL2PHI};
-  const Plain interp[] = {&polySAR::EvaluateDCinterp,       &polySAR::EvaluateFRinterp,
-                          &polySAR::EvaluateSL2GRinterp,    &polySAR::EvaluateGR2SLinterp,
-                          &polySAR::EvaluateSL2THETAinterp, &polySAR::EvaluateSL2PHIinterp};
-  using Coef = int (polySAR::*)(double, double*);
-  const Coef coefs[] = {&polySAR::getDCpoly,    &polySAR::getFRpoly,       &polySAR::getSL2GRpoly,
-                        &polySAR::getGR2SLpoly, &polySAR::getSL2THETApoly, &polySAR::getSL2PHIpoly};
-  for (int f = 0; f < 6; ++f) {
-    EXPECT_EQ((s.*plain[f])(0.0, 0.0), f + 1.0);
-    EXPECT_EQ((s.*interp[f])(0.0, 0.0), f + 1.0);
-    EXPECT_EQ((s.*coefs[f])(0.0, coef), 0);
-    EXPECT_EQ(coef[0], f + 1.0);
+  // Plain value, interpolated value and coefficient lookup of each family.
+  struct Family {
+    double (*plain)(polySAR&);
+    double (*interp)(polySAR&);
+    int (*coefs)(polySAR&, double*);
+  };
+  const Family families[] = {
+      {[](polySAR& p) { return p.EvaluateDC(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateDCinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getDCpoly(0.0, c); }},
+      {[](polySAR& p) { return p.EvaluateFR(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateFRinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getFRpoly(0.0, c); }},
+      {[](polySAR& p) { return p.EvaluateSL2GR(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateSL2GRinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getSL2GRpoly(0.0, c); }},
+      {[](polySAR& p) { return p.EvaluateGR2SL(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateGR2SLinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getGR2SLpoly(0.0, c); }},
+      {[](polySAR& p) { return p.EvaluateSL2THETA(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateSL2THETAinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getSL2THETApoly(0.0, c); }},
+      {[](polySAR& p) { return p.EvaluateSL2PHI(0.0, 0.0); },
+       [](polySAR& p) { return p.EvaluateSL2PHIinterp(0.0, 0.0); },
+       [](polySAR& p, double* c) { return p.getSL2PHIpoly(0.0, c); }},
+  };
+  double expected = 1.0;
+  for (const Family& family : families) {
+    EXPECT_EQ(family.plain(s), expected);
+    EXPECT_EQ(family.interp(s), expected);
+    EXPECT_EQ(family.coefs(s, coef), 0);
+    EXPECT_EQ(coef[0], expected);
+    expected += 1.0;
   }
 }
 
