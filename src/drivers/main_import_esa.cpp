@@ -7,7 +7,6 @@
 #include "drivers/driver_arguments.h"
 #include "drivers/drivers.h"
 #include "drivers/find_aux.h"
-#include "profile/profile.h"
 #include "runtime/call_scope.h"
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
@@ -19,7 +18,6 @@ namespace {
 
 constexpr const char* kModule = "main_import_esa";
 constexpr const char* kTitle = "Import ESA Products";
-constexpr const char* kParameterFile = "import_esa.hdr";
 // The product-type characters of the MPH product name ("WSS" in ASA_WSS_1P...).
 constexpr long kProductTypeOffset = 13;
 constexpr size_t kProductTypeLength = 3;
@@ -55,10 +53,6 @@ int fvlr_main_import_esa(const char* argumentText) {
 
   std::string directory;
   NVLR_UTILITY_GetEnvCode(directory, "VELORAN_CEOS_DES_FILES_DIR");
-  const std::string parameterFile = directory + kParameterFile;
-  int reportLevel = 1;
-  GetParInt(parameterFile.c_str(), "ReportLevel", 1, &reportLevel, 1, "GeneralProcessingConf");
-  const std::string outputRoot = DriverArgument(args, kOutputRoot);
 
   const std::string& product = DriverArgument(args, kProduct);
   if (product == vlr::kNotOK) {
@@ -72,8 +66,6 @@ int fvlr_main_import_esa(const char* argumentText) {
   if (insPath == vlr::kNotOK) {
     VLR_CALL(find_aux(product.c_str(), directory.c_str(), "ASA_INS", insPath));
   }
-  std::string orbitPath = DriverArgument(args, kDoris);
-  if (orbitPath == vlr::kNotOK) orbitPath.clear();
 
   std::string type;
   VLR_CALL(readProductType(product.c_str(), type));
@@ -83,7 +75,6 @@ int fvlr_main_import_esa(const char* argumentText) {
     VLR_REPORT("Input file is not a ASA_WSS dataset", 0);
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "WSS");
   }
-  (void)reportLevel;
   // The extraction is not part of this build.
   NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, __LINE__,
                           "extraction not available");

@@ -16,7 +16,6 @@ namespace {
 
 constexpr const char* kModule = "main_multilook_wss";
 constexpr const char* kTitle = "Multilooking ASA WSS";
-constexpr const char* kParameterFile = "parameters_multilook.hdr";
 
 enum MultilookArgument : size_t { kProduct = 0, kOutputRoot = 1, kDoris = 2 };
 
@@ -37,7 +36,6 @@ int fvlr_main_multilook_wss(const char* argumentText) {
 
   std::string directory;
   NVLR_UTILITY_GetEnvCode(directory, "VELORAN_CEOS_DES_FILES_DIR");
-  const std::string parameterFile = directory + kParameterFile;
 
   const std::string& product = DriverArgument(args, kProduct);
   if (product == vlr::kNotOK || !EnvisatTypes::is_wss(product.c_str())) {
@@ -56,7 +54,6 @@ int fvlr_main_multilook_wss(const char* argumentText) {
       (!EnvisatTypes::is_dorvor(orbit.c_str()) && !EnvisatTypes::is_dorpor(orbit.c_str()))) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "DOR_VOR");
   }
-  (void)parameterFile;
   // The import and the multilook are not part of this build.
   stepFailed(__LINE__, "multilook not available");
 }
