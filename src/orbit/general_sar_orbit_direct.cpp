@@ -3,8 +3,8 @@
 #include <cmath>
 #include <limits>
 
-#include "metadata/geo_coords.h"
-#include "metadata/gs_roi.h"
+#include "metadata_sections/geo_coords.h"
+#include "metadata_sections/gs_roi.h"
 #include "orbit/earth_constants.h"
 #include "orbit/general_sar_orbit.h"
 #include "orbit/gr_pt.h"

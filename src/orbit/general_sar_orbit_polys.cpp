@@ -3,8 +3,8 @@
 #include <cmath>
 #include <vector>
 
-#include "metadata/poly_families.h"
-#include "metadata/roi.h"
+#include "metadata_sections/poly_families.h"
+#include "metadata_sections/roi.h"
 #include "orbit/general_sar_orbit.h"
 #include "orbit/gr_pt_lat_lon.h"
 #include "orbit/poly_fit.h"

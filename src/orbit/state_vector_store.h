@@ -4,7 +4,7 @@
 // looks to.  The sections build their own models of the orbit on top.
 #pragma once
 
-#include "metadata/general_sar_base.h"
+#include "metadata_framework/general_sar_base.h"
 #include "runtime/call_scope.h"
 
 struct gr_pt_record;

@@ -48,7 +48,7 @@
 #include <string>
 #include <vector>
 
-#include "metadata/general_sar_base.h"
+#include "metadata_framework/general_sar_base.h"
 #include "raster/cell_type.h"
 #include "raster/complex_sample.h"
 #include "raster/data_file.h"

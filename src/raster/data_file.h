@@ -22,7 +22,7 @@
 #include <cstdint>
 #include <string>
 
-#include "metadata/general_sar_base.h"
+#include "metadata_framework/general_sar_base.h"
 #include "raster/cell_type.h"
 #include "runtime/call_scope.h"
 

@@ -5,9 +5,9 @@
 #include <cmath>
 #include <string>
 
-#include "metadata/geo_coords.h"
-#include "metadata/gs_roi.h"
-#include "metadata/poly_families.h"
+#include "metadata_sections/geo_coords.h"
+#include "metadata_sections/gs_roi.h"
+#include "metadata_sections/poly_families.h"
 #include "orbit/earth_constants.h"
 #include "orbit/general_sar_orbit.h"
 #include "orbit/gr_pt.h"

@@ -8,8 +8,8 @@
 #include <cstdlib>
 #include <string>
 
-#include "metadata/geo_coords.h"
-#include "metadata/gs_roi.h"
+#include "metadata_sections/geo_coords.h"
+#include "metadata_sections/gs_roi.h"
 #include "orbit/earth_constants.h"
 #include "orbit/general_sar_orbit.h"
 #include "orbit/geodetic.h"
