@@ -131,8 +131,7 @@ TEST_F(DriverChecks, MultilookChecksProductOutputAndOrbit) {
             std::string::npos);
   // A preliminary orbit is accepted: the run gets past the checks.
   a = multilookArgs();
-  a[2] = ENVISAT_SAMPLE_DIR
-      "DOR_POR_AXVF-P20080404_014700_20080401_215527_20080403_002327";
+  a[2] = vlr_test::kSamplePor;
   run("main_multilook_WSS#", a);
   EXPECT_EQ(errorFile().find("[EC : 456962]"), std::string::npos);
   // No auxiliary file valid at the product date.

@@ -12,12 +12,11 @@ using synth_test::SynthRun;
 
 namespace {
 
-const std::string kData = ENVISAT_SAMPLE_DIR;
-const std::string kVor = kData + "DOR_VOR_AXVF-P20080331_075200_20080301_215527_20080303_002327";
-const std::string kPor = kData + "DOR_POR_AXVF-P20080404_014700_20080401_215527_20080403_002327";
-const std::string kXca = kData + "ASA_XCA_AXVIEC20070517_153558_20070204_165113_20071231_000000";
-const std::string kEr1Xca =
-    kData + "ER1_XCA_AXNXXX20050321_000000_19910101_000000_20100101_000000.txt";
+const std::string kData = vlr_test::kSampleDir;
+const std::string kVor = vlr_test::kSampleVor;
+const std::string kPor = vlr_test::kSamplePor;
+const std::string kXca = vlr_test::kSampleXca;
+const std::string kEr1Xca = vlr_test::kSampleEr1Xca;
 
 // A file holding `name` where a product name stands (after PRODUCT=").
 std::string file_named(const std::string& name) {

@@ -172,8 +172,7 @@ TEST(ProductHeader, FieldsAreScannedWithinTheirWidth) {
   EXPECT_DOUBLE_EQ(v, 7.80397367);
   // The real calibration file with a blank software version.
   EnvisatHeaders h;
-  const std::string er1 = std::string(ENVISAT_SAMPLE_DIR) +
-                          "ER1_XCA_AXNXXX20050321_000000_19910101_000000_20100101_000000.txt";
+  const std::string& er1 = vlr_test::kSampleEr1Xca;
   ASSERT_EQ(read_envisat_headers(er1.c_str(), &h), 0);
   EXPECT_EQ(h.softwareVer, "");
   EXPECT_EQ(h.product, "ASA_XCA_AXVIEC20050301_000000_19910101_000000_20100101_000000");

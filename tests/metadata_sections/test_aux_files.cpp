@@ -17,8 +17,7 @@
 
 namespace {
 
-const std::string kXca = std::string(ENVISAT_SAMPLE_DIR) +
-                         "ASA_XCA_AXVIEC20070517_153558_20070204_165113_20071231_000000";
+const std::string kXca = vlr_test::kSampleXca;
 
 double gain(double db) {
   return std::pow(10.0, db / 20.0);

@@ -13,14 +13,15 @@
 #include <string>
 #include <vector>
 
+#include "sample_files.h"
 #include "time/date_text.h"
 
 namespace orbit_test {
 
-const std::string kData = ENVISAT_SAMPLE_DIR;
-const std::string kVor = kData + "DOR_VOR_AXVF-P20080331_075200_20080301_215527_20080303_002327";
-const std::string kPor = kData + "DOR_POR_AXVF-P20080404_014700_20080401_215527_20080403_002327";
-const std::string kXca = kData + "ASA_XCA_AXVIEC20070517_153558_20070204_165113_20071231_000000";
+const std::string kData = vlr_test::kSampleDir;
+const std::string kVor = vlr_test::kSampleVor;
+const std::string kPor = vlr_test::kSamplePor;
+const std::string kXca = vlr_test::kSampleXca;
 
 constexpr size_t kHeaderSize = 1625;
 constexpr size_t kRecordSize = 129;

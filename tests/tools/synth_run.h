@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+#include "sample_files.h"
+
 namespace synth_test {
 
 // Section -> key -> value of a parameter file.
