@@ -7,6 +7,7 @@
 #include "drivers/driver_arguments.h"
 #include "drivers/drivers.h"
 #include "drivers/find_aux.h"
+#include "extraction/images.h"
 #include "runtime/call_scope.h"
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
@@ -38,6 +39,13 @@ int readProductType(const char* product, std::string& type) {
   return 0;
 }
 
+// Copies a file name into one of the extraction's fixed name fields.
+bool CopyName(const std::string& name, char (&field)[kImagesNameSize]) {
+  if (name.size() >= kImagesNameSize) return false;
+  std::memcpy(field, name.c_str(), name.size() + 1);
+  return true;
+}
+
 }  // namespace
 
 int fvlr_main_import_esa(const char* argumentText) {
@@ -67,6 +75,9 @@ int fvlr_main_import_esa(const char* argumentText) {
     VLR_CALL(find_aux(product.c_str(), directory.c_str(), "ASA_INS", insPath));
   }
 
+  std::string orbit = DriverArgument(args, kDoris);
+  if (orbit == vlr::kNotOK) orbit.clear();
+
   std::string type;
   VLR_CALL(readProductType(product.c_str(), type));
   if (type != "WSS") {
@@ -75,7 +86,20 @@ int fvlr_main_import_esa(const char* argumentText) {
     VLR_REPORT("Input file is not a ASA_WSS dataset", 0);
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "WSS");
   }
-  // The extraction is not part of this build.
+  images_conf conf;
+  images extraction(conf);
+  if (!CopyName(product, extraction.input.ASA_level1_filename) ||
+      !CopyName(orbit, extraction.input.ASA_dor_vor) ||
+      !CopyName(insPath, extraction.input.ASA_INS_Filename) ||
+      !CopyName(DriverArgument(args, kOutputRoot), extraction.output.OutputFile)) {
+    VLR_FAIL("File name too long", vlr::kLibInconsistent);
+  }
+  conf.Memory = 256;
+  conf.ReportLevel = 1;
+  conf.Incore = 0;
+  conf.Verbose = 0;
+  VLR_CALL(extraction.run());
+  // The conversion to the suite header is not part of this build.
   NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, __LINE__,
-                          "extraction not available");
+                          "conversion not available");
 }

@@ -1,0 +1,544 @@
+#include "extraction/images.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cmath>
+#include <cstdio>
+#include <cstring>
+
+#include "envisat/product_header.h"
+#include "extraction/asar_annotation.h"
+#include "extraction/geolocation_polys.h"
+#include "extraction/product_kind.h"
+#include "metadata_sections/data_set_info.h"
+#include "metadata_sections/geo_coords.h"
+#include "metadata_sections/gs_roi.h"
+#include "metadata_sections/poly_sar.h"
+#include "metadata_sections/sampling_constants.h"
+#include "metadata_sections/sar_pulse.h"
+#include "metadata_sections/sensor_attitude.h"
+#include "metadata_sections/spectral_windows.h"
+#include "metadata_sections/swath_info.h"
+#include "orbit/general_sar_orbit.h"
+#include "raster/byte_order.h"
+#include "raster/cell_type.h"
+#include "raster/data_file.h"
+#include "runtime/call_scope.h"
+#include "runtime/error_codes.h"
+#include "runtime/file_utility.h"
+#include "time/date_text.h"
+
+namespace {
+
+constexpr const char* kModule = "images_v2";
+constexpr double kHalfSpeedOfLight = 149896229.0;
+constexpr double kSpeedOfLight = 299792458.0;
+// Place of each sub-swath in the burst sequence SS1 SS4 SS2 SS5 SS3.
+constexpr int kBurstOrder[kMaxImages] = {0, 2, 4, 1, 3};
+// More samples per line than any ASAR product holds: a larger value is a
+// damaged record, not a raster to allocate.
+constexpr uint32_t kMaxSamples = 1u << 20;
+
+// Copies `text` into a section's fixed text field.
+void SetText(char* field, const std::string& text) {
+  std::snprintf(field, kParStringSize, "%s", text.c_str());
+}
+
+bool Finite(double v) {
+  return std::isfinite(v);
+}
+
+// A UTC text as sec85; false when it does not parse.
+bool ParseUtc(const std::string& text, double* t) {
+  DateFields fields;
+  if (text.empty() || date2str(text.c_str(), &fields) != 0) return false;
+  *t = ascii2sec85(text.c_str());
+  return Finite(*t);
+}
+
+}  // namespace
+
+// Working state of one run: released when run() returns.
+struct images::Run {
+  EnvisatHeaders h;
+  const ProductKind* kind = nullptr;
+  EnvisatDataSet mds[kMaxImages];
+  int mdsFound = 0;
+  asar::AnnotationTable mpp, doppler, geolocation, antenna, chirp;
+  bool complex = true;
+  int elementSize = 4;  // bytes of one sample in the product
+  double sensingStart = 0.0, sensingStop = 0.0;
+  double burstCycle = 0.0;
+  int32_t summedLines = 0;  // output lines over all main-parameters records
+};
+
+int images::run() {
+  VLR_SCOPE("images::run", kModule);
+  nImages_ = 0;
+  for (int k = 0; k < kMaxImages; ++k) {
+    headerNames_[k][0] = '\0';
+    rasterNames_[k][0] = '\0';
+    data_[k] = ImageData();
+  }
+  Run r;
+  int rc = vlr_scope_.callee(runSteps(r), __LINE__);
+  if (rc == 0 && conf.ExtractData != 0) rc = vlr_scope_.callee(extractASARdata(), __LINE__);
+  if (rc != 0) {
+    removeOutputs();
+    return rc;
+  }
+  if (conf.Verbose != 0) VLR_REPORT("The program exits normally", ARE_CHECKPOINT);
+  return 0;
+}
+
+void images::removeOutputs() {
+  for (int k = 0; k < kMaxImages; ++k) {
+    if (conf.ExtractData != 0 && rasterNames_[k][0] != '\0') std::remove(rasterNames_[k]);
+    if (headerNames_[k][0] != '\0') std::remove(headerNames_[k]);
+  }
+}
+
+int images::runSteps(Run& r) {
+  VLR_SCOPE("images::runSteps", kModule);
+  const char* product = input.ASA_level1_filename;
+  VLR_CALL(read_envisat_headers(product, &r.h));
+  const EnvisatHeaders& h = r.h;
+  r.kind = &FindProductKind(h.productType);
+  const ProductKind& kind = *r.kind;
+
+  // Measurement data sets.
+  const EnvisatDsdLayout& layout = h.layout();
+  if (kind.wideSwath) {
+    r.mdsFound = h.imageDataSets(r.mds);
+    VLR_REPORT(NVLR_UTILITY_Format("There are %d SWATH (MDS)", r.mdsFound).c_str(), ARE_CHECKPOINT);
+    if (r.mdsFound != kMaxImages) {
+      VLR_FAIL(NVLR_UTILITY_Format("Wide-swath product with %d measurement data sets: %d needed",
+                                   r.mdsFound, kMaxImages)
+                   .c_str(),
+               vlr::kLibInconsistent);
+    }
+  } else {
+    r.mds[0] = h.dataSet(layout.mds[0]);
+    r.mds[1] = h.dataSet(layout.mds[1]);
+    r.mdsFound = r.mds[0].present() ? (r.mds[1].present() ? 2 : 1) : 0;
+  }
+
+  // Annotation data sets, read whole.
+  const int fd = open(product, O_RDONLY | O_CLOEXEC);
+  if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
+  struct FdCloser {
+    int fd;
+    ~FdCloser() { close(fd); }
+  } closer{fd};
+  const struct Table {
+    asar::AnnotationTable* table;
+    size_t sphOffset;
+    size_t minRecordSize;
+    const char* name;
+  } tables[] = {
+      {&r.mpp, layout.mainProcessing, asar::mpp::kMinRecordSize, "MAIN PROCESSING PARAMS ADS"},
+      {&r.doppler, layout.doppler, asar::dop::kMinRecordSize, "DOP CENTROID COEFFS ADS"},
+      {&r.geolocation, layout.geolocation, asar::geo::kMinRecordSize, "GEOLOCATION GRID ADS"},
+      {&r.antenna, layout.antenna, asar::antenna::kMinRecordSize, "ANTENNA ELEV PATT ADS"},
+      {&r.chirp, layout.chirp, asar::chirp::kMinRecordSize, "CHIRP PARAMS ADS"},
+  };
+  for (const Table& t : tables) {
+    VLR_CALL(t.table->read(fd, h.fileSize, h.dataSet(t.sphOffset), t.minRecordSize, t.name));
+  }
+  if (r.mpp.count() == 0) {
+    VLR_REPORT("WARNING: A number of 0 MPP is not supported!", ARE_CHECKPOINT);
+  } else {
+    VLR_REPORT(NVLR_UTILITY_Format("There are %ld MPP\n", static_cast<long>(r.mpp.count())).c_str(),
+               ARE_CHECKPOINT);
+  }
+  VLR_REPORT(
+      NVLR_UTILITY_Format("There are %ld DCCADS", static_cast<long>(r.doppler.count())).c_str(),
+      ARE_CHECKPOINT);
+  if (r.geolocation.count() == 0) {
+    VLR_REPORT("WARINING: A number of 0 DCC is not supported!", ARE_CHECKPOINT);
+  }
+  if (r.antenna.count() == 0) {
+    VLR_REPORT("WARNING: A number of 0 ANT is not supported", ARE_CHECKPOINT);
+  }
+
+  // Sample and data type.
+  r.complex = h.sampleType == "COMPLEX";
+  if (h.dataType == "SWOR" || h.dataType == "UWOR") {
+    r.elementSize = r.complex ? 4 : 2;
+  } else if (h.dataType == "BYTE") {
+    r.elementSize = r.complex ? 2 : 1;
+  } else {
+    VLR_FAIL(NVLR_UTILITY_Format("Data type %s not supported", h.dataType.c_str()).c_str(),
+             vlr::kLibInconsistent);
+  }
+  if (!h.spacingsValid || !(h.rangeSpacing > 0.0) || !(h.lineTimeInterval > 0.0)) {
+    VLR_FAIL("Range spacing or line time interval missing from the SPH", vlr::kLibInconsistent);
+  }
+
+  // Number of images.
+  nImages_ = kind.images > 0 ? kind.images : r.mpp.count();
+  if (nImages_ < 1 || nImages_ > kMaxImages) {
+    VLR_FAIL(NVLR_UTILITY_Format("Product with %d images", nImages_).c_str(),
+             vlr::kLibInconsistent);
+  }
+  if (r.mpp.count() < 1) VLR_FAIL("No main processing parameters record", vlr::kLibInconsistent);
+  for (int i = 0; i < r.mpp.count(); ++i) {
+    r.summedLines += static_cast<int32_t>(r.mpp.record(i).u32(asar::mpp::kNumOutputLines));
+  }
+
+  // Sensing start and stop.
+  const std::string& startText = kind.sensingFromMph ? h.sensingStart : h.firstLineTime;
+  const std::string& stopText = kind.sensingFromMph ? h.sensingStop : h.lastLineTime;
+  if (!ParseUtc(startText, &r.sensingStart) || !ParseUtc(stopText, &r.sensingStop)) {
+    VLR_FAIL("Sensing start or stop time does not parse", vlr::kLibInconsistent);
+  }
+  VLR_REPORT(NVLR_UTILITY_Format("Sensing start time from SPH: %f\n", r.sensingStart).c_str(),
+             ARE_CHECKPOINT);
+  VLR_REPORT(NVLR_UTILITY_Format("Sensing stop time from SPH: %f\n", r.sensingStop).c_str(),
+             ARE_CHECKPOINT);
+
+  // Burst cycle of a wide-swath product: every sub-swath's share of it.
+  if (kind.wideSwath) {
+    if (r.mpp.count() < kMaxImages) {
+      VLR_FAIL(NVLR_UTILITY_Format("Wide-swath product with %d main processing parameters "
+                                   "records: %d needed",
+                                   r.mpp.count(), kMaxImages)
+                   .c_str(),
+               vlr::kLibInconsistent);
+    }
+    for (int k = 0; k < kMaxImages; ++k) {
+      const asar::Record m = r.mpp.record(k);
+      const double prf = m.f32(asar::mpp::kPrf);
+      const double share =
+          (static_cast<double>(m.i32(asar::mpp::kRank)) + m.i32(asar::mpp::kEchoesPerBurst)) / prf;
+      if (!(prf > 0.0) || !Finite(share) || !(share > 0.0)) {
+        VLR_FAIL(NVLR_UTILITY_Format("Sub-swath %d: invalid PRF, rank or echoes per burst", k + 1)
+                     .c_str(),
+                 vlr::kLibInconsistent);
+      }
+      r.burstCycle += share;
+    }
+  }
+
+  for (int k = 0; k < nImages_; ++k) VLR_CALL(processImage(r, k));
+  r.mpp.release();
+  r.doppler.release();
+  r.geolocation.release();
+  r.antenna.release();
+  r.chirp.release();
+  return 0;
+}
+
+int images::processImage(Run& r, int k) {
+  VLR_SCOPE("images::processImage", kModule);
+  const EnvisatHeaders& h = r.h;
+  const ProductKind& kind = *r.kind;
+  const bool wss = kind.wideSwath;
+  const char* product = input.ASA_level1_filename;
+
+  // The image's main processing parameters.
+  if (k >= r.mpp.count() && !(kind.images == 2 && r.mpp.count() >= 1)) {
+    VLR_FAIL(
+        NVLR_UTILITY_Format("Image %d has no main processing parameters record", k + 1).c_str(),
+        vlr::kLibInconsistent);
+  }
+  const asar::Record m = r.mpp.record(k < r.mpp.count() ? k : r.mpp.count() - 1);
+  if (wss) {
+    const char digit = m.ch(asar::mpp::kSwathDigit);
+    if (digit != '1' + k && digit != ' ') {
+      VLR_FAIL(NVLR_UTILITY_Format("Main processing parameters record %d is not of sub-swath %d",
+                                   k + 1, k + 1)
+                   .c_str(),
+               vlr::kLibInconsistent);
+    }
+  }
+
+  // Range sampling and near range.
+  const double rangeInterval = h.rangeSpacing / kHalfSpeedOfLight;
+  GeolocationRows rows;
+  VLR_CALL(SelectGeolocationRows(r.geolocation, wss ? k + 1 : 0, &rows));
+  if (rows.empty()) {
+    VLR_FAIL(NVLR_UTILITY_Format("No geolocation record of image %d", k + 1).c_str(),
+             vlr::kLibInconsistent);
+  }
+  const asar::Record g = r.geolocation.record(rows.front());
+  const double nearTime =
+      g.f32(asar::geo::kSlantRangeTimes) * 1e-9 -
+      (static_cast<double>(g.u32(asar::geo::kFirstTieSample)) - 1.0) * rangeInterval;
+  const uint32_t samples = m.u32(asar::mpp::kSamplesPerLine);
+  if (samples < 1 || samples > kMaxSamples || !Finite(nearTime)) {
+    VLR_FAIL(NVLR_UTILITY_Format("Image %d: %u samples per line", k + 1, samples).c_str(),
+             vlr::kLibInconsistent);
+  }
+
+  // The image's measurement data set.
+  const int mdsIndex = wss ? k : (k < r.mdsFound ? k : -1);
+  if (mdsIndex < 0) {
+    VLR_FAIL(NVLR_UTILITY_Format("Image %d has no measurement data set", k + 1).c_str(),
+             vlr::kLibInconsistent);
+  }
+  const EnvisatDataSet& mds = r.mds[mdsIndex];
+  const int64_t recordSize =
+      static_cast<int64_t>(asar::mds::kLinePrefixSize) + int64_t{samples} * r.elementSize;
+  if (mds.dsrSize != recordSize) {
+    VLR_FAIL(NVLR_UTILITY_Format("MDS%d: records of %lld bytes, %lld expected for %u samples",
+                                 mdsIndex + 1, static_cast<long long>(mds.dsrSize),
+                                 static_cast<long long>(recordSize), samples)
+                 .c_str(),
+             vlr::kLibInconsistent);
+  }
+  if (!mds.fitsIn(h.fileSize) || mds.numDsr < 1 || mds.numDsr > INT32_MAX) {
+    VLR_REPORT(
+        NVLR_UTILITY_Format("MDS%d: records beyond the end of the file", mdsIndex + 1).c_str(),
+        ARE_ERROR);
+    VLR_FAIL("File reading failed!", vlr::kLibRead);
+  }
+  const int32_t records = static_cast<int32_t>(mds.numDsr);
+
+  // Azimuth limits.
+  LineTiming timing;
+  timing.lineInterval = h.lineTimeInterval;
+  timing.firstLineText = kind.sensingFromMph ? h.sensingStart : h.firstLineTime;
+  timing.lastLineText = kind.sensingFromMph ? h.sensingStop : h.lastLineTime;
+  const int linesPerBurst = m.i32(asar::mpp::kLinesPerBurst);
+  timing.linesPerBurst = linesPerBurst;
+  timing.burstCycle = r.burstCycle;
+  double first = 0.0, last = 0.0;
+  VLR_CALL(
+      get_first_last(product, mds.offset, mds.dsrSize, mds.numDsr, timing, wss, &first, &last));
+
+  // Derived geometry.  A wide-swath raster keeps every record (bursts
+  // overlap in time); its region describes the zero-Doppler line grid.
+  const double farTime = nearTime + (samples - 1.0) * rangeInterval;
+  const double interval = h.lineTimeInterval;
+  int32_t lineTimes = 0;
+  if (wss) {
+    lineTimes = static_cast<int32_t>(std::lround((last - first) / interval)) + 1;
+  } else {
+    lineTimes =
+        kind.linesSummed ? r.summedLines : static_cast<int32_t>(m.u32(asar::mpp::kNumOutputLines));
+    if (lineTimes != records) {
+      VLR_FAIL(
+          NVLR_UTILITY_Format("Image %d: %d output lines but %d records", k + 1, lineTimes, records)
+              .c_str(),
+          vlr::kLibInconsistent);
+    }
+  }
+  if (lineTimes < 1) VLR_FAIL("Image without lines", vlr::kLibInconsistent);
+  const double azimuthEnd = (lineTimes - 1.0) * interval;
+
+  // File names.
+  const bool numbered = wss || nImages_ > 1;
+  const char* root = conf.ExtractData != 0 ? output.OutputFile : product;
+  const std::string raster =
+      numbered ? NVLR_UTILITY_Format("%s%d", root, k + 1) : std::string(root);
+  const std::string header = NVLR_UTILITY_Format("%s.hdr", raster.c_str());
+  if (header.size() >= kImagesNameSize) {
+    VLR_FAIL(NVLR_UTILITY_Format("Output name too long (%zu characters)", header.size()).c_str(),
+             vlr::kLibInconsistent);
+  }
+  struct stat st;
+  if (conf.ExtractData != 0 && stat(raster.c_str(), &st) == 0 && std::remove(raster.c_str()) != 0)
+    VLR_REPORT("Cannot remove file", ARE_WARNING);
+  if (stat(header.c_str(), &st) == 0 && std::remove(header.c_str()) != 0)
+    VLR_REPORT("Cannot remove file", ARE_WARNING);
+  std::snprintf(rasterNames_[k], kImagesNameSize, "%s", raster.c_str());
+  std::snprintf(headerNames_[k], kImagesNameSize, "%s", header.c_str());
+  const char* hdr = headerNames_[k];
+  VLR_REPORT(NVLR_UTILITY_Format("Writing Header file: %s\n", hdr).c_str(), ARE_CHECKPOINT);
+
+  // Data-set information.
+  const bool second = !wss && k == 1;
+  DataSetInfo_Obj info;
+  SetText(info.OrbitNumber, h.absOrbit);
+  SetText(info.Track, h.relOrbit);
+  SetText(info.SenseDate, h.sensingStart);
+  SetText(info.SceneID, h.product);
+  SetText(info.Description, kind.description != nullptr ? kind.description : h.sphDescriptor);
+  SetText(info.AcquisitionStation, h.acquisitionStation);
+  SetText(info.ProcessingCenter, h.procCenter);
+  SetText(info.ProcessingDate, h.procTime);
+  SetText(info.ProcessingSoftware, h.softwareVer);
+  switch (kind.swath) {
+    case SwathNaming::kSubSwath:
+      SetText(info.Swath, NVLR_UTILITY_Format("SS%d", k + 1));
+      break;
+    case SwathNaming::kSphSwath:
+      SetText(info.Swath, h.swath);
+      break;
+    case SwathNaming::kIsDigit:
+      SetText(info.Swath,
+              "IS" + (h.swath.empty() ? std::string() : h.swath.substr(h.swath.size() - 1)));
+      break;
+  }
+  const std::string& polar = second ? h.mds2Polar : h.mds1Polar;
+  if (polar.size() >= 3)
+    SetText(info.Polarization, NVLR_UTILITY_Format("%c/%c", polar[0], polar[2]));
+  info.ExternalCalibrationFactor = m.f32(asar::mpp::kExternalCalibrationFactor);
+  info.SetType(kind.image, DS_SENSOR_ASAR, kind.mode, kind.projection, kind.unit,
+               DS_REFSYS_UNDEFINED);
+
+  // Swath and burst information.
+  SwathInfo swath;
+  swath.Acquisition_Start_Time =
+      m.time(asar::mpp::kFirstZeroDopplerTime) + m.f32(asar::mpp::kTimeDiffZeroDoppler);
+  swath.ProcessorGain = m.f32(asar::mpp::kProcessorGain);
+  swath.NoisePower = m.f32(second && kind.secondNoiseField ? asar::mpp::kNoisePowerSecond
+                                                           : asar::mpp::kNoisePower);
+  if (wss) {
+    if (linesPerBurst < 1) {
+      VLR_FAIL(
+          NVLR_UTILITY_Format("Sub-swath %d: %d lines per burst", k + 1, linesPerBurst).c_str(),
+          vlr::kLibInconsistent);
+    }
+    const uint32_t outputLines = m.u32(asar::mpp::kNumOutputLines);
+    if (outputLines != static_cast<uint32_t>(records)) {
+      VLR_REPORT(NVLR_UTILITY_Format("Sub-swath %d: %u output lines, %d records; the records are "
+                                     "kept",
+                                     k + 1, outputLines, records)
+                     .c_str(),
+                 ARE_WARNING);
+    }
+    swath.Rank = m.i32(asar::mpp::kRank);
+    swath.Echoes_per_burst = m.i32(asar::mpp::kEchoesPerBurst);
+    swath.Lines_per_burst = linesPerBurst;
+    swath.Bursts = records / linesPerBurst;
+    swath.Order = kBurstOrder[k];
+  }
+  if (r.chirp.count() > 0) {
+    if (kind.chirpPower == ChirpPowerSource::kRecordOfImage && k < r.chirp.count()) {
+      swath.ChirpPower = r.chirp.record(k).f32(asar::chirp::kChirpPower);
+    } else if (kind.chirpPower == ChirpPowerSource::kMatchingPolarDb) {
+      for (int i = 0; i < r.chirp.count(); ++i) {
+        const asar::Record c = r.chirp.record(i);
+        if (c.token(asar::chirp::kPolarisation, 3) == polar) {
+          swath.ChirpPower = std::pow(10.0, c.f32(asar::chirp::kElevationChirpPowerDb) / 10.0);
+          break;
+        }
+      }
+    }
+  }
+  VLR_CALL(swath.writehdr(hdr));
+
+  // Sampling constants.
+  SamplingConstants_Obj sampling;
+  sampling.fc_hz = m.f32(asar::mpp::kRadarFrequency);
+  sampling.lambda_m = kSpeedOfLight / sampling.fc_hz;
+  sampling.frg_hz = m.f32(asar::mpp::kRangeSamplingRate);
+  sampling.Trg_s = 1.0 / sampling.frg_hz;
+  sampling.Brg_hz = m.f32(asar::mpp::kRangeBandwidth);
+  sampling.prf_hz = m.f32(asar::mpp::kPrf);
+  sampling.pri_s = 1.0 / sampling.prf_hz;
+  sampling.Baz_hz = sampling.prf_hz;
+  sampling.bri_s = r.burstCycle;
+  // Products without bursts have no burst rate: stored as 0.
+  sampling.brf_hz = r.burstCycle > 0.0 ? 1.0 / r.burstCycle : 0.0;
+  if (!(sampling.fc_hz > 0.0) || !(sampling.frg_hz > 0.0) || !(sampling.prf_hz > 0.0)) {
+    VLR_FAIL(
+        NVLR_UTILITY_Format("Image %d: carrier, range sampling rate or PRF not positive", k + 1)
+            .c_str(),
+        vlr::kLibInconsistent);
+  }
+  VLR_CALL(sampling.writehdr(hdr));
+
+  // Spectral windows.
+  SpectralWindows_Obj windows;
+  SetText(windows.RgMatchedFilterType,
+          m.token(asar::mpp::kRangeWindowType, asar::mpp::kWindowTypeWidth));
+  windows.RgMatchedFilterCoef = m.f32(asar::mpp::kRangeWindowCoef);
+  SetText(windows.AzMatchedFilterType,
+          m.token(asar::mpp::kAzimuthWindowType, asar::mpp::kWindowTypeWidth));
+  windows.AzMatchedFilterCoef = m.f32(asar::mpp::kAzimuthWindowCoef);
+  windows.RgLookBandwidth = m.f32(asar::mpp::kRangeLookBandwidth + 4 * (wss ? k : 0));
+  windows.AzLookBandwidth = m.f32(asar::mpp::kAzimuthLookBandwidth);
+  VLR_CALL(windows.writehdr(hdr));
+
+  // Raster description: the lines inside the product.
+  ImageData& d = data_[k];
+  d.offset = mds.offset;
+  d.recordSize = mds.dsrSize;
+  d.samples = static_cast<int32_t>(samples);
+  d.lines = records;
+  if (r.elementSize == 4 || r.elementSize == 2) {
+    d.inputCellType = r.complex ? CT_SHORT_COMPLEX : CT_INT16;
+  } else {
+    d.inputCellType = r.complex ? CT_INT8_COMPLEX : CT_INT8;
+  }
+  d.outputCellType = r.complex ? CT_FLOAT_COMPLEX : CT_FLOAT32;
+  DataFile described;
+  described.set_name(raster.c_str());
+  described.pixels_per_line = d.samples;
+  described.lines_per_image = d.lines;
+  described.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
+  described.header_offset = d.offset;
+  described.cell_type = d.inputCellType;
+  described.byte_order = 1;
+  VLR_CALL(described.write_hdr());
+
+  // State vectors and corners.
+  const double lambda = sampling.lambda_m;
+  FILE* orbitFile = input.ASA_dor_vor[0] != '\0' ? std::fopen(input.ASA_dor_vor, "rb") : nullptr;
+  if (orbitFile != nullptr) {
+    std::fclose(orbitFile);
+    GeneralSAROrbit orbit(lambda);
+    VLR_CALL(orbit.GetStateVectorsENVI(input.ASA_dor_vor, first, last - first));
+    VLR_CALL(orbit.writehdr(hdr));
+    GSRoi_Obj extent;
+    extent.roi.FastStartTime = nearTime;
+    extent.roi.FastTimeLength = farTime - nearTime;
+    extent.roi.SlowStartTime = first;
+    extent.roi.SlowTimeLength = last - first;
+    geoCoords_Obj corners;
+    VLR_CALL(orbit.SVGetGeoCoords(&corners, &extent));
+    // The centre: the middle sample, and for bursts half the bursts' cycles
+    // after the first line.
+    const double centreRange = nearTime + std::ceil(samples / 2.0) * rangeInterval;
+    const double centreTime =
+        wss ? first + std::round(static_cast<double>(records) / linesPerBurst) * r.burstCycle / 2.0
+            : first + azimuthEnd / 2.0;
+    double lat = 0.0, lon = 0.0, incidence = 0.0, look = 0.0;
+    VLR_CALL(orbit.SVGetLatLon(centreTime, centreRange, &lat, &lon));
+    VLR_CALL(orbit.SVGetAngles(centreTime, centreRange, &incidence, &look));
+    corners.Center.set(lat, lon, 0.0, incidence, look);
+    VLR_CALL(corners.writehdr(hdr));
+  } else if (conf.Verbose != 0) {
+    VLR_REPORT("No DOR_VOR file provided. Skipping state vectors informations", ARE_WARNING);
+  }
+
+  // Data-set information and region.
+  VLR_CALL(info.writehdr(hdr));
+  GSRoi_Obj region;
+  region.roi.FastStartTime = nearTime;
+  region.roi.FastTimeDelta = rangeInterval;
+  region.roi.Samples = d.samples;
+  region.roi.FastTimeLength = farTime - nearTime;
+  region.roi.SlowStartTime = 0.0;
+  region.roi.SlowTimeDelta = interval;
+  region.roi.Lines = lineTimes;
+  region.roi.SlowTimeLength = last - first;
+  VLR_CALL(region.writehdr(hdr));
+
+  // Polynomials.
+  polySAR polys;
+  VLR_CALL(MakeImagePolynomials(r.doppler, r.geolocation, rows, wss ? k : -1, m, &polys));
+  VLR_CALL(polys.writehdr(hdr));
+
+  // Attitude and pulse.
+  SensorAttitude_Obj attitude;
+  attitude.Eq_speed = -1.0;
+  attitude.Mean_DC = -1.0;
+  attitude.SquintAngle = -1.0;
+  attitude.AntennaLength = 10.0;
+  if (input.ASA_INS_Filename[0] != '\0') {
+    VLR_CALL(attitude.getDroopGain(input.ASA_INS_Filename, kind.droopMode));
+  }
+  VLR_CALL(attitude.writehdr(hdr));
+  SARPulse_Obj pulse;
+  pulse.PulseLength = m.f32(asar::mpp::kPulseLength);
+  pulse.Bandwidth = m.f32(asar::mpp::kRangeBandwidth);
+  pulse.PulseSamplingRate = m.f32(asar::mpp::kRangeSamplingRate);
+  VLR_CALL(pulse.writehdr(hdr));
+  return 0;
+}

@@ -1,0 +1,371 @@
+// The extraction against the generator's truth: every sample and line
+// prefix of the five rasters against the product's own bytes, and the
+// metadata headers against the values the generator wrote and the geometry
+// it computed by itself.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+#include <vector>
+
+#include "extraction/images.h"
+#include "metadata_sections/data_set_info.h"
+#include "metadata_sections/geo_coords.h"
+#include "metadata_sections/gs_roi.h"
+#include "metadata_sections/poly_sar.h"
+#include "metadata_sections/sampling_constants.h"
+#include "metadata_sections/sar_pulse.h"
+#include "metadata_sections/spectral_windows.h"
+#include "metadata_sections/swath_info.h"
+#include "orbit/earth_constants.h"
+#include "orbit/general_sar_orbit.h"
+#include "orbit/geodetic.h"
+#include "raster/data_file.h"
+#include "runtime/suite_state.h"
+#include "synth_run.h"
+
+namespace {
+
+using synth_test::SynthRun;
+
+constexpr size_t kPrefix = 17;
+
+std::string Text(const SynthRun& run, const std::string& section, const std::string& key) {
+  const auto s = run.truth.find(section);
+  if (s == run.truth.end() || s->second.count(key) == 0) return "nan";
+  return s->second.at(key);
+}
+double Value(const SynthRun& run, const std::string& section, const std::string& key) {
+  return std::atof(Text(run, section, key).c_str());
+}
+std::string Swath(int k) {
+  return "SubSwath" + std::to_string(k);
+}
+bool Exists(const std::string& path) {
+  struct stat st;
+  return stat(path.c_str(), &st) == 0;
+}
+
+// The host's side of the progress protocol: a working file and its
+// "_batch_ok" companion, so that the copy's progress bar can report.
+class HostWorkingFile : public ::testing::Environment {
+ public:
+  void SetUp() override {
+    char pattern[] = "/tmp/vlr_extraction_XXXXXX";
+    ASSERT_NE(mkdtemp(pattern), nullptr);
+    dir_ = pattern;
+    const std::string working = dir_ + "/Process.working";
+    std::FILE* f = std::fopen(working.c_str(), "w");
+    ASSERT_NE(f, nullptr);
+    std::fputs("0\nStarting\n", f);
+    std::fclose(f);
+    f = std::fopen((working + "_batch_ok").c_str(), "w");
+    ASSERT_NE(f, nullptr);
+    std::fclose(f);
+    vlr_detail::suite().workingFile = working;
+  }
+  void TearDown() override { synth_test::shell("rm -rf '" + dir_ + "'"); }
+
+ private:
+  std::string dir_;
+};
+::testing::Environment* const kHost = ::testing::AddGlobalTestEnvironment(new HostWorkingFile);
+
+// Runs the extraction of a generated product into <dir>R.
+int Extract(const SynthRun& run, images_conf& conf, images* out, bool withOrbit = true) {
+  std::snprintf(out->input.ASA_level1_filename, kImagesNameSize, "%s", run.product.c_str());
+  if (withOrbit) {
+    std::snprintf(out->input.ASA_dor_vor, kImagesNameSize, "%s%s", run.dir.c_str(),
+                  Text(run, "Scene", "OrbitFile").c_str());
+  }
+  std::snprintf(out->input.ASA_INS_Filename, kImagesNameSize, "%s%s", run.dir.c_str(),
+                Text(run, "Scene", "InsFile").c_str());
+  std::snprintf(out->output.OutputFile, kImagesNameSize, "%sR", run.dir.c_str());
+  conf.Verbose = 1;
+  return out->run();
+}
+
+void Cartesian(double lat, double lon, double out[3]) {
+  const double llh[3] = {lat / kRadToDeg, lon / kRadToDeg, 0.0};
+  geo2cart(out, llh);
+}
+double Distance(double lat1, double lon1, double lat2, double lon2) {
+  double a[3], b[3];
+  Cartesian(lat1, lon1, a);
+  Cartesian(lat2, lon2, b);
+  return std::sqrt((a[0] - b[0]) * (a[0] - b[0]) + (a[1] - b[1]) * (a[1] - b[1]) +
+                   (a[2] - b[2]) * (a[2] - b[2]));
+}
+
+// Every record of MDS k of the product against raster k: prefix bytes
+// unchanged, samples the product's big-endian int16 values as floats.
+void ExpectRasterHoldsEveryRecord(const SynthRun& run, const std::vector<uint8_t>& product, int k,
+                                  const std::string& raster) {
+  const int samples = static_cast<int>(Value(run, Swath(k), "Samples"));
+  const int records = static_cast<int>(Value(run, Swath(k), "Records"));
+  const size_t offset = static_cast<size_t>(Value(run, Swath(k), "MdsOffset"));
+  const size_t inRecord = kPrefix + 4 * static_cast<size_t>(samples);
+  const size_t outRecord = kPrefix + 8 * static_cast<size_t>(samples);
+  const std::vector<uint8_t> out = synth_test::read_file(raster);
+  ASSERT_EQ(out.size(), outRecord * records) << raster;
+  ASSERT_LE(offset + inRecord * records, product.size());
+  for (int r = 0; r < records; ++r) {
+    const uint8_t* in = product.data() + offset + inRecord * r;
+    const uint8_t* line = out.data() + outRecord * r;
+    ASSERT_EQ(std::memcmp(in, line, kPrefix), 0) << raster << " prefix of record " << r;
+    for (int s = 0; s < 2 * samples; ++s) {
+      float v;
+      std::memcpy(&v, line + kPrefix + 4 * s, 4);
+      ASSERT_EQ(v, static_cast<float>(synth_test::be16(in + kPrefix + 2 * s)))
+          << raster << " record " << r << " component " << s;
+    }
+  }
+}
+
+class Extraction : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
+  const SynthRun run = synth_test::run_synth(GetParam());
+  ASSERT_EQ(run.exit_code, 0);
+  images_conf conf;
+  images ex(conf);
+  ASSERT_EQ(Extract(run, conf, &ex), 0);
+  ASSERT_EQ(ex.imageCount(), 5);
+  const std::vector<uint8_t> product = synth_test::read_file(run.product);
+  const double interval = Value(run, "Scene", "LineTimeInterval");
+  const double cycle = Value(run, "Scene", "BurstCycle");
+  for (int k = 1; k <= 5; ++k) {
+    SCOPED_TRACE(Swath(k));
+    const std::string s = Swath(k);
+    const std::string raster = run.dir + "R" + std::to_string(k);
+    const std::string hdr = raster + ".hdr";
+    EXPECT_EQ(ex.rasterName(k - 1), raster);
+    EXPECT_EQ(ex.headerName(k - 1), hdr);
+    ExpectRasterHoldsEveryRecord(run, product, k, raster);
+
+    DataFile df;
+    ASSERT_EQ(df.read_hdr(raster.c_str()), 0);
+    EXPECT_EQ(df.pixels_per_line, Value(run, s, "Samples"));
+    EXPECT_EQ(df.lines_per_image, Value(run, s, "Records"));
+    EXPECT_EQ(df.row_prefix, 17);
+    EXPECT_EQ(df.header_offset, 0);
+    EXPECT_EQ(df.cell_type, CT_FLOAT_COMPLEX);
+
+    SwathInfo swath;
+    ASSERT_EQ(swath.readhdr(hdr.c_str()), 0);
+    EXPECT_EQ(swath.Lines_per_burst, Value(run, s, "LinesPerBurst"));
+    EXPECT_EQ(swath.Bursts, Value(run, s, "Bursts"));
+    EXPECT_EQ(swath.Rank, Value(run, s, "Rank"));
+    EXPECT_EQ(swath.Echoes_per_burst, Value(run, s, "EchoesPerBurst"));
+    constexpr int kOrder[] = {0, 2, 4, 1, 3};
+    EXPECT_EQ(swath.Order, kOrder[k - 1]);
+    EXPECT_NEAR(swath.Acquisition_Start_Time, Value(run, s, "AcquisitionStartTime"), 1e-6);
+    EXPECT_NEAR(swath.ChirpPower, Value(run, s, "ChirpPower"), 1e-6);
+    EXPECT_NEAR(swath.NoisePower, Value(run, s, "NoisePower"), 1e-6);
+
+    SamplingConstants_Obj sc;
+    ASSERT_EQ(sc.readhdr(hdr.c_str()), 0);
+    EXPECT_NEAR(sc.prf_hz, Value(run, s, "PRF"), 1e-3);
+    EXPECT_NEAR(sc.bri_s, cycle, 1e-9);
+    EXPECT_NEAR(sc.fc_hz, Value(run, "Scene", "CarrierFrequency"), 1e3);
+    EXPECT_NEAR(sc.frg_hz, Value(run, "Scene", "RangeSamplingRate"), 1.0);
+    EXPECT_NEAR(sc.Brg_hz, Value(run, s, "PulseBandwidth"), 1.0);
+
+    SpectralWindows_Obj sw;
+    ASSERT_EQ(sw.readhdr(hdr.c_str()), 0);
+    EXPECT_NEAR(sw.RgLookBandwidth, Value(run, s, "RangeLookBandwidth"), 1.0);
+    EXPECT_NEAR(sw.AzLookBandwidth, Value(run, s, "AzimuthLookBandwidth"), 1e-3);
+    EXPECT_STREQ(sw.RgMatchedFilterType, Text(run, s, "RangeWindowType").c_str());
+    EXPECT_STREQ(sw.AzMatchedFilterType, Text(run, s, "AzimuthWindowType").c_str());
+    EXPECT_NEAR(sw.RgMatchedFilterCoef, Value(run, s, "RangeWindowCoefficient"), 1e-6);
+    EXPECT_NEAR(sw.AzMatchedFilterCoef, Value(run, s, "AzimuthWindowCoefficient"), 1e-6);
+
+    SARPulse_Obj pulse;
+    ASSERT_EQ(pulse.readhdr(hdr.c_str()), 0);
+    EXPECT_NEAR(pulse.PulseLength, Value(run, s, "PulseLength"), 1e-12);
+
+    // The region: the zero-Doppler line grid of the sub-swath.
+    const double first = Value(run, s, "FirstLineTime");
+    const double last = Value(run, s, "LastLineTime");
+    const double nearTime = Value(run, s, "NearRangeTime");
+    GSRoi_Obj roi;
+    ASSERT_EQ(roi.readhdr(hdr.c_str()), 0);
+    // The grid stores range times as float nanoseconds: half a nanosecond
+    // of resolution at 5.5 ms, far below one sample (52 ns).
+    EXPECT_NEAR(roi.roi.FastStartTime, nearTime, 3e-10);
+    EXPECT_NEAR(roi.roi.SlowTimeLength, last - first, 1e-6);
+    EXPECT_DOUBLE_EQ(roi.roi.SlowTimeDelta, interval);
+    EXPECT_EQ(roi.roi.Lines, std::lround((last - first) / interval) + 1);
+
+    // Polynomials: the sub-swath's own Doppler offset and the FM rate.
+    polySAR polys;
+    ASSERT_EQ(polys.readhdr(hdr.c_str()), 0);
+    ASSERT_GE(polys.ndc, 1);
+    // "DopplerRecord0": reference time, then the coefficients of the
+    // sub-swath with its offset included.
+    double dopTime = 0.0, dopC0 = 0.0, dopC1 = 0.0;
+    ASSERT_EQ(std::sscanf(Text(run, s, "DopplerRecord0").c_str(), "%lf %lf %lf", &dopTime, &dopC0,
+                          &dopC1),
+              3);
+    EXPECT_NEAR(polys.dc[0].taz0_s, dopTime, 1e-6);
+    EXPECT_NEAR(polys.dc[0].trg0_s, Value(run, s, "DopplerRangeTime"), 1e-12);
+    EXPECT_NEAR(polys.dc[0].pol[0], dopC0, 1e-3);
+    EXPECT_NEAR(polys.dc[0].pol[1], dopC1, std::fabs(dopC1) * 1e-6);
+    ASSERT_EQ(polys.nfr, 1);
+    EXPECT_NEAR(polys.fr[0].pol[0], Value(run, s, "FmRateC0"), 1e-3);
+    EXPECT_NEAR(polys.fr[0].pol[1], Value(run, s, "FmRateC1"),
+                std::fabs(Value(run, s, "FmRateC1")) * 1e-6);
+    EXPECT_NEAR(polys.fr[0].pol[4], Value(run, s, "FmRateC2"),
+                std::fabs(Value(run, s, "FmRateC2")) * 1e-6);
+    EXPECT_NEAR(polys.fr[0].trg0_s, Value(run, s, "FmRateRangeTime"), 1e-12);
+
+    // State vectors spanning the image, corners and centre.
+    GeneralSAROrbit orbit;
+    ASSERT_EQ(orbit.readhdr(hdr.c_str()), 0);
+    ASSERT_GE(orbit.n(), 5);
+    EXPECT_LE(orbit.t0(), first);
+    EXPECT_GE(orbit.t0() + (orbit.n() - 1) * orbit.dt(), last);
+    geoCoords_Obj gc;
+    ASSERT_EQ(gc.readhdr(hdr.c_str()), 0);
+    const bool ascending = Text(run, "Scene", "Pass") == "ASCENDING";
+    const geopoint& firstNear = ascending ? gc.SouthWest : gc.NorthEast;
+    const geopoint& lastFar = ascending ? gc.NorthEast : gc.SouthWest;
+    EXPECT_LT(Distance(firstNear.latitude, firstNear.longitude, Value(run, s, "FirstNearLat"),
+                       Value(run, s, "FirstNearLon")),
+              1.0);
+    EXPECT_LT(Distance(lastFar.latitude, lastFar.longitude, Value(run, s, "LastFarLat"),
+                       Value(run, s, "LastFarLon")),
+              1.0);
+    // The centre lies at the middle sample and half the bursts' cycles after
+    // the first line; the orbit geometry (checked against the generator on
+    // its own) gives the point there.
+    const double rangeInterval = Value(run, "Scene", "RangeSpacing") / kHalfSpeedOfLight;
+    const double centreRange = nearTime + std::ceil(Value(run, s, "Samples") / 2.0) * rangeInterval;
+    const double centreTime = first + Value(run, s, "Bursts") * cycle / 2.0;
+    double lat = 0.0, lon = 0.0;
+    ASSERT_EQ(orbit.SVGetLatLon(centreTime, centreRange, &lat, &lon), 0);
+    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, lat, lon), 1.0);
+  }
+  synth_test::remove_run(run);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Products, Extraction,
+    ::testing::Values("--seed 1", "--seed 5 --pass ascending --polarisation VV",
+                      "--seed 2 --blank-start 20 --blank-end 30",
+                      "--seed 4 --blank-start 70 --blank-end 120 --blank-zero-time",
+                      "--seed 6 --first-tie-sample 7 --pass ascending"));
+
+// First and last line times from the burst structure of every sub-swath,
+// whatever blank records stand at either end, against the generator's
+// times of the first line of the first burst and the last of the last.
+TEST(LineTimes, BurstStructureGivesTheFirstAndLastLineToAMicrosecond) {
+  for (const char* args : {"--seed 8", "--seed 9 --blank-start 10 --blank-end 5",
+                           "--seed 9 --blank-start 130 --blank-end 75 --blank-zero-time"}) {
+    SCOPED_TRACE(args);
+    const SynthRun run = synth_test::run_synth(args);
+    ASSERT_EQ(run.exit_code, 0);
+    for (int k = 1; k <= 5; ++k) {
+      const std::string s = Swath(k);
+      LineTiming timing;
+      timing.lineInterval = Value(run, "Scene", "LineTimeInterval");
+      timing.linesPerBurst = static_cast<int>(Value(run, s, "LinesPerBurst"));
+      timing.burstCycle = Value(run, "Scene", "BurstCycle");
+      timing.firstLineText = Text(run, "Scene", "SensingStartText");
+      timing.lastLineText = Text(run, "Scene", "SensingStopText");
+      const int64_t samples = static_cast<int64_t>(Value(run, s, "Samples"));
+      double first = 0.0, last = 0.0;
+      ASSERT_EQ(
+          get_first_last(run.product.c_str(), static_cast<int64_t>(Value(run, s, "MdsOffset")),
+                         17 + 4 * samples, static_cast<int64_t>(Value(run, s, "Records")), timing,
+                         true, &first, &last),
+          0);
+      EXPECT_NEAR(first, Value(run, s, "FirstLineTime"), 1e-6) << s;
+      EXPECT_NEAR(last, Value(run, s, "LastLineTime"), 1e-6) << s;
+    }
+    synth_test::remove_run(run);
+  }
+}
+
+// GDAL's ENVISAT reader on the same product: its copy of the first
+// measurement data set equals the samples of raster 1.
+TEST(GdalAgrees, SamplesOfTheFirstSubSwath) {
+  if (synth_test::shell("command -v gdal_translate >/dev/null 2>&1") != 0) {
+    GTEST_SKIP() << "gdal-bin is not installed";
+  }
+  const SynthRun run = synth_test::run_synth("--size small --seed 11 --pass ascending");
+  ASSERT_EQ(run.exit_code, 0);
+  images_conf conf;
+  images ex(conf);
+  ASSERT_EQ(Extract(run, conf, &ex, false), 0);
+  const std::string raw = run.dir + "gdal_ss1.bin";
+  ASSERT_EQ(synth_test::shell("gdal_translate -q -ot CFloat32 -of ENVI -b 1 '" + run.product +
+                              "' " + raw + " > /dev/null 2>&1"),
+            0);
+  const std::vector<uint8_t> gdal = synth_test::read_file(raw);
+  const std::vector<uint8_t> ours = synth_test::read_file(run.dir + "R1");
+  const size_t samples = static_cast<size_t>(Value(run, "SubSwath1", "Samples"));
+  const size_t records = static_cast<size_t>(Value(run, "SubSwath1", "Records"));
+  ASSERT_EQ(gdal.size(), samples * records * 8);
+  ASSERT_EQ(ours.size(), (kPrefix + samples * 8) * records);
+  size_t mismatches = 0;
+  for (size_t r = 0; r < records; ++r) {
+    if (std::memcmp(&gdal[r * samples * 8], &ours[r * (kPrefix + samples * 8) + kPrefix],
+                    samples * 8) != 0) {
+      ++mismatches;
+    }
+  }
+  EXPECT_EQ(mismatches, 0u);
+  synth_test::remove_run(run);
+}
+
+// Damaged products: a documented code, and no raster or header left that
+// could pass for a complete one.
+TEST(BadProducts, RefusedWithACodeAndNoOutputLeft) {
+  const struct {
+    const char* args;
+    int code;
+  } cases[] = {
+      {"--truncate 300000", 4},   // inside the measurement data
+      {"--truncate 20000", 4},    // inside the annotation
+      {"--dsd-beyond-end 1", 4},  // main processing parameters
+      {"--dsd-beyond-end 9", 4},  // third measurement data set
+      {"--zero-count 1", 1},      // no main processing parameters
+      {"--zero-count 5", 1},      // no geolocation grid
+      {"--mds-count 4", 1},       // four sub-swaths
+      {"--wrong-type ASA_IMS_1P", 1},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.args);
+    const SynthRun run = synth_test::run_synth(c.args);
+    ASSERT_EQ(run.exit_code, 0);
+    images_conf conf;
+    images ex(conf);
+    EXPECT_EQ(Extract(run, conf, &ex), c.code);
+    for (int k = 1; k <= 5; ++k) {
+      EXPECT_FALSE(Exists(run.dir + "R" + std::to_string(k))) << k;
+      EXPECT_FALSE(Exists(run.dir + "R" + std::to_string(k) + ".hdr")) << k;
+    }
+    synth_test::remove_run(run);
+  }
+}
+
+// Annotation that is only warned about: without Doppler records the
+// headers hold no Doppler polynomial, and the run succeeds.
+TEST(BadProducts, MissingDopplerRecordsOnlyLeaveTheDopplerOut) {
+  const SynthRun run = synth_test::run_synth("--zero-count 2");
+  ASSERT_EQ(run.exit_code, 0);
+  images_conf conf;
+  images ex(conf);
+  ASSERT_EQ(Extract(run, conf, &ex), 0);
+  polySAR polys;
+  ASSERT_EQ(polys.readhdr((run.dir + "R3.hdr").c_str()), 0);
+  EXPECT_EQ(polys.ndc, 0);
+  EXPECT_EQ(polys.nfr, 1);
+  synth_test::remove_run(run);
+}
+
+}  // namespace
