@@ -342,6 +342,9 @@ int waitbar_open(const char* title) {
 
 int waitbar_update(int /*handle*/, float percent) {
   CkerrState& s = state();
+  // NaN and negative values show 0 (the host takes negative percents for
+  // status codes); the range check also keeps the conversion defined.
+  if (!(percent >= 0.0f)) percent = 0.0f;
   if (percent > 100.0f) percent = 100.0f;
   const int p = static_cast<int>(percent);
   if (p != s.lastPercent) {

@@ -171,10 +171,35 @@ void VlrOpenTrace(int fresh) {
   if (FILE* clog = std::fopen((dir + "_clog.txt").c_str(), "w")) std::fclose(clog);
 }
 
+namespace {
+
+// Deletes the working file at the end of a successful run, retrying while the
+// host may still hold it; raises 261120 when it stays.
+void deleteWorkingFile() {
+  auto& s = suite();
+  if (s.workingFile.empty() || !NVLR_UTILITY_FileExists(s.workingFile.c_str())) return;
+  for (int attempt = 1; attempt <= kDeleteAttempts; ++attempt) {
+    chmod(s.workingFile.c_str(), S_IRWXU);
+    if (std::remove(s.workingFile.c_str()) == 0) break;
+    const int wait = static_cast<int>(attempt * 0.1);
+    if (wait > 0) sleep(static_cast<unsigned>(wait));
+  }
+  if (NVLR_UTILITY_FileExists(s.workingFile.c_str())) {
+    NVLR_UTILITY_RaiseError(vlr::kCodeWorkingFileNotDeleted, kModule, __LINE__,
+                            s.workingFile.c_str());
+  }
+}
+
+}  // namespace
+
 void NVLR_UTILITY_EndProcess(int code, int writeLog, int successful) {
   auto& s = suite();
   const std::string dir = vlr_detail::workingDir();
   const std::string tracePath = dir + "Process.trace";
+  // The working file goes before the log is closed: a run whose working file
+  // stays fails with 261120, and the log then records that failure (through
+  // the raise sequence) instead of SUCCESSFUL.
+  if (code == 0) deleteWorkingFile();
   if (writeLog) {
     if (code != 0) {
       NVLR_UTILITY_LogPrint("\n\n-%s   %s\n\n%s\n\nERROR :\n  %s\n\n", s.processLabel.c_str(),
@@ -195,18 +220,6 @@ void NVLR_UTILITY_EndProcess(int code, int writeLog, int successful) {
   if (code != 0 && !dir.empty() && NVLR_UTILITY_FileExists(tracePath.c_str())) {
     const std::string copy = dir + "Veloran_" + NVLR_UTILITY_Timestamp() + "_trace.txt";
     NVLR_UTILITY_CopyFile(tracePath.c_str(), copy.c_str());
-  }
-  if (code == 0 && !s.workingFile.empty() && NVLR_UTILITY_FileExists(s.workingFile.c_str())) {
-    for (int attempt = 1; attempt <= kDeleteAttempts; ++attempt) {
-      chmod(s.workingFile.c_str(), S_IRWXU);
-      if (std::remove(s.workingFile.c_str()) == 0) break;
-      const int wait = static_cast<int>(attempt * 0.1);
-      if (wait > 0) sleep(static_cast<unsigned>(wait));
-    }
-    if (NVLR_UTILITY_FileExists(s.workingFile.c_str())) {
-      NVLR_UTILITY_RaiseError(vlr::kCodeWorkingFileNotDeleted, kModule, __LINE__,
-                              s.workingFile.c_str());
-    }
   }
   if (!dir.empty() && NVLR_UTILITY_FileSize(tracePath.c_str()) > kTraceArchiveSize) {
     const std::string copy = dir + "Veloran_" + NVLR_UTILITY_Timestamp() + "_trace.txt";

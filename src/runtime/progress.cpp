@@ -34,6 +34,8 @@ void traceStreamState(FILE* f, int attempt) {
 
 int getAndSetPerc(int previous, int current, const char* message) {
   if (current == previous) return 1;
+  // The host reads -1 and -2 on line 1 as the error and warning status.
+  if (current < 0) current = 0;
   if (current > kMaxPercent) current = kMaxPercent;
   const std::string& working = NVLR_UTILITY_WorkingFile();
   if (!NVLR_UTILITY_FileExists((working + "_batch_ok").c_str())) {

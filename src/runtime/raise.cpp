@@ -141,14 +141,17 @@ void NVLR_UTILITY_RaiseError(int code, const char* file, int line, const char* e
   if (!s.loggingMode) {
     throw CErrorExceptionManager(code, line, file, s.processLabel.c_str(), extra);
   }
+  // A failure inside the raise sequence itself (a full heap, a failing write
+  // or copy of the closing sequence) ends the process with the first code;
+  // nothing more is recorded.  The guard is set before anything allocates,
+  // since an allocation failure raises again.
+  if (s.raising) VlrTerminate(s.raisingCode);
+  s.raising = true;
+  s.raisingCode = code;
+  if (!s.tableReady) VlrTerminate(code);
+  const int savedErrno = errno;
   std::string title, text;
   NVLR_UTILITY_GetErrorTexts(s.errors, code, title, text);
-  if (!s.tableReady) VlrTerminate(code);
-  // A failure inside the raise sequence itself ends the process with the
-  // first code; nothing more is recorded.
-  if (s.raising) VlrTerminate(code);
-  s.raising = true;
-  const int savedErrno = errno;
   const char* extraText = extra ? extra : "";
   NVLR_UTILITY_RecordError(code, extra);
   NVLR_UTILITY_TracePrint("\nERROR : %s [%s] (%s) \n %s   %s\n    FILE=%s   LINE=%d  (errno = %d)",

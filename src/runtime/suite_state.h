@@ -27,7 +27,9 @@ struct SuiteState {
   VlrErrorHook hook = nullptr;
   FILE* log = nullptr;
   FILE* trace = nullptr;
+  // Set while the raise sequence runs, with the code it ends the process with.
   bool raising = false;
+  int raisingCode = 0;
 };
 
 SuiteState& suite();

@@ -3,13 +3,18 @@
 #include <gtest/gtest.h>
 
 #include <cctype>
+#include <cstdio>
+#include <cstdlib>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "entry/command.h"
+#include "entry/entry.h"
 #include "installation.h"
 
 using vlr_test::Exists;
+using vlr_test::MaskLocalTimes;
 using vlr_test::ReadFile;
 using vlr_test::RunResult;
 using vlr_test::TempInstallation;
@@ -19,34 +24,6 @@ namespace {
 
 const std::string kStars(160, '*');
 const std::string kId = "Veloran Base ENVI 4.2.000 Aug 30 2010 ";
-
-// The log with every local time text ("Sun Dec 06 10:13:56 2026") replaced
-// by "<TIME>".
-std::string masked(const std::string& text) {
-  // 'a' a letter, '9' a digit, anything else itself.
-  static const std::string kShape = "aaa aaa 99 99:99:99 9999";
-  auto matches = [&](size_t at) {
-    if (at + kShape.size() > text.size()) return false;
-    for (size_t i = 0; i < kShape.size(); ++i) {
-      const char c = text[at + i];
-      const bool ok = kShape[i] == 'a'   ? std::isalpha(static_cast<unsigned char>(c)) != 0
-                      : kShape[i] == '9' ? std::isdigit(static_cast<unsigned char>(c)) != 0
-                                         : c == kShape[i];
-      if (!ok) return false;
-    }
-    return true;
-  };
-  std::string out;
-  for (size_t i = 0; i < text.size();) {
-    if (matches(i)) {
-      out += "<TIME>";
-      i += kShape.size();
-    } else {
-      out += text[i++];
-    }
-  }
-  return out;
-}
 
 std::vector<std::string> fourteen() {
   std::vector<std::string> a(14, "NotOK");
@@ -87,8 +64,8 @@ TEST_F(Tool, UnknownCommandWordsEndWith456963) {
     EXPECT_NE(errorFile().find("[EC : 456963]"), std::string::npos);
   }
   EXPECT_EQ(log().find("START :"), std::string::npos);
-  EXPECT_NE(masked(log()).find("\n\n- -   " + kId + "\n\n<TIME>\n\nERROR :\n   \n\n\n" + kStars +
-                               "\nEND :  -  -  <TIME>\n" + kStars + "\n\n"),
+  EXPECT_NE(MaskLocalTimes(log()).find("\n\n- -   " + kId + "\n\n<TIME>\n\nERROR :\n   \n\n\n" +
+                                       kStars + "\nEND :  -  -  <TIME>\n" + kStars + "\n\n"),
             std::string::npos);
 }
 
@@ -142,7 +119,7 @@ TEST_F(Tool, TooFewArgumentsRaise456962AfterTheStartRecord) {
     const std::string expected = "\n\n\n" + kStars + "\nSTART : " + c.title + "  [ " + kId +
                                  " ]\n<TIME>\n" + kStars +
                                  "\n\n Parameter 0 (one)\n Parameter 1 (two)\n\n" + kStars + "\n\n";
-    EXPECT_EQ(masked(log()).substr(0, expected.size()), expected) << log();
+    EXPECT_EQ(MaskLocalTimes(log()).substr(0, expected.size()), expected) << log();
     EXPECT_NE(log().find("[ERROR ID : 456962]\n  INVALID INPUT [An input argument is missing or "
                          "invalid; check the named input]\n  " +
                          args + " \n\n"),
@@ -170,17 +147,150 @@ TEST_F(Tool, ArgumentChecksNeedingNoFileName) {
   r = inst_.run("main_multilook_WSS#" + inst_.writeArguments(a));
   EXPECT_EQ(r.status, 255);
   EXPECT_NE(errorFile().find("[EC : 456962]\nWSS\n"), std::string::npos);
-  // "NotOK" is compared whole: a longer text is a file name.
+  // "NotOK" is compared whole: a longer text is a file name, here one that
+  // does not exist, so the search for the calibration file cannot open it.
   a = fourteen();
   a[0] = "NotOKay";
-  inst_.run("main_import_ESA#" + inst_.writeArguments(a));
-  EXPECT_EQ(errorFile().find("ASA_XXX"), std::string::npos);
+  std::remove((inst_.workingFile() + "_error").c_str());
+  r = inst_.run("main_import_ESA#" + inst_.writeArguments(a));
+  EXPECT_EQ(r.status, 9);
+  EXPECT_EQ(errorFile(),
+            "-1\nPROCESSING LIBRARY ERROR\nA file could not be opened; check its name and "
+            "permissions [EC : 9]\n\n" +
+                std::string(66, ' ') + "\n" + std::string(66, ' ') + "\n");
+  EXPECT_NE(log().find("\nINPUT ASA : [ NotOKay ]\n"), std::string::npos);
+  EXPECT_NE(log().find("PROCESSING ERROR: File not opened! - line : "), std::string::npos);
+  EXPECT_NE(log().find(" - function : find_aux - file : find_aux - Tessal\n"), std::string::npos);
+  EXPECT_NE(
+      log().find(kId + " [ERROR ID : 9]\n  PROCESSING LIBRARY ERROR [A file could not be opened; "
+                       "check its name and permissions]\n   \n\n"),
+      std::string::npos);
+}
+
+TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
+  // A host may start the tool with standard descriptors closed; the logs
+  // opened later must not take their numbers.
+  struct Case {
+    std::vector<int> closed;
+    bool trace;
+  };
+  const Case cases[] = {
+      {{2}, false}, {{1}, true}, {{1, 2}, true}, {{0, 1, 2}, false}, {{0, 1, 2}, true}};
+  for (const Case& c : cases) {
+    std::string name;
+    for (int fd : c.closed) name += std::to_string(fd) + " ";
+    SCOPED_TRACE("closed " + name + (c.trace ? "with trace" : "without trace"));
+    TempInstallation inst(c.trace);
+    inst.hostFiles();
+    const RunResult r = inst.runWithClosed("main_convert#x", c.closed);
+    EXPECT_EQ(r.status, 255);
+    const std::string log = ReadFile(inst.working() + "Process.log");
+    // The error recorder's lines go to the standard error stream only.
+    EXPECT_EQ(log.find("[EC : "), std::string::npos) << log;
+    EXPECT_NE(log.find(kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command"),
+              std::string::npos)
+        << log;
+    EXPECT_NE(log.find("\nEND :  -  "), std::string::npos) << log;
+    EXPECT_NE(ReadFile(inst.workingFile() + "_error").find("[EC : 456963]"), std::string::npos);
+    if (c.trace) {
+      const std::string trace = ReadFile(inst.working() + "Process.trace");
+      EXPECT_EQ(trace.substr(0, 15), "OpenTrace 1  2\n");
+      EXPECT_EQ(trace.find("[EC : "), std::string::npos) << trace;
+      EXPECT_NE(trace.find("\nERROR : INVALID INPUT [Unknown command"), std::string::npos) << trace;
+    }
+  }
 }
 
 TEST_F(Tool, EmptyArgumentTextEndsWithTheListReaderError) {
   const RunResult r = inst_.run("main_import_ESA#");
   EXPECT_EQ(r.status, 255);
   EXPECT_NE(errorFile().find("[EC : 261122]"), std::string::npos);
+}
+
+// The entry with stand-in drivers, run in a child process as the host runs
+// the tool: what each way of ending a driver leaves for the host.
+int driverSucceeds(const char*) {
+  return 0;
+}
+int driverFailsReading(const char*) {
+  return 4;
+}
+int driverThrows(const char*) {
+  throw std::runtime_error("escaped from the driver");
+}
+int driverThrowsAnything(const char*) {
+  throw 42;
+}
+int driverNotSelected(const char*) {
+  std::_Exit(99);
+}
+
+TEST_F(Tool, EntryEndsTheRunAsTheDriverEnds) {
+  const std::string closing = "\n\n- -   " + kId + "\n\n<TIME>\n\nERROR :\n   \n\n";
+  const std::string end = "\n" + kStars + "\nEND :  -  -  <TIME>\n" + kStars + "\n\n";
+  struct Case {
+    const char* name;
+    const char* word;
+    vlr::EntryDrivers drivers;
+    int status;
+    std::string log;
+    std::string errorFile;  // empty: none is written
+  };
+  const std::string blanks = "\n" + std::string(66, ' ') + "\n" + std::string(66, ' ') + "\n";
+  const std::string exceptionLog = "\n\n" + kId +
+                                   " [ERROR ID : 913920]\n  UNEXPECTED INTERNAL ERROR []\n   \n\n" +
+                                   closing + end;
+  const std::string exceptionFile = "-1\nUNEXPECTED INTERNAL ERROR\n [EC : 913920]\n" + blanks;
+  const Case cases[] = {
+      {"success",
+       "main_import_ESA#",
+       {driverNotSelected, driverSucceeds},
+       0,
+       "\n\nSUCCESSFUL\n\n<TIME>\n\n" + end,
+       ""},
+      {"driver code",
+       "main_multilook_WSS#",
+       {driverFailsReading, driverNotSelected},
+       4,
+       "\n\n" + kId +
+           " [ERROR ID : 4]\n  PROCESSING LIBRARY ERROR [A file could not be read; check that it "
+           "is complete and readable]\n   \n\n" +
+           closing + end,
+       "-1\nPROCESSING LIBRARY ERROR\nA file could not be read; check that it is complete and "
+       "readable [EC : 4]\n" +
+           blanks},
+      {"standard exception",
+       "main_import_ESA#",
+       {driverNotSelected, driverThrows},
+       255,
+       exceptionLog,
+       exceptionFile},
+      {"other exception",
+       "main_import_ESA#",
+       {driverNotSelected, driverThrowsAnything},
+       255,
+       exceptionLog,
+       exceptionFile},
+  };
+  inst_.useInProcess();
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.name);
+    std::remove((inst_.working() + "Process.log").c_str());
+    std::remove((inst_.workingFile() + "_error").c_str());
+    inst_.hostFiles();
+    std::string program = "import_wss", command = std::string(c.word) + "args.txt";
+    char* argv[] = {&program[0], &command[0], nullptr};
+    EXPECT_EXIT(std::_Exit(vlr::RunEntry(2, argv, c.drivers)), ::testing::ExitedWithCode(c.status),
+                "");
+    EXPECT_EQ(MaskLocalTimes(log()), c.log);
+    if (c.errorFile.empty()) {
+      EXPECT_FALSE(Exists(inst_.workingFile() + "_error"));
+      EXPECT_FALSE(Exists(inst_.workingFile()));
+    } else {
+      EXPECT_EQ(errorFile(), c.errorFile);
+      EXPECT_EQ(ReadFile(inst_.workingFile()), "-1\nStarting\n" + c.errorFile.substr(3));
+    }
+  }
 }
 
 }  // namespace
@@ -202,6 +312,54 @@ TEST(ToolTrace, TraceRecordsTheCommandAndIsArchivedAfterAnError) {
   EXPECT_NE(ReadFile(inst.working() + "_cerr.txt").find("[EC : 456963]"), std::string::npos);
   const std::string listing = vlr_test::RunProgram({"/bin/ls", inst.working()}, {}, true).out;
   EXPECT_NE(listing.find("_trace.txt"), std::string::npos);
+}
+
+// Names of the form "Process" + "YYYYMMDDhhmmss.uuuuuu" + ".trace".
+std::vector<std::string> traceArchives(const std::string& dir) {
+  const std::string listing = vlr_test::RunProgram({"/bin/ls", "-1", dir}, {}, true).out;
+  std::vector<std::string> names;
+  size_t at = 0;
+  while (at < listing.size()) {
+    size_t end = listing.find('\n', at);
+    if (end == std::string::npos) end = listing.size();
+    const std::string name = listing.substr(at, end - at);
+    at = end + 1;
+    const std::string head = "Process", tail = ".trace";
+    if (name.size() != head.size() + 21 + tail.size()) continue;
+    if (name.compare(0, head.size(), head) != 0) continue;
+    if (name.compare(name.size() - tail.size(), tail.size(), tail) != 0) continue;
+    bool shape = true;
+    for (size_t i = 0; i < 21; ++i) {
+      const char ch = name[head.size() + i];
+      shape = shape && (i == 14 ? ch == '.' : std::isdigit(static_cast<unsigned char>(ch)) != 0);
+    }
+    if (shape) names.push_back(name);
+  }
+  return names;
+}
+
+TEST(ToolTrace, TraceIsArchivedWhenTheHostAsksForIt) {
+  // "Process.trace_save" in the working folder asks for a copy of every
+  // closed trace.
+  for (const bool save : {true, false}) {
+    SCOPED_TRACE(save ? "Process.trace_save present" : "no Process.trace_save");
+    TempInstallation inst(/*trace=*/true);
+    inst.hostFiles();
+    if (save) WriteFile(inst.working() + "Process.trace_save", "");
+    const RunResult r = inst.run("main_convert#x");
+    EXPECT_EQ(r.status, 255);
+    const std::vector<std::string> archives = traceArchives(inst.working());
+    if (!save) {
+      EXPECT_TRUE(archives.empty());
+      continue;
+    }
+    ASSERT_EQ(archives.size(), 1u);
+    const std::string copy = ReadFile(inst.working() + archives[0]);
+    EXPECT_EQ(copy, ReadFile(inst.working() + "Process.trace"));
+    EXPECT_EQ(copy.substr(0, 15), "OpenTrace 1  2\n");
+    // The copy is taken after the closing records.
+    EXPECT_NE(copy.find("\nEND :  -  "), std::string::npos) << copy;
+  }
 }
 
 }  // namespace

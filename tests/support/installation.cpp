@@ -6,6 +6,8 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cctype>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
@@ -35,6 +37,32 @@ void WriteFile(const std::string& path, const std::string& content) {
   out << content;
 }
 
+std::string MaskLocalTimes(const std::string& text) {
+  // 'a' a letter, '9' a digit, anything else itself.
+  static const std::string kShape = "aaa aaa 99 99:99:99 9999";
+  auto matches = [&](size_t at) {
+    if (at + kShape.size() > text.size()) return false;
+    for (size_t i = 0; i < kShape.size(); ++i) {
+      const char c = text[at + i];
+      const bool ok = kShape[i] == 'a'   ? std::isalpha(static_cast<unsigned char>(c)) != 0
+                      : kShape[i] == '9' ? std::isdigit(static_cast<unsigned char>(c)) != 0
+                                         : c == kShape[i];
+      if (!ok) return false;
+    }
+    return true;
+  };
+  std::string out;
+  for (size_t i = 0; i < text.size();) {
+    if (matches(i)) {
+      out += "<TIME>";
+      i += kShape.size();
+    } else {
+      out += text[i++];
+    }
+  }
+  return out;
+}
+
 bool Exists(const std::string& path) {
   struct stat st;
   return stat(path.c_str(), &st) == 0;
@@ -42,6 +70,12 @@ bool Exists(const std::string& path) {
 
 RunResult RunProgram(const std::vector<std::string>& argv,
                      const std::map<std::string, std::string>& env, bool inheritEnvironment) {
+  return RunProgram(argv, env, inheritEnvironment, {});
+}
+
+RunResult RunProgram(const std::vector<std::string>& argv,
+                     const std::map<std::string, std::string>& env, bool inheritEnvironment,
+                     const std::vector<int>& closedDescriptors) {
   std::map<std::string, std::string> vars;
   if (inheritEnvironment) {
     for (char** e = environ; *e; ++e) {
@@ -72,8 +106,13 @@ RunResult RunProgram(const std::vector<std::string>& argv,
   const int errFd = mkstemp(errName);
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);
-  posix_spawn_file_actions_adddup2(&actions, outFd, 1);
-  posix_spawn_file_actions_adddup2(&actions, errFd, 2);
+  auto isClosed = [&](int fd) {
+    return std::find(closedDescriptors.begin(), closedDescriptors.end(), fd) !=
+           closedDescriptors.end();
+  };
+  if (!isClosed(1)) posix_spawn_file_actions_adddup2(&actions, outFd, 1);
+  if (!isClosed(2)) posix_spawn_file_actions_adddup2(&actions, errFd, 2);
+  for (int fd : closedDescriptors) posix_spawn_file_actions_addclose(&actions, fd);
   pid_t pid;
   RunResult r;
   if (posix_spawn(&pid, cargv[0], &actions, nullptr, cargv.data(), envp.data()) == 0) {
@@ -122,13 +161,27 @@ void TempInstallation::hostFiles(int percent, const std::string& message) const 
   WriteFile(workingFile() + "_batch_ok", "");
 }
 
-RunResult TempInstallation::run(const std::string& command,
-                                const std::map<std::string, std::string>& env) const {
+namespace {
+
+std::map<std::string, std::string> toolEnvironment(const std::string& root,
+                                                   const std::map<std::string, std::string>& env) {
   std::map<std::string, std::string> e = {
-      {"VELORAN_INIT_DIR", root_},  {"VELORAN_WORKING_DIR", ""},      {"VELORAN_BATCH_DIR", ""},
+      {"VELORAN_INIT_DIR", root},   {"VELORAN_WORKING_DIR", ""},      {"VELORAN_BATCH_DIR", ""},
       {"VELORAN_WORKING_FILE", ""}, {"VELORAN_GCP_DATABASE_DIR", ""}, {"windir", ""}};
   for (const auto& kv : env) e[kv.first] = kv.second;
-  return RunProgram({ToolPath(), command}, e, true);
+  return e;
+}
+
+}  // namespace
+
+RunResult TempInstallation::run(const std::string& command,
+                                const std::map<std::string, std::string>& env) const {
+  return RunProgram({ToolPath(), command}, toolEnvironment(root_, env), true);
+}
+
+RunResult TempInstallation::runWithClosed(const std::string& command,
+                                          const std::vector<int>& closed) const {
+  return RunProgram({ToolPath(), command}, toolEnvironment(root_, {}), true, closed);
 }
 
 void TempInstallation::useInProcess() const {

@@ -36,6 +36,9 @@ class TempInstallation {
   // removes the variable).
   RunResult run(const std::string& command,
                 const std::map<std::string, std::string>& env = {}) const;
+  // The same with the given standard descriptors (0, 1, 2) closed in the
+  // tool, as a careless host may start it.
+  RunResult runWithClosed(const std::string& command, const std::vector<int>& closed) const;
 
   // Makes this installation the one the calling process initialises from.
   void useInProcess() const;
@@ -45,6 +48,9 @@ class TempInstallation {
 };
 
 std::string ReadFile(const std::string& path);
+// The text with every local time text ("Sun Dec 06 10:13:56 2026") replaced
+// by "<TIME>", for comparing whole log records.
+std::string MaskLocalTimes(const std::string& text);
 void WriteFile(const std::string& path, const std::string& content);
 bool Exists(const std::string& path);
 std::string ToolPath();
@@ -52,5 +58,10 @@ std::string SourceDir();
 // Runs a program with arguments and an environment; returns its result.
 RunResult RunProgram(const std::vector<std::string>& argv,
                      const std::map<std::string, std::string>& env, bool inheritEnvironment);
+// The same with the given standard descriptors closed in the program instead
+// of captured.
+RunResult RunProgram(const std::vector<std::string>& argv,
+                     const std::map<std::string, std::string>& env, bool inheritEnvironment,
+                     const std::vector<int>& closedDescriptors);
 
 }  // namespace vlr_test
