@@ -2,8 +2,10 @@
 
 #include <sys/wait.h>
 
+#include <cmath>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
@@ -73,6 +75,35 @@ uint32_t be32(const uint8_t* p) {
 }
 int16_t be16(const uint8_t* p) {
   return static_cast<int16_t>((p[0] << 8) | p[1]);
+}
+
+float bef32(const uint8_t* p) {
+  const uint32_t u = be32(p);
+  float f;
+  std::memcpy(&f, &u, 4);
+  return f;
+}
+
+double mjd_time(const uint8_t* p) {
+  constexpr double kMjd2000In1985 = 473299200.0;
+  return static_cast<int32_t>(be32(p)) * 86400.0 + be32(p + 4) + be32(p + 8) * 1e-6 +
+         kMjd2000In1985;
+}
+
+Dsd product_dsd(const std::vector<uint8_t>& f, int k) {
+  // DSDs follow the 1247-byte MPH and the 1059 bytes of the SPH proper.
+  constexpr size_t kFirstDsd = 1247 + 1059, kDsdSize = 280;
+  constexpr size_t kOffset = 133, kSize = 170, kNum = 207, kDsrSize = 228;
+  const size_t b = kFirstDsd + kDsdSize * k;
+  return {header_number(f, b + kOffset), header_number(f, b + kSize), header_number(f, b + kNum),
+          header_number(f, b + kDsrSize)};
+}
+
+double truth_number(const Params& truth, const std::string& section, const std::string& key) {
+  const auto s = truth.find(section);
+  if (s == truth.end()) return std::nan("");
+  const auto v = s->second.find(key);
+  return v == s->second.end() ? std::nan("") : std::atof(v->second.c_str());
 }
 
 long long header_number(const std::vector<uint8_t>& file, size_t offset) {

@@ -34,7 +34,19 @@ int shell(const std::string& command);
 // Big-endian readers.
 uint32_t be32(const uint8_t* p);
 int16_t be16(const uint8_t* p);
+float bef32(const uint8_t* p);
+// MJD2000 record (days, seconds, microseconds) as seconds since 1985.
+double mjd_time(const uint8_t* p);
 // Decimal value of a header field at an offset ("+000123<bytes>" -> 123).
 long long header_number(const std::vector<uint8_t>& file, size_t offset);
+
+// Data set descriptor k (0..17) of a wide-swath product.
+struct Dsd {
+  long long offset, size, num, dsr;
+};
+Dsd product_dsd(const std::vector<uint8_t>& file, int k);
+
+// Number in the truth file; NaN when the key is missing.
+double truth_number(const Params& truth, const std::string& section, const std::string& key);
 
 }  // namespace synth_test

@@ -68,9 +68,11 @@ TEST_P(GdalCrossCheck, HeadersSizeAndSamplesOfTheFirstSubSwath) {
               1e-9);
   EXPECT_NEAR(std::stod(md["SPH_RANGE_SPACING"]), std::stod(scene.at("RangeSpacing")), 1e-6);
   EXPECT_EQ(std::stoll(md["SPH_FIRST_NEAR_LAT"]),
-            std::llround(std::stod(ss1.at("FirstNearLat")) * 1e6));
+            std::llround(std::stod(scene.at("SphFirstNearLat")) * 1e6));
   EXPECT_EQ(std::stoll(md["SPH_FIRST_NEAR_LONG"]),
-            std::llround(std::stod(ss1.at("FirstNearLon")) * 1e6));
+            std::llround(std::stod(scene.at("SphFirstNearLon")) * 1e6));
+  EXPECT_EQ(std::stoll(md["SPH_LAST_FAR_LAT"]),
+            std::llround(std::stod(scene.at("SphLastFarLat")) * 1e6));
   EXPECT_EQ(md["DS_ORBIT_STATE_VECTOR_1________NAME"], scene.at("OrbitFile"));
   EXPECT_EQ(md["DS_EXTERNAL_CALIBRATION________NAME"], scene.at("XcaFile"));
   EXPECT_EQ(size_line, "Size is " + std::to_string(samples) + ", " + std::to_string(records));

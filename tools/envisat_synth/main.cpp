@@ -26,8 +26,8 @@ const char* kHelp =
     "options:\n"
     "  --seed N             speckle seed (default 1)\n"
     "  --size S             tiny | small | realistic (default tiny)\n"
-    "                         tiny: 4 bursts, 128 samples per sub-swath (< 1 MB)\n"
-    "                         small: 30 bursts, 320 samples per sub-swath\n"
+    "                         tiny: 4 bursts, 104 to 136 samples per sub-swath (< 1 MB)\n"
+    "                         small: 30 bursts, 272 to 352 samples per sub-swath\n"
     "                         realistic: 282 bursts (60 s), real sample counts (~1.7 GB)\n"
     "  --start TEXT         sensing start, \"DD-MMM-YYYY HH:MM:SS[.ffffff]\"; default: the\n"
     "                       first crossing of 45 degrees latitude on the requested pass\n"
@@ -41,22 +41,31 @@ const char* kHelp =
     "                       records from 2 h before to 1 h after the scene.\n"
     "                       default: " SYNTH_DEFAULT_ORBIT
     "\n"
-    "  --pattern P          flat | checkerboard | points (default checkerboard)\n"
+    "  --pattern P          flat | checkerboard | points | uniform (default checkerboard);\n"
+    "                       uniform: every sample the same expected power (no burst taper)\n"
+    "  --band-limit         range spectrum of every line limited to the sub-swath's chirp\n"
+    "                       bandwidth (exact for the flat and uniform patterns)\n"
+    "  --first-tie-sample N sample number of the first tie point of the geolocation grid\n"
+    "                       (default 1)\n"
     "defects:\n"
-    "  --blank-first N      first N lines of every sub-swath blank (quality -1, zero samples)\n"
-    "  --blank-last N       last N lines likewise\n"
-    "  --mds-count N        write only N measurement data sets (the other DSDs empty)\n"
+    "  --blank-start N      first N records of every MDS blank (quality -1, zero samples);\n"
+    "                       also --blank-first\n"
+    "  --blank-end N        last N records likewise; also --blank-last\n"
+    "  --blank-zero-time    blank records carry zero time fields\n"
+    "  --mds-count N        write only N measurement data sets (the other DSDs empty;\n"
+    "                       4 leaves the fifth MDS descriptor with size 0)\n"
     "  --truncate BYTES     cut the product after BYTES bytes\n"
     "  --dsd-beyond-end K   DSD K (0..17) points 4096 bytes beyond the end of the file\n"
     "  --zero-count K       annotation DSD K (0..6) with record count and size 0\n"
     "  --wrong-type CODE    product name (and file name) starts with CODE, e.g. ASA_IMS_1P\n"
     "\n"
-    "synth_truth.txt is a parameter file ([Section], Key = value):\n"
+    "synth_truth.txt is a parameter file ([Section], Key = value), its keys described\n"
+    "in tools/envisat_synth/synth_truth.cpp:\n"
     "  [Scene]        file names, orbit source, sensing start/stop, pass, polarisation,\n"
-    "                 orbits, line interval, burst cycle, lines per burst, bursts, rates\n"
+    "                 orbits, line interval, burst cycle, rates, product corners\n"
     "  [SubSwath1..5] Samples, Records, LinesPerBurst, Bursts, EchoesPerBurst, Rank, PRF,\n"
-    "                 First/LastLineTime, Near/FarRangeTime, CentreTime, CentreRangeTime,\n"
-    "                 Near/Centre/FarIncidence, corner and centre Lat/Lon, MdsOffset ...\n"
+    "                 BurstCycle, First/LastLineTime, Near/FarRangeTime, look bandwidth,\n"
+    "                 windows, chirp power, Doppler and FM-rate polynomials, corners ...\n"
     "  [Pattern]      reflectivity pattern R(daz, drg) and how samples were drawn from it\n"
     "  [Doppler], [Calibration], [Defects]\n"
     "Times are seconds since 01-JAN-1985 (with UTC texts), range times two-way seconds,\n"
@@ -78,6 +87,14 @@ int main(int argc, char** argv) {
     if (a == "--help" || a == "-h") {
       std::fputs(kHelp, stdout);
       return 0;
+    }
+    if (a == "--band-limit") {
+      o.band_limit = true;
+      continue;
+    }
+    if (a == "--blank-zero-time") {
+      o.blank_zero_time = true;
+      continue;
     }
     if (i + 1 >= argc) {
       std::fprintf(stderr, "envisat_synth: %s needs a value (see --help)\n", a.c_str());
@@ -105,10 +122,12 @@ int main(int argc, char** argv) {
     else if ((ok = take_int(v, &n))) {
       if (a == "--seed" && n >= 0)
         o.seed = static_cast<uint64_t>(n);
-      else if (a == "--blank-first" && n >= 0)
+      else if ((a == "--blank-start" || a == "--blank-first") && n >= 0 && n <= 10000000)
         o.blank_first = static_cast<int>(n);
-      else if (a == "--blank-last" && n >= 0)
+      else if ((a == "--blank-end" || a == "--blank-last") && n >= 0 && n <= 10000000)
         o.blank_last = static_cast<int>(n);
+      else if (a == "--first-tie-sample" && n >= 1 && n <= 100000)
+        o.first_tie_sample = static_cast<int>(n);
       else if (a == "--mds-count" && n >= 0 && n <= 5)
         o.mds_count = static_cast<int>(n);
       else if (a == "--truncate" && n >= 0)

@@ -52,6 +52,9 @@ State KeplerTrajectory::at(double t) const {
   const Vec3 v_in = (a_ * n_) * ((-su) * P + cu * Q);
   const Vec3 w{0.0, 0.0, kEarthRate};
   s.v = v_in - cross(w, s.p);
+  // Point-mass gravity seen from the rotating frame: a = g - 2 w x v - w x (w x p).
+  const double r = norm(s.p);
+  s.a = (-kGm / (r * r * r)) * s.p - 2.0 * cross(w, s.v) - cross(w, cross(w, s.p));
   s.abs_orbit = orbit0_ + static_cast<int>(std::floor(u / (2.0 * M_PI)));
   return s;
 }
@@ -116,8 +119,19 @@ State DorisTrajectory::at(double t) const {
     double w = 1.0;
     for (int m = first; m < first + 8; ++m)
       if (m != j) w *= (t - recs_[m].t) / (recs_[j].t - recs_[m].t);
+    // Derivative of the Lagrange weight, written without division by (t - t_m)
+    // so that it holds at the record times as well.
+    double dw = 0.0;
+    for (int i = first; i < first + 8; ++i) {
+      if (i == j) continue;
+      double term = 1.0 / (recs_[j].t - recs_[i].t);
+      for (int m = first; m < first + 8; ++m)
+        if (m != j && m != i) term *= (t - recs_[m].t) / (recs_[j].t - recs_[m].t);
+      dw += term;
+    }
     s.p = s.p + w * recs_[j].p;
     s.v = s.v + w * recs_[j].v;
+    s.a = s.a + dw * recs_[j].v;
   }
   const State& nearer =
       (k > 0 && (k == n || t - recs_[k - 1].t < recs_[k].t - t)) ? recs_[k - 1] : recs_[k];

@@ -31,10 +31,11 @@ double dot(Vec3 a, Vec3 b);
 Vec3 cross(Vec3 a, Vec3 b);
 double norm(Vec3 a);
 
-// Earth-fixed state at one time.
+// Earth-fixed state at one time.  The acceleration is that of the Earth-fixed
+// trajectory itself, Coriolis and centrifugal terms included.
 struct State {
   double t = 0;  // seconds since 1985
-  Vec3 p, v;
+  Vec3 p, v, a;
   int abs_orbit = 0;
 };
 
@@ -65,7 +66,8 @@ class KeplerTrajectory : public Trajectory {
 };
 
 // Records of a DORIS orbit file, interpolated with eight-point Lagrange
-// polynomials (positions and velocities each from their own samples).
+// polynomials (positions and velocities each from their own samples; the
+// acceleration is the derivative of the velocity polynomial).
 class DorisTrajectory : public Trajectory {
  public:
   // Reads the records; false with a message on a malformed file.

@@ -12,18 +12,38 @@ namespace {
 constexpr double kDeg = M_PI / 180.0;
 
 // Wide-swath beam parameters (SS1..SS5) in the ranges of real acquisitions.
-const double kPrf[kSubSwaths] = {1712.0, 2095.0, 1675.0, 1886.0, 1707.0};
-const int kRank[kSubSwaths] = {9, 10, 9, 10, 9};
-const int kEchoes[kSubSwaths] = {64, 78, 63, 71, 64};
+// Every beam differs from the others in every value, so that a value taken
+// from the wrong beam is a wrong value.
+const double kPrf[kSubSwaths] = {1712.0, 2095.0, 1675.0, 1886.0, 1980.0};
+const int kRank[kSubSwaths] = {9, 12, 10, 11, 13};
+const int kEchoes[kSubSwaths] = {64, 78, 63, 71, 66};
+// About three burst cycles of lines per burst: each time lies in three bursts.
+const int kLinesPerBurst[kSubSwaths] = {54, 56, 53, 55, 52};
 const double kPulseLen[kSubSwaths] = {27.1e-6, 24.6e-6, 26.3e-6, 22.8e-6, 25.0e-6};
-const double kPulseBw[kSubSwaths] = {16.0e6, 13.0e6, 13.0e6, 11.7e6, 9.6e6};
+const double kPulseBw[kSubSwaths] = {16.0e6, 13.6e6, 12.9e6, 11.7e6, 9.6e6};
+const double kLookBw[kSubSwaths] = {15.2e6, 12.9e6, 12.3e6, 11.1e6, 9.1e6};
 const double kRealNearTau[kSubSwaths] = {5.48e-3, 5.79e-3, 6.03e-3, 6.32e-3, 6.56e-3};
 const int kRealSamples[kSubSwaths] = {6300, 5100, 6200, 5000, 6000};
-const int kDopDelta[kSubSwaths] = {0, 6, -4, 9, -7};
+const int kDopDelta[kSubSwaths] = {11, -6, 4, 9, -7};
+const double kChirpPower[kSubSwaths] = {1.13, 0.94, 1.07, 0.88, 1.21};
+const float kTimeDiff[kSubSwaths] = {-0.351f, -0.338f, -0.362f, -0.344f, -0.357f};
+// First line of each beam, as a fraction of the burst cycle after the earliest.
+// The order in time (SS2, SS3, SS5, SS1, SS4) puts no beam's first geolocation
+// record at its own index in the table.
+const double kFirstOffset[kSubSwaths] = {0.57, 0.0, 0.19, 0.78, 0.36};
+// Part of a sample by which each beam's near range falls short of a whole
+// sample count after the previous one (compressed layouts).
+const double kNearFraction[kSubSwaths - 1] = {0.37, 0.32, 0.54, 0.33};
+const double kRgWindowCoef[kSubSwaths] = {0.75, 0.70, 0.72, 0.68, 0.74};
+const double kAzWindowCoef[kSubSwaths] = {0.75, 0.72, 0.70, 0.73, 0.71};
+const double kAzLookBw[kSubSwaths] = {1040.0, 1260.0, 1010.0, 1140.0, 1190.0};
+const double kProcGain[kSubSwaths] = {1.0, 1.02, 0.98, 1.05, 0.96};
+constexpr double kLineInterval = 0.01172;  // s
+constexpr int kGeoStepLines = 90;          // geolocation grid lines 90 line intervals apart
 
 struct SizePlan {
-  int samples;  // per sub-swath, 0 for the real counts
-  int overlap;  // samples shared by neighbours when the layout is compressed
+  int samples[kSubSwaths];  // per sub-swath, 0 for the real counts
+  int overlap;              // samples shared by neighbours when the layout is compressed
   int bursts;
   int checker_az, checker_rg;
   int targets_az, targets_rg;
@@ -31,11 +51,11 @@ struct SizePlan {
 
 bool plan_for(const std::string& size, SizePlan* p) {
   if (size == "tiny")
-    *p = {128, 16, 4, 3, 8, 2, 4};
+    *p = {{128, 112, 136, 104, 120}, 16, 4, 3, 8, 2, 4};
   else if (size == "small")
-    *p = {320, 32, 30, 6, 12, 4, 8};
+    *p = {{320, 288, 352, 272, 304}, 32, 30, 6, 12, 4, 8};
   else if (size == "realistic")
-    *p = {0, 0, 282, 12, 15, 8, 20};
+    *p = {{0, 0, 0, 0, 0}, 0, 282, 12, 15, 8, 20};
   else
     return false;
   return true;
@@ -77,6 +97,63 @@ bool find_crossing(const Trajectory& tr, double from, double to, double lat, boo
   return false;
 }
 
+// Azimuth FM rate at zero Doppler: the second time derivative of the range
+// to a fixed ground point G is (|V|^2 + A.(P - G)) / R, so the rate is
+// -(2 / lambda) (|V|^2 + A.(P - G)) / R with the Earth-fixed state P, V, A.
+// Fitted over the sub-swath as c0 + c1 r + c2 r^2, r = tau - origin.
+bool fit_fm_rate(const Scene& s, SubSwath* w) {
+  const State st = s.traj->at(w->centre.t);
+  const double lambda = kLightSpeed / s.fc;
+  constexpr int kPoints = 21;
+  const double span = w->far_tau - w->fm_origin_tau;
+  // Normal equations in u = r / span, solved by Cramer's rule.
+  double m[3][3] = {{0}}, rhs[3] = {0};
+  for (int i = 0; i < kPoints; ++i) {
+    const double tau = w->near_tau + (w->far_tau - w->near_tau) * i / (kPoints - 1);
+    GroundPoint g;
+    if (!zero_doppler_point(st, tau, &g)) return false;
+    const Vec3 d = st.p - g.x;
+    const double fm = -(2.0 / lambda) * (dot(st.v, st.v) + dot(st.a, d)) / norm(d);
+    const double u = (tau - w->fm_origin_tau) / span;
+    const double pw[3] = {1.0, u, u * u};
+    for (int a = 0; a < 3; ++a) {
+      rhs[a] += pw[a] * fm;
+      for (int b = 0; b < 3; ++b) m[a][b] += pw[a] * pw[b];
+    }
+  }
+  auto det3 = [](const double q[3][3]) {
+    return q[0][0] * (q[1][1] * q[2][2] - q[1][2] * q[2][1]) -
+           q[0][1] * (q[1][0] * q[2][2] - q[1][2] * q[2][0]) +
+           q[0][2] * (q[1][0] * q[2][1] - q[1][1] * q[2][0]);
+  };
+  const double det = det3(m);
+  if (det == 0.0) return false;
+  double b[3];
+  for (int c = 0; c < 3; ++c) {
+    double q[3][3];
+    for (int r = 0; r < 3; ++r)
+      for (int k = 0; k < 3; ++k) q[r][k] = k == c ? rhs[r] : m[r][k];
+    b[c] = det3(q) / det;
+  }
+  w->fm_rate[0] = b[0];
+  w->fm_rate[1] = b[1] / span;
+  w->fm_rate[2] = b[2] / (span * span);
+  return true;
+}
+
+// Expected |sample|^2 of a sub-swath whose I and Q are normal with standard
+// deviation scale * sqrt(taper) and rounded to integers (rounding adds 1/12
+// to each variance).
+double mean_power(const Pattern& p, const SubSwath& w) {
+  double taper = 1.0;
+  if (p.tapered) {
+    taper = 0.0;
+    for (int i = 0; i < w.lines_per_burst; ++i) taper += burst_taper(i, w.lines_per_burst);
+    taper /= w.lines_per_burst;
+  }
+  return 2.0 * (p.scale * p.scale * taper + 1.0 / 12.0);
+}
+
 }  // namespace
 
 double burst_taper(int i, int lines_per_burst) {
@@ -91,7 +168,7 @@ double xca_pattern_db(int slot, double offset_deg) {
 }
 
 double Pattern::at(double daz, double drg) const {
-  if (kind == "flat") return 1.0;
+  if (kind == "flat" || kind == "uniform") return 1.0;
   if (kind == "checkerboard") {
     const long a = static_cast<long>(std::floor(daz / az_cell));
     const long r = static_cast<long>(std::floor(drg / rg_cell));
@@ -101,6 +178,11 @@ double Pattern::at(double daz, double drg) const {
     if (std::fabs(daz - tg.t) <= target_half_az && std::fabs(drg - tg.tau) <= target_half_rg)
       return target_level;
   return background;
+}
+
+double record_time(const Scene& s, const SubSwath& w, int r) {
+  const int burst = r / w.lines_per_burst, line = r % w.lines_per_burst;
+  return round_us(w.first_time + burst * s.burst_cycle + line * s.line_interval);
 }
 
 bool build_scene(const Options& opt, Scene* s, std::string* error) {
@@ -119,22 +201,26 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     *error = "pass must be ascending or descending";
     return false;
   }
-  if (opt.pattern != "flat" && opt.pattern != "checkerboard" && opt.pattern != "points") {
-    *error = "pattern must be flat, checkerboard or points";
+  if (opt.pattern != "flat" && opt.pattern != "checkerboard" && opt.pattern != "points" &&
+      opt.pattern != "uniform") {
+    *error = "pattern must be flat, checkerboard, points or uniform";
     return false;
   }
   const bool want_asc = opt.pass == "ascending";
 
-  // Burst timing: the burst cycle is the sum of the sub-swath dwell times; the
-  // line interval divides it into 18 lines; a burst holds three cycles of lines.
+  // Burst timing: the burst cycle is the sum of the sub-swath dwell times,
+  // (rank + echoes) / PRF each; lines of a burst are one line interval apart,
+  // and the cycle is no whole number of line intervals.
+  s->line_interval = kLineInterval;
   s->burst_cycle = 0.0;
   for (int k = 0; k < kSubSwaths; ++k) s->burst_cycle += (kRank[k] + kEchoes[k]) / kPrf[k];
-  s->cycle_lines = 18;
-  s->lines_per_burst = 3 * s->cycle_lines;
-  s->line_interval = s->burst_cycle / s->cycle_lines;
-  s->bursts = plan.bursts;
-  s->grid_lines = (s->bursts - 1) * s->cycle_lines + s->lines_per_burst;
-  const double duration = (s->grid_lines - 1) * s->line_interval;
+  s->geo_step_lines = kGeoStepLines;
+  double duration = 0.0;  // from the earliest first line to the latest last line
+  for (int k = 0; k < kSubSwaths; ++k) {
+    const double last = kFirstOffset[k] * s->burst_cycle + (plan.bursts - 1) * s->burst_cycle +
+                        (kLinesPerBurst[k] - 1) * s->line_interval;
+    duration = std::max(duration, last);
+  }
 
   // Trajectory and scene start.
   double start = 0.0;
@@ -174,7 +260,6 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     }
   }
   s->t0 = start;
-  s->stop = round_us(start + duration);
   const State mid = s->traj->at(start + duration / 2);
   s->pass = mid.v.z > 0 ? "ASCENDING" : "DESCENDING";
   if (!opt.pass.empty() && (mid.v.z > 0) != want_asc) {
@@ -185,9 +270,17 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   s->rel_orbit = s->abs_orbit % 501 + 1;
   s->cycle = s->abs_orbit / 501 + 3;
 
-  // Range layout.
+  // Pattern kind first: the mean power of each sub-swath depends on it.
+  Pattern& p = s->pattern;
+  p.kind = opt.pattern;
+  p.tapered = p.kind != "uniform";
+
+  // Range layout: real near ranges and sample counts, or a compressed layout
+  // whose neighbours overlap by `overlap` samples less a part of a sample.
+  int min_samples = 0;
   s->range_spacing = kLightSpeed / (2.0 * s->fs);
   double near = kRealNearTau[0];
+  s->stop = s->t0;
   for (int k = 0; k < kSubSwaths; ++k) {
     SubSwath& w = s->ss[k];
     w.index = k;
@@ -196,17 +289,30 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     w.echoes = kEchoes[k];
     w.pulse_len = kPulseLen[k];
     w.pulse_bw = kPulseBw[k];
-    w.samples = plan.samples ? plan.samples : kRealSamples[k];
-    w.near_tau = plan.samples ? near : kRealNearTau[k];
+    w.look_bw = kLookBw[k];
+    w.samples = plan.samples[k] ? plan.samples[k] : kRealSamples[k];
+    min_samples = k == 0 ? w.samples : std::min(min_samples, w.samples);
+    w.near_tau = plan.samples[k] ? near : kRealNearTau[k];
     w.far_tau = w.near_tau + (w.samples - 1) / s->fs;
-    near = w.far_tau - (plan.overlap - 1) / s->fs;
-    w.records = s->bursts * s->lines_per_burst;
-    w.first_time = s->t0;
-    w.last_time = round_us(s->t0 + ((s->bursts - 1) * s->cycle_lines + s->lines_per_burst - 1) *
-                                       s->line_interval);
-    w.chirp_power = 1.0 + 0.05 * k;
+    if (k + 1 < kSubSwaths) near = w.far_tau - (plan.overlap - 1 + kNearFraction[k]) / s->fs;
+    w.lines_per_burst = kLinesPerBurst[k];
+    w.bursts = plan.bursts;
+    w.records = w.bursts * w.lines_per_burst;
+    w.first_time = round_us(s->t0 + kFirstOffset[k] * s->burst_cycle);
+    w.last_time = record_time(*s, w, w.records - 1);
+    s->stop = std::max(s->stop, w.last_time);
+    w.time_diff = kTimeDiff[k];
+    w.chirp_power = kChirpPower[k];
     w.dop_delta = kDopDelta[k];
+    w.rg_window_coef = kRgWindowCoef[k];
+    w.az_window_coef = kAzWindowCoef[k];
+    w.az_look_bw = kAzLookBw[k];
+    w.proc_gain = kProcGain[k];
+    w.ext_cal = 1.0e5 * (1.0 + 0.1 * k);
+    w.noise = 2.0 + 0.25 * k;
     w.record_size = 17 + 4LL * w.samples;
+    w.band = opt.band_limit ? w.pulse_bw : s->fs;
+    w.mean_power = (p.kind == "uniform" || p.kind == "flat") ? mean_power(p, w) : 0.0;
     const double tc = round_us((w.first_time + w.last_time) / 2);
     const double tauc = (w.near_tau + w.far_tau) / 2;
     if (!corner(*s, w.first_time, w.near_tau, &w.first_near) ||
@@ -217,15 +323,15 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
       return false;
     }
     w.elev_centre = w.centre.look;
-    // Azimuth FM rate -2 v^2 / (lambda R), as a quadratic in range time about near range.
-    const State sc = s->traj->at(tc);
-    const double v2 = dot(sc.v, sc.v);
-    const double lambda = kLightSpeed / s->fc;
-    const double fm0 = -2.0 * v2 / (lambda * w.near_tau * kLightSpeed / 2.0);
-    w.fm_origin_tau = w.near_tau;
-    w.fm_rate[0] = fm0;
-    w.fm_rate[1] = -fm0 / w.near_tau;
-    w.fm_rate[2] = fm0 / (w.near_tau * w.near_tau);
+    w.fm_origin_tau = static_cast<float>(w.near_tau * 1e9) * 1e-9;
+    if (!fit_fm_rate(*s, &w)) {
+      *error = "no ground intersection for the azimuth FM rate";
+      return false;
+    }
+  }
+  if (opt.first_tie_sample < 1 || opt.first_tie_sample > min_samples - 20) {
+    *error = "first tie sample must lie between 1 and " + std::to_string(min_samples - 20);
+    return false;
   }
   // Azimuth spacing: ground distance travelled by the mid-range point per line.
   {
@@ -236,8 +342,26 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     zero_doppler_point(s->traj->at(tc + 0.5), tau, &b);
     s->azimuth_spacing = norm(b.x - a.x) * s->line_interval;
   }
+  // Product corners: first and last line of the product at the near range of
+  // SS1, the middle of the swath and the far range of SS5.
+  {
+    const double taus[3] = {s->ss[0].near_tau, (s->ss[0].near_tau + s->ss[4].far_tau) / 2,
+                            s->ss[4].far_tau};
+    const double times[2] = {s->t0, s->stop};
+    for (int a = 0; a < 2; ++a)
+      for (int r = 0; r < 3; ++r) {
+        GroundPoint g;
+        if (!zero_doppler_point(s->traj->at(times[a]), taus[r], &g)) {
+          *error = "no ground intersection for the product corners";
+          return false;
+        }
+        s->sph_lat[3 * a + r] = g.geo.lat_deg;
+        s->sph_lon[3 * a + r] = g.geo.lon_deg;
+      }
+  }
 
   // Doppler centroid records: about every four seconds, at least two.
+  duration = s->stop - s->t0;
   s->dop_ref_tau = s->ss[0].near_tau;
   const int nd = std::max(2, static_cast<int>(std::lround(duration / 4.0)) + 1);
   for (int j = 0; j < nd; ++j) {
@@ -248,8 +372,6 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   s->temperature = 27.5;
 
   // Reflectivity pattern on (time from the first line, range time from SS1 near).
-  Pattern& p = s->pattern;
-  p.kind = opt.pattern;
   const double rg_extent = s->ss[4].far_tau - s->ss[0].near_tau;
   p.az_cell = duration / plan.checker_az;
   p.rg_cell = rg_extent / plan.checker_rg;

@@ -21,9 +21,12 @@ struct Options {
   std::string polarisation = "HH";
   std::string pass;   // ascending, descending; empty: descending (or as --start gives)
   std::string orbit;  // a DORIS file or "kepler"
-  std::string pattern = "checkerboard";  // flat, checkerboard, points
+  std::string pattern = "checkerboard";  // flat, checkerboard, points, uniform
+  bool band_limit = false;   // range spectrum limited to the sub-swath's chirp bandwidth
+  int first_tie_sample = 1;  // sample number of the first tie point of every grid line
   // Defects.
   int blank_first = 0, blank_last = 0;
+  bool blank_zero_time = false;  // blank records carry zero time fields
   int mds_count = 5;
   int64_t truncate_at = -1;
   int dsd_beyond_end = -1;
@@ -36,19 +39,29 @@ struct Corner {
   double lat = 0, lon = 0, incidence = 0, look = 0;
 };
 
+// One sub-swath (beam): its own timing, sampling and processing values.
 struct SubSwath {
   int index = 0;  // 0..4
   int samples = 0;
-  double prf = 0, pulse_len = 0, pulse_bw = 0;
+  int lines_per_burst = 0, bursts = 0, records = 0;
+  double prf = 0, pulse_len = 0, pulse_bw = 0, look_bw = 0;
   int rank = 0, echoes = 0;
   double near_tau = 0, far_tau = 0;
-  int records = 0;
-  double first_time = 0, last_time = 0;  // times of the first and last records
+  // Zero-Doppler time of the first line of the first burst and of the last
+  // line of the last burst; time_diff is the float stored beside the first.
+  double first_time = 0, last_time = 0;
+  float time_diff = 0;
   Corner first_near, first_far, last_near, last_far, centre;
   double chirp_power = 0;
   int dop_delta = 0;
+  double rg_window_coef = 0, az_window_coef = 0, az_look_bw = 0;
+  double proc_gain = 0, ext_cal = 0, noise = 0;
   double elev_centre = 0;  // look angle at the sub-swath centre (XCA reference angle)
+  // Azimuth FM rate c0 + c1 r + c2 r^2, r = range time - fm_origin_tau; the
+  // origin is the float32 nanosecond value the record stores.
   double fm_rate[3] = {0, 0, 0}, fm_origin_tau = 0;
+  double band = 0;        // two-sided range bandwidth of the samples (Hz)
+  double mean_power = 0;  // expected |sample|^2 over the sub-swath (0: not stated)
   int64_t record_size = 0;
 };
 
@@ -64,6 +77,7 @@ struct Pattern {
   double background = 1.0, target_level = 64.0;
   double target_half_az = 0, target_half_rg = 0;  // half extent of a target (s)
   std::vector<Target> targets;
+  bool tapered = true;  // burst taper applied (all kinds but uniform)
   // Reflectivity at zero-Doppler time offset daz (from the first line) and
   // range time offset drg (from the near range of SS1).
   double at(double daz, double drg) const;
@@ -74,12 +88,11 @@ struct Scene {
   std::unique_ptr<Trajectory> traj;
   bool kepler = false;
   std::string orbit_source;  // path of the real file or "kepler"
-  double t0 = 0, stop = 0;
+  double t0 = 0, stop = 0;   // earliest first line and latest last line of all sub-swaths
   double line_interval = 0, burst_cycle = 0;
-  int cycle_lines = 0, lines_per_burst = 0, bursts = 0, grid_lines = 0;
+  int geo_step_lines = 0;  // line intervals between geolocation grid lines
   double fs = 19.20768e6, fc = 5.331004416e9;
   double range_spacing = 0, azimuth_spacing = 0;
-  double time_diff_zd = -0.351;  // value at 73 of the processing record
   SubSwath ss[kSubSwaths];
   std::string pass, polar;
   int abs_orbit = 0, rel_orbit = 0, cycle = 0;
@@ -90,6 +103,8 @@ struct Scene {
   std::vector<double> dop_c0;
   double dop_c1 = -1.5e4;
   double droop[8] = {0}, temperature = 0;
+  // Product corners of the SPH: first and last line at near, mid and far range.
+  double sph_lat[6] = {0}, sph_lon[6] = {0};
   // File names in the output folder.
   std::string product_name, orbit_name, xca_name, ins_name;
   double orbit_first = 0, orbit_last = 0;  // records of a generated orbit file
@@ -98,6 +113,9 @@ struct Scene {
 
 // Builds the scene; false with a message on bad options.
 bool build_scene(const Options& opt, Scene* scene, std::string* error);
+// Zero-Doppler time of MDS record r (from 0) of a sub-swath: line r mod L of
+// burst r / L, bursts a burst cycle apart, lines a line interval apart.
+double record_time(const Scene& s, const SubSwath& w, int r);
 // Two-way elevation pattern of the generated calibration files, in dB, at an
 // angle offset (degrees) from the reference angle of slot `slot` (0..7).
 double xca_pattern_db(int slot, double offset_deg);

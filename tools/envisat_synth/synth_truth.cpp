@@ -3,24 +3,60 @@
 // Parameter-file form ([Section] then "Key = value" lines), readable by the
 // profile library and by a person.  Text before the first section is a
 // comment.  Times are seconds since 1985-01-01 00:00:00 (every day 86400 s)
-// with their UTC texts beside them; range times are two-way delays in
-// seconds; angles and coordinates are degrees (geodetic WGS84).
+// with their UTC texts beside them (key + "Text"); range times are two-way
+// delays in seconds; angles and coordinates are degrees (geodetic WGS84);
+// frequencies and bandwidths Hz.
 //
-//   [Scene]       file names, orbit source, sensing start/stop, pass,
-//                 polarisation, orbits, line interval, burst cycle and its
-//                 lines, lines per burst, bursts, sampling and carrier
-//                 frequencies, spacings, time offset of the processing record
-//   [SubSwathK]   K = 1..5: Samples, Records, LinesPerBurst, Bursts,
-//                 EchoesPerBurst, Rank, PRF, FirstLineTime, LastLineTime,
-//                 NearRangeTime, FarRangeTime, CentreTime, CentreRangeTime,
-//                 Near/Centre/FarIncidence, CentreLookAngle, the corners
-//                 FirstNear/FirstFar/LastNear/LastFar Lat and Lon, CentreLat,
-//                 CentreLon, MdsOffset, RecordSize, ChirpPower, DopplerDelta,
-//                 azimuth FM-rate coefficients
-//   [Pattern]     reflectivity pattern and how samples were made from it
-//   [Doppler]     Doppler centroid records
-//   [Calibration] elevation patterns, reference angles, droop gains
-//   [Defects]     the defects written on request
+// [Scene]
+//   Product, OrbitFile, OrbitSource, XcaFile, InsFile, AuxList, Size, Seed
+//   SensingStart, SensingStop   earliest first line and latest last line of
+//                               all sub-swaths (also the SPH line times)
+//   Pass, Polarisation, AbsOrbit, RelOrbit
+//   SubSwaths                   number of MDS written
+//   LineTimeInterval            interval of the lines inside a burst
+//   BurstCycle                  sum over sub-swaths of (Rank + EchoesPerBurst) / PRF
+//   RangeSamplingRate, CarrierFrequency, RangeSpacing, AzimuthSpacing, TotalSize
+//   SphFirstNearLat/Lon ... SphLastFarLat/Lon   the six product corners of the
+//                               SPH (First/Last line; Near of SS1, Mid, Far of SS5)
+// [SubSwathK], K = 1..5
+//   Samples, Records, LinesPerBurst (L), Bursts, EchoesPerBurst, Rank, PRF,
+//   BurstCycle                  as in [Scene]
+//   PulseLength, PulseBandwidth chirp length (s) and bandwidth
+//   RangeLookBandwidth          range look bandwidth (slot K of its array)
+//   RangeSpectrumBandwidth      two-sided bandwidth of the samples' range
+//                               spectrum (the sampling rate unless band-limited)
+//   FirstLineTime               first line of the first burst (record 0)
+//   LastLineTime                last line of the last burst (last record);
+//                               record r is line r mod L of burst r / L at
+//                               FirstLineTime + (r / L) BurstCycle
+//                               + (r mod L) LineTimeInterval (whole us)
+//   TimeDiffZeroDoppler         float32 value stored beside the first time
+//   AcquisitionStartTime        FirstLineTime + TimeDiffZeroDoppler
+//   NearRangeTime, FarRangeTime range times of the first and last sample
+//   NearRangeOffsetSamples      (NearRangeTime - that of SS1) x sampling rate
+//   RangeSpacing                metres per sample
+//   FirstTieSample              sample number of the first grid tie point
+//   CentreTime, CentreRangeTime middle of the first/last lines and near/far
+//   Near/Centre/FarIncidence, CentreLookAngle
+//   FirstNear/FirstFar/LastNear/LastFar/Centre Lat and Lon
+//   MdsOffset, RecordSize
+//   RangeWindowType, RangeWindowCoefficient, AzimuthWindowType,
+//   AzimuthWindowCoefficient, AzimuthLookBandwidth
+//   ProcessorGain, ExternalCalibrationFactor, NoisePower
+//   ChirpPower                  chirp power of the sub-swath's chirp record
+//   DopplerDelta                its int16 added to the Doppler constant term
+//   DopplerRecordJ              "time c0 c1 c2 c3 c4" of Doppler record J with
+//                               the delta added: f = sum ci (tau - DopplerRangeTime)^i
+//   DopplerRangeTime            reference range time of the Doppler polynomials
+//   FmRateC0, FmRateC1, FmRateC2, FmRateRangeTime
+//                               azimuth FM rate C0 + C1 r + C2 r^2 (Hz/s),
+//                               r = tau - FmRateRangeTime, at CentreTime
+//   MeanPower                   expected |I + jQ|^2 averaged over the
+//                               sub-swath (uniform and flat patterns only)
+// [Pattern]     reflectivity pattern and how samples were made from it
+// [Doppler]     the Doppler centroid records without the sub-swath deltas
+// [Calibration] elevation patterns, reference angles, droop gains
+// [Defects]     the defects written on request
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
@@ -83,35 +119,43 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.integer("SubSwaths", std::max(0, std::min(s.opt.mds_count, kSubSwaths)));
   t.num("LineTimeInterval", s.line_interval, "%.12e");
   t.num("BurstCycle", s.burst_cycle, "%.12e");
-  t.integer("BurstCycleLines", s.cycle_lines);
-  t.integer("LinesPerBurst", s.lines_per_burst);
-  t.integer("Bursts", s.bursts);
-  t.integer("GridLines", s.grid_lines);
   t.num("RangeSamplingRate", s.fs, "%.3f");
   t.num("CarrierFrequency", s.fc, "%.3f");
   t.num("RangeSpacing", s.range_spacing, "%.9f");
   t.num("AzimuthSpacing", s.azimuth_spacing, "%.6f");
-  t.num("TimeDiffZeroDoppler", s.time_diff_zd, "%.6f");
   t.integer("TotalSize", L.tot_size);
+  const char* sph[6] = {"FirstNear", "FirstMid", "FirstFar", "LastNear", "LastMid", "LastFar"};
+  for (int i = 0; i < 6; ++i) {
+    t.num(std::string("Sph") + sph[i] + "Lat", s.sph_lat[i], "%.7f");
+    t.num(std::string("Sph") + sph[i] + "Lon", s.sph_lon[i], "%.7f");
+  }
 
   for (int k = 0; k < kSubSwaths; ++k) {
     const SubSwath& w = s.ss[k];
     t.section("SubSwath" + std::to_string(k + 1));
     t.integer("Samples", w.samples);
     t.integer("Records", w.records);
-    t.integer("LinesPerBurst", s.lines_per_burst);
-    t.integer("Bursts", s.bursts);
+    t.integer("LinesPerBurst", w.lines_per_burst);
+    t.integer("Bursts", w.bursts);
     t.integer("EchoesPerBurst", w.echoes);
     t.integer("Rank", w.rank);
     t.num("PRF", w.prf, "%.6f");
+    t.num("BurstCycle", s.burst_cycle, "%.12e");
     t.num("PulseLength", w.pulse_len, "%.9e");
     t.num("PulseBandwidth", w.pulse_bw, "%.3f");
+    t.num("RangeLookBandwidth", w.look_bw, "%.3f");
+    t.num("RangeSpectrumBandwidth", w.band, "%.3f");
     t.time("FirstLineTime", w.first_time);
     t.time("LastLineTime", w.last_time);
-    t.num("NearRangeTime", w.near_tau, "%.12e");
-    t.num("FarRangeTime", w.far_tau, "%.12e");
+    t.num("TimeDiffZeroDoppler", w.time_diff, "%.9f");
+    t.time("AcquisitionStartTime", w.first_time + static_cast<double>(w.time_diff));
+    t.num("NearRangeTime", w.near_tau, "%.15e");
+    t.num("FarRangeTime", w.far_tau, "%.15e");
+    t.num("NearRangeOffsetSamples", (w.near_tau - s.ss[0].near_tau) * s.fs, "%.6f");
+    t.num("RangeSpacing", s.range_spacing, "%.9f");
+    t.integer("FirstTieSample", s.opt.first_tie_sample);
     t.time("CentreTime", w.centre.t);
-    t.num("CentreRangeTime", w.centre.tau, "%.12e");
+    t.num("CentreRangeTime", w.centre.tau, "%.15e");
     t.num("NearIncidence", w.first_near.incidence, "%.6f");
     t.num("CentreIncidence", w.centre.incidence, "%.6f");
     t.num("FarIncidence", w.first_far.incidence, "%.6f");
@@ -124,12 +168,28 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
     }
     t.integer("MdsOffset", L.mds_offset[k]);
     t.integer("RecordSize", w.record_size);
+    t.text("RangeWindowType", "HAMMING");
+    t.num("RangeWindowCoefficient", w.rg_window_coef, "%.6f");
+    t.text("AzimuthWindowType", "HAMMING");
+    t.num("AzimuthWindowCoefficient", w.az_window_coef, "%.6f");
+    t.num("AzimuthLookBandwidth", w.az_look_bw, "%.3f");
+    t.num("ProcessorGain", w.proc_gain, "%.6f");
+    t.num("ExternalCalibrationFactor", w.ext_cal, "%.3f");
+    t.num("NoisePower", w.noise, "%.6f");
     t.num("ChirpPower", w.chirp_power, "%.6f");
     t.integer("DopplerDelta", w.dop_delta);
-    t.num("FmRateC0", w.fm_rate[0], "%.6e");
-    t.num("FmRateC1", w.fm_rate[1], "%.6e");
-    t.num("FmRateC2", w.fm_rate[2], "%.6e");
-    t.num("FmRateRangeTime", w.fm_origin_tau, "%.12e");
+    t.num("DopplerRangeTime", s.dop_ref_tau, "%.15e");
+    for (size_t j = 0; j < s.dop_times.size(); ++j) {
+      char b[160];
+      std::snprintf(b, sizeof b, "%.6f %.6f %.6e 0 0 0", s.dop_times[j], s.dop_c0[j] + w.dop_delta,
+                    s.dop_c1);
+      t.text("DopplerRecord" + std::to_string(j), b);
+    }
+    t.num("FmRateC0", w.fm_rate[0], "%.9e");
+    t.num("FmRateC1", w.fm_rate[1], "%.9e");
+    t.num("FmRateC2", w.fm_rate[2], "%.9e");
+    t.num("FmRateRangeTime", w.fm_origin_tau, "%.15e");
+    if (w.mean_power > 0) t.num("MeanPower", w.mean_power, "%.6f");
   }
 
   const Pattern& p = s.pattern;
@@ -138,14 +198,18 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.text("Coordinates",
          "daz = zero-Doppler time - SensingStart (s); drg = range time - NearRangeTime of SS1 (s)");
   t.text("Samples",
-         "I and Q independent normal, std dev Scale * sqrt(Taper(i)) * sqrt(R(daz, drg)), "
+         "I and Q normal, std dev Scale * sqrt(Taper(i)) * sqrt(R(daz, drg)), "
          "rounded to int16; i = line within its burst (0..LinesPerBurst-1)");
-  t.text("Taper",
-         "sin^2(pi * (i + 0.5) / LinesPerBurst) (power); the three bursts covering a "
-         "time sum to 1.5");
+  t.text("Taper", p.tapered ? "sin^2(pi * (i + 0.5) / LinesPerBurst) (power); the about three "
+                              "bursts covering a time sum to about 1.5"
+                            : "none (1 on every line)");
+  t.text("BandLimit", s.opt.band_limit
+                          ? "yes: white inside |f| <= RangeSpectrumBandwidth / 2 of each "
+                            "line's DFT, zero outside (before R and the taper)"
+                          : "no: white over the sampling rate");
   t.num("Scale", p.scale, "%.3f");
   t.text("ElevationGain", "none (the data carry no elevation antenna pattern)");
-  if (p.kind == "flat") t.text("Definition", "R = 1");
+  if (p.kind == "flat" || p.kind == "uniform") t.text("Definition", "R = 1");
   if (p.kind == "checkerboard") {
     t.text("Definition", "R = High when floor(daz/AzCell) + floor(drg/RgCell) is even, else Low");
     t.num("AzCell", p.az_cell, "%.12e");
@@ -176,7 +240,7 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.num("ReferenceRangeTime", s.dop_ref_tau, "%.12e");
   t.text("Polynomial",
          "f = C0 + C1 * (range time - ReferenceRangeTime) + DopplerDelta of the "
-         "sub-swath");
+         "sub-swath (see DopplerRecordJ of each sub-swath)");
   t.num("C1", s.dop_c1, "%.6e");
   for (size_t j = 0; j < s.dop_times.size(); ++j) {
     char b[96];
@@ -202,6 +266,7 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.section("Defects");
   t.integer("BlankFirst", s.opt.blank_first);
   t.integer("BlankLast", s.opt.blank_last);
+  t.text("BlankTimes", s.opt.blank_zero_time ? "zero" : "kept");
   t.integer("MdsCount", std::max(0, std::min(s.opt.mds_count, kSubSwaths)));
   t.integer("TruncateAt", s.opt.truncate_at);
   t.integer("DsdBeyondEnd", s.opt.dsd_beyond_end);

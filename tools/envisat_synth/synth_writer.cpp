@@ -1,22 +1,29 @@
 #include "synth_writer.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
+#include <complex>
 #include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <memory>
+#include <stdexcept>
 #include <vector>
 
 #include "synth_format.h"
+#include "synth_spectrum.h"
 
 namespace synth {
 namespace {
 
 constexpr int kSqSize = 170, kMppSize = 2009, kDopSize = 55, kChirpSize = 1483, kAntSize = 162,
               kGeoSize = 521;
+constexpr size_t kSqZdt = 0;
 constexpr int kXcaSize = 26552, kInsSize = 171648;
 constexpr int kTies = 11;
+// Image line header: zero-Doppler time, quality flag (-1 blank), line number.
+constexpr size_t kLineTime = 0, kLineQuality = 12, kLineNumber = 13, kLineHeader = 17;
 
 // Calibration-file slot of a sub-swath: SS1 has its own, SS2..SS5 share IS3..IS6.
 int slot_of(int k) {
@@ -98,166 +105,254 @@ inline int16_t quantise(double v) {
   return static_cast<int16_t>(r > 32767.0 ? 32767.0 : (r < -32768.0 ? -32768.0 : r));
 }
 
-double line_time(const Scene& s, int burst, int line) {
-  return round_us(s.t0 + (burst * s.cycle_lines + line) * s.line_interval);
-}
-double grid_time(const Scene& s, int g) {
-  return round_us(s.t0 + g * s.line_interval);
-}
-
-int tie_sample(const SubSwath& w, int j) {
-  return 1 + static_cast<int>(std::lround(j * (w.samples - 1) / 10.0));
+int tie_sample(const SubSwath& w, int first, int j) {
+  return first + static_cast<int>(std::lround(j * (w.samples - first) / 10.0));
 }
 double tie_tau(const Scene& s, const SubSwath& w, int sample) {
   return w.near_tau + (sample - 1) / s.fs;
 }
 
+// Which sub-swath's value each of the five slots of a per-beam array holds in
+// the record of sub-swath k: its own value in `own_slot` (the slot a reader
+// must take), and in every other slot e the value of a sub-swath other than k
+// and other than e.  A reader that takes the wrong slot, or the right slot of
+// the wrong record, gets a wrong value.
+std::array<int, kSubSwaths> slot_owners(int own_slot, int k) {
+  std::array<int, kSubSwaths> owner{};
+  std::vector<int> slots, others;
+  for (int e = 0; e < kSubSwaths; ++e) {
+    if (e != own_slot) slots.push_back(e);
+    if (e != k) others.push_back(e);
+  }
+  const size_t n = slots.size();
+  for (size_t rot = 1; rot <= n; ++rot) {
+    bool ok = true;
+    for (size_t i = 0; i < n; ++i) ok = ok && others[(i + rot) % n] != slots[i];
+    if (!ok) continue;
+    owner[own_slot] = k;
+    for (size_t i = 0; i < n; ++i) owner[slots[i]] = others[(i + rot) % n];
+    return owner;
+  }
+  throw std::logic_error("no slot assignment");
+}
+
+// Per-beam array of floats or of unsigned integers at `off`.
+template <typename Get>
+void put_beams_f32(Bytes& b, size_t off, const Scene& s, int own_slot, int k, Get get) {
+  const std::array<int, kSubSwaths> owner = slot_owners(own_slot, k);
+  for (int e = 0; e < kSubSwaths; ++e)
+    put_f32(b, off + 4 * e, static_cast<float>(get(s.ss[owner[e]])));
+}
+template <typename Get>
+void put_beams_u32(Bytes& b, size_t off, const Scene& s, int own_slot, int k, Get get) {
+  const std::array<int, kSubSwaths> owner = slot_owners(own_slot, k);
+  for (int e = 0; e < kSubSwaths; ++e)
+    put_u32(b, off + 4 * e, static_cast<uint32_t>(get(s.ss[owner[e]])));
+}
+
 // ---------------------------------------------------------------- records
+// Main processing parameters record fields.
+constexpr size_t kMppFirstZdt = 0, kMppLastZdt = 13, kMppWorkOrder = 25, kMppTimeDiff = 37,
+                 kMppSwath = 41, kMppRangeSpacing = 44, kMppAzimuthSpacing = 48,
+                 kMppLineInterval = 52, kMppLines = 56, kMppSamples = 60, kMppDataType = 64,
+                 kMppLinesPerBurst = 69, kMppTimeDiffZeroDoppler = 73, kMppAntElevCorr = 121,
+                 kMppRangeSpreadComp = 126, kMppFirstSwst = 643, kMppLastSwst = 663,
+                 kMppSwstChanges = 683, kMppPrf = 703, kMppPulseLen = 723, kMppPulseBw = 743,
+                 kMppEchoWinLen = 763, kMppRank = 893, kMppSampRate = 983, kMppRadarFreq = 987,
+                 kMppRangeLooks = 991, kMppRgWindow = 993, kMppRgWindowCoef = 1000,
+                 kMppLookBwRange = 1004, kMppTotBwRange = 1024, kMppLookBwAz = 1270,
+                 kMppAzWindow = 1278, kMppAzWindowCoef = 1285, kMppFmRate = 1289,
+                 kMppFmOrigin = 1301, kMppProcGain = 1377, kMppExtCal = 1381, kMppNoise = 1393,
+                 kMppBeamOverlap = 1685, kMppEchoesPerBurst = 1717, kMppStateVectors = 1765;
+// One state vector of the record: time, position (1e-2 m), velocity (1e-5 m/s).
+constexpr size_t kSvSize = 36, kSvPos = 12, kSvVel = 24;
+
 Bytes mpp_record(const Scene& s, const SubSwath& w) {
   Bytes b(kMppSize, 0);
-  put_mjd(b, 0, w.first_time);
-  put_mjd(b, 13, w.last_time);
-  put_text(b, 25, "SYNTH0000001");
-  put_f32(b, 37, 0.0f);
-  put_text(b, 41, "SS" + std::to_string(w.index + 1));
-  put_f32(b, 44, static_cast<float>(s.range_spacing));
-  put_f32(b, 48, static_cast<float>(s.azimuth_spacing));
-  put_f32(b, 52, static_cast<float>(s.line_interval));
-  put_u32(b, 56, static_cast<uint32_t>(w.records));
-  put_u32(b, 60, static_cast<uint32_t>(w.samples));
-  put_text(b, 64, "SWORD");
-  put_u32(b, 69, static_cast<uint32_t>(s.lines_per_burst));
-  put_f32(b, 73, static_cast<float>(s.time_diff_zd));
-  put_u8(b, 121, 1);  // elevation antenna pattern corrected
-  put_u8(b, 126, 1);  // range spreading loss compensated
-  // Per-beam arrays: in the record of a sub-swath every element holds its value.
-  for (int e = 0; e < 5; ++e) {
-    put_f32(b, 643 + 4 * e, static_cast<float>(w.near_tau));
-    put_f32(b, 663 + 4 * e, static_cast<float>(w.near_tau));
-    put_u32(b, 683 + 4 * e, 0);
-    put_f32(b, 703 + 4 * e, static_cast<float>(w.prf));
-    put_f32(b, 723 + 4 * e, static_cast<float>(w.pulse_len));
-    put_f32(b, 743 + 4 * e, static_cast<float>(w.pulse_bw));
-    put_f32(b, 763 + 4 * e, static_cast<float>(w.samples / s.fs));
-    put_u32(b, 893 + 4 * e, static_cast<uint32_t>(w.rank));
-    put_f32(b, 1004 + 4 * e, static_cast<float>(w.pulse_bw));
-    put_f32(b, 1024 + 4 * e, static_cast<float>(w.pulse_bw));
-    put_u32(b, 1717 + 4 * e, static_cast<uint32_t>(w.echoes));
-  }
-  put_f32(b, 983, static_cast<float>(s.fs));
-  put_f32(b, 987, static_cast<float>(s.fc));
-  b[991] = 0;
-  b[992] = 1;  // one range look
-  put_text(b, 993, "HAMMING");
-  put_f32(b, 1000, 0.75f);
-  put_f32(b, 1270, 1040.0f);
-  put_text(b, 1278, "HAMMING");
-  put_f32(b, 1285, 0.75f);
-  for (int i = 0; i < 3; ++i) put_f32(b, 1289 + 4 * i, static_cast<float>(w.fm_rate[i]));
-  put_f32(b, 1301, static_cast<float>(w.fm_origin_tau * 1e9));
-  put_f32(b, 1377, 1.0f);
-  put_f32(b, 1381, static_cast<float>(1.0e5 * (1.0 + 0.1 * w.index)));
-  put_f32(b, 1393, static_cast<float>(2.0 + 0.25 * w.index));
-  for (int i = 0; i < 4; ++i) put_u32(b, 1685 + 4 * i, 200);
-  // Five orbit state vectors spread over the scene (1e-2 m, 1e-5 m/s).
+  const int k = w.index;
+  put_mjd(b, kMppFirstZdt, w.first_time);
+  put_mjd(b, kMppLastZdt, w.last_time);
+  put_text(b, kMppWorkOrder, "SYNTH0000001");
+  put_f32(b, kMppTimeDiff, 0.0f);
+  put_text(b, kMppSwath, "SS" + std::to_string(k + 1));
+  put_f32(b, kMppRangeSpacing, static_cast<float>(s.range_spacing));
+  put_f32(b, kMppAzimuthSpacing, static_cast<float>(s.azimuth_spacing));
+  put_f32(b, kMppLineInterval, static_cast<float>(s.line_interval));
+  put_u32(b, kMppLines, static_cast<uint32_t>(w.records));
+  put_u32(b, kMppSamples, static_cast<uint32_t>(w.samples));
+  put_text(b, kMppDataType, "SWORD");
+  put_u32(b, kMppLinesPerBurst, static_cast<uint32_t>(w.lines_per_burst));
+  put_f32(b, kMppTimeDiffZeroDoppler, w.time_diff);
+  put_u8(b, kMppAntElevCorr, 1);      // elevation antenna pattern corrected
+  put_u8(b, kMppRangeSpreadComp, 1);  // range spreading loss compensated
+  // Per-beam arrays: the fields read at their base offset have the
+  // sub-swath's own value in slot 0, the range bandwidths in slot k.
+  put_beams_f32(b, kMppFirstSwst, s, 0, k, [](const SubSwath& v) { return v.near_tau; });
+  put_beams_f32(b, kMppLastSwst, s, 0, k, [](const SubSwath& v) { return v.near_tau; });
+  put_beams_u32(b, kMppSwstChanges, s, 0, k, [](const SubSwath&) { return 0; });
+  put_beams_f32(b, kMppPrf, s, 0, k, [](const SubSwath& v) { return v.prf; });
+  put_beams_f32(b, kMppPulseLen, s, 0, k, [](const SubSwath& v) { return v.pulse_len; });
+  put_beams_f32(b, kMppPulseBw, s, 0, k, [](const SubSwath& v) { return v.pulse_bw; });
+  put_beams_f32(b, kMppEchoWinLen, s, 0, k, [&s](const SubSwath& v) { return v.samples / s.fs; });
+  put_beams_u32(b, kMppRank, s, 0, k, [](const SubSwath& v) { return v.rank; });
+  put_beams_f32(b, kMppLookBwRange, s, k, k, [](const SubSwath& v) { return v.look_bw; });
+  put_beams_f32(b, kMppTotBwRange, s, k, k, [](const SubSwath& v) { return v.pulse_bw; });
+  put_beams_u32(b, kMppEchoesPerBurst, s, 0, k, [](const SubSwath& v) { return v.echoes; });
+  put_f32(b, kMppSampRate, static_cast<float>(s.fs));
+  put_f32(b, kMppRadarFreq, static_cast<float>(s.fc));
+  b[kMppRangeLooks] = 0;
+  b[kMppRangeLooks + 1] = 1;  // one range look
+  put_text(b, kMppRgWindow, "HAMMING");
+  put_f32(b, kMppRgWindowCoef, static_cast<float>(w.rg_window_coef));
+  put_f32(b, kMppLookBwAz, static_cast<float>(w.az_look_bw));
+  put_text(b, kMppAzWindow, "HAMMING");
+  put_f32(b, kMppAzWindowCoef, static_cast<float>(w.az_window_coef));
+  for (int i = 0; i < 3; ++i) put_f32(b, kMppFmRate + 4 * i, static_cast<float>(w.fm_rate[i]));
+  put_f32(b, kMppFmOrigin, static_cast<float>(w.fm_origin_tau * 1e9));
+  put_f32(b, kMppProcGain, static_cast<float>(w.proc_gain));
+  put_f32(b, kMppExtCal, static_cast<float>(w.ext_cal));
+  put_f32(b, kMppNoise, static_cast<float>(w.noise));
+  for (int i = 0; i < 4; ++i) put_u32(b, kMppBeamOverlap + 4 * i, 200);
+  // Five orbit state vectors spread over the sub-swath (1e-2 m, 1e-5 m/s).
   for (int j = 0; j < 5; ++j) {
     const double t = round_us(w.first_time + (w.last_time - w.first_time) * j / 4.0);
     const State st = s.traj->at(t);
-    const size_t o = 1765 + 36 * j;
+    const size_t o = kMppStateVectors + kSvSize * j;
     put_mjd(b, o, t);
     const double p[3] = {st.p.x, st.p.y, st.p.z}, v[3] = {st.v.x, st.v.y, st.v.z};
     for (int a = 0; a < 3; ++a) {
-      put_i32(b, o + 12 + 4 * a, static_cast<int32_t>(std::lround(p[a] * 100.0)));
-      put_i32(b, o + 24 + 4 * a, static_cast<int32_t>(std::lround(v[a] * 1e5)));
+      put_i32(b, o + kSvPos + 4 * a, static_cast<int32_t>(std::lround(p[a] * 100.0)));
+      put_i32(b, o + kSvVel + 4 * a, static_cast<int32_t>(std::lround(v[a] * 1e5)));
     }
   }
   return b;
 }
 
+// Doppler centroid record fields.
+constexpr size_t kDopZdt = 0, kDopRangeTime = 13, kDopCoef = 17, kDopConf = 37, kDopDelta = 42;
+
 Bytes dop_record(const Scene& s, int j) {
   Bytes b(kDopSize, 0);
-  put_mjd(b, 0, s.dop_times[j]);
-  put_f32(b, 13, static_cast<float>(s.dop_ref_tau * 1e9));
-  put_f32(b, 17, static_cast<float>(s.dop_c0[j]));
-  put_f32(b, 21, static_cast<float>(s.dop_c1));
-  put_f32(b, 37, 0.9f);
+  put_mjd(b, kDopZdt, s.dop_times[j]);
+  put_f32(b, kDopRangeTime, static_cast<float>(s.dop_ref_tau * 1e9));
+  put_f32(b, kDopCoef, static_cast<float>(s.dop_c0[j]));
+  put_f32(b, kDopCoef + 4, static_cast<float>(s.dop_c1));
+  put_f32(b, kDopConf, 0.9f);
   for (int k = 0; k < kSubSwaths; ++k)
-    put_i16(b, 42 + 2 * k, static_cast<int16_t>(s.ss[k].dop_delta));
+    put_i16(b, kDopDelta + 2 * k, static_cast<int16_t>(s.ss[k].dop_delta));
   return b;
 }
 
+// Chirp parameters record fields.
+constexpr size_t kChirpZdt = 0, kChirpBeam = 13, kChirpPolar = 16, kChirpWidth = 19,
+                 kChirpSidelobe = 23, kChirpIslr = 27, kChirpPeak = 31, kChirpRePower = 35,
+                 kChirpElevPower = 39, kChirpRefPower = 44, kChirpNormSource = 48;
+
 Bytes chirp_record(const Scene& s, const SubSwath& w) {
   Bytes b(kChirpSize, 0);
-  put_mjd(b, 0, w.first_time);
-  put_text(b, 13, "SS" + std::to_string(w.index + 1));
-  put_text(b, 16, s.polar);
-  put_f32(b, 19, static_cast<float>(1.0 / w.pulse_bw));
-  put_f32(b, 23, -13.2f);
-  put_f32(b, 27, -10.1f);
-  put_f32(b, 31, 0.0f);
-  put_f32(b, 35, static_cast<float>(w.chirp_power));
-  put_f32(b, 39, static_cast<float>(w.chirp_power));
-  put_f32(b, 44, static_cast<float>(10.0 * std::log10(w.chirp_power)));
-  put_text(b, 48, "NOMINAL");
+  put_mjd(b, kChirpZdt, w.first_time);
+  put_text(b, kChirpBeam, "SS" + std::to_string(w.index + 1));
+  put_text(b, kChirpPolar, s.polar);
+  put_f32(b, kChirpWidth, static_cast<float>(1.0 / w.pulse_bw));
+  put_f32(b, kChirpSidelobe, -13.2f);
+  put_f32(b, kChirpIslr, -10.1f);
+  put_f32(b, kChirpPeak, 0.0f);
+  put_f32(b, kChirpRePower, static_cast<float>(w.chirp_power));
+  put_f32(b, kChirpElevPower, static_cast<float>(0.97 * w.chirp_power));
+  put_f32(b, kChirpRefPower, static_cast<float>(10.0 * std::log10(w.chirp_power)));
+  put_text(b, kChirpNormSource, "NOMINAL");
   return b;
 }
+
+// Antenna elevation pattern record fields.
+constexpr size_t kAntZdt = 0, kAntBeam = 13, kAntRangeTime = 16, kAntAngle = 60, kAntGain = 104;
 
 // Elevation pattern record: tie ranges of the sub-swath, look angles and the
 // two-way pattern of the calibration file there.
 bool ant_record(const Scene& s, const SubSwath& w, Bytes* out) {
   Bytes b(kAntSize, 0);
-  put_mjd(b, 0, w.first_time);
-  put_text(b, 13, "SS" + std::to_string(w.index + 1));
+  put_mjd(b, kAntZdt, w.first_time);
+  put_text(b, kAntBeam, "SS" + std::to_string(w.index + 1));
   const State st = s.traj->at(w.centre.t);
   for (int j = 0; j < kTies; ++j) {
-    const double tau = tie_tau(s, w, tie_sample(w, j));
+    const double tau = tie_tau(s, w, tie_sample(w, 1, j));
     GroundPoint g;
     if (!zero_doppler_point(st, tau, &g)) return false;
-    put_f32(b, 16 + 4 * j, static_cast<float>(tau * 1e9));
-    put_f32(b, 60 + 4 * j, static_cast<float>(g.look_deg));
-    put_f32(b, 104 + 4 * j,
+    put_f32(b, kAntRangeTime + 4 * j, static_cast<float>(tau * 1e9));
+    put_f32(b, kAntAngle + 4 * j, static_cast<float>(g.look_deg));
+    put_f32(b, kAntGain + 4 * j,
             static_cast<float>(xca_pattern_db(slot_of(w.index), g.look_deg - w.elev_centre)));
   }
   *out = std::move(b);
   return true;
 }
 
-bool put_ties(const Scene& s, const SubSwath& w, double t, Bytes& b, size_t samp, size_t srt,
-              size_t inc, size_t lat, size_t lon) {
+// Geolocation grid record fields; the tie points of the last line follow
+// those of the first at the same spacing.
+constexpr size_t kGeoFirstZdt = 0, kGeoLineNum = 13, kGeoNumLines = 17, kGeoTrack = 21,
+                 kGeoSamples = 25, kGeoRangeTimes = 69, kGeoIncidence = 113, kGeoLats = 157,
+                 kGeoLons = 201, kGeoLastZdt = 267, kGeoLastLine = 279 - 25, kGeoSwath = 499;
+
+bool put_ties(const Scene& s, const SubSwath& w, double t, Bytes& b, size_t base) {
   const State st = s.traj->at(t);
   for (int j = 0; j < kTies; ++j) {
-    const int n = tie_sample(w, j);
+    const int n = tie_sample(w, s.opt.first_tie_sample, j);
     const double tau = tie_tau(s, w, n);
     GroundPoint g;
     if (!zero_doppler_point(st, tau, &g)) return false;
-    put_u32(b, samp + 4 * j, static_cast<uint32_t>(n));
-    put_f32(b, srt + 4 * j, static_cast<float>(tau * 1e9));
-    put_f32(b, inc + 4 * j, static_cast<float>(g.incidence_deg));
-    put_i32(b, lat + 4 * j, static_cast<int32_t>(std::lround(g.geo.lat_deg * 1e6)));
-    put_i32(b, lon + 4 * j, static_cast<int32_t>(std::lround(g.geo.lon_deg * 1e6)));
+    put_u32(b, base + kGeoSamples + 4 * j, static_cast<uint32_t>(n));
+    put_f32(b, base + kGeoRangeTimes + 4 * j, static_cast<float>(tau * 1e9));
+    put_f32(b, base + kGeoIncidence + 4 * j, static_cast<float>(g.incidence_deg));
+    put_i32(b, base + kGeoLats + 4 * j, static_cast<int32_t>(std::lround(g.geo.lat_deg * 1e6)));
+    put_i32(b, base + kGeoLons + 4 * j, static_cast<int32_t>(std::lround(g.geo.lon_deg * 1e6)));
   }
   return true;
 }
 
-bool geo_record(const Scene& s, const SubSwath& w, int g_first, int g_last, Bytes* out) {
+// Grid line `row` of sub-swath w and the next one, which closes its span.
+bool geo_record(const Scene& s, const SubSwath& w, int row, Bytes* out) {
   Bytes b(kGeoSize, 0);
-  const double t1 = grid_time(s, g_first), t2 = grid_time(s, g_last);
-  put_mjd(b, 0, t1);
-  put_u32(b, 13, static_cast<uint32_t>(g_first + 1));
-  put_u32(b, 17, static_cast<uint32_t>(g_last - g_first));
+  const int step = s.geo_step_lines;
+  const double t1 = round_us(w.first_time + row * step * s.line_interval);
+  const double t2 = std::min(round_us(t1 + step * s.line_interval), w.last_time);
+  put_mjd(b, kGeoFirstZdt, t1);
+  put_u32(b, kGeoLineNum, static_cast<uint32_t>(row * step + 1));
+  put_u32(b, kGeoNumLines, static_cast<uint32_t>(std::lround((t2 - t1) / s.line_interval)));
   const State a = s.traj->at(t1);
   // Sub-satellite track heading, degrees clockwise from north.
   const Geodetic ga = to_geodetic(a.p), gb = to_geodetic(s.traj->at(t1 + 1.0).p);
   const double heading = std::atan2((gb.lon_deg - ga.lon_deg) * std::cos(ga.lat_deg * M_PI / 180.0),
                                     gb.lat_deg - ga.lat_deg) *
                          180.0 / M_PI;
-  put_f32(b, 21, static_cast<float>(heading));
-  if (!put_ties(s, w, t1, b, 25, 69, 113, 157, 201)) return false;
-  put_mjd(b, 267, t2);
-  if (!put_ties(s, w, t2, b, 279, 323, 367, 411, 455)) return false;
-  put_text(b, 499, "SS" + std::to_string(w.index + 1));
+  put_f32(b, kGeoTrack, static_cast<float>(heading));
+  if (!put_ties(s, w, t1, b, 0)) return false;
+  put_mjd(b, kGeoLastZdt, t2);
+  if (!put_ties(s, w, t2, b, kGeoLastLine)) return false;
+  put_text(b, kGeoSwath, "SS" + std::to_string(w.index + 1));
   *out = std::move(b);
   return true;
+}
+
+// Grid lines of a sub-swath: from its first line, every geo_step_lines line
+// intervals, the last span ending at its last line.
+int geo_rows(const Scene& s, const SubSwath& w) {
+  const double span = s.geo_step_lines * s.line_interval;
+  return std::max(1, static_cast<int>(std::ceil((w.last_time - w.first_time) / span - 1e-9)));
+}
+
+// The grid records of all sub-swaths in time order: (sub-swath, row).
+std::vector<std::pair<int, int>> geo_order(const Scene& s) {
+  std::vector<std::pair<int, int>> order;
+  for (int k = 0; k < kSubSwaths; ++k)
+    for (int row = 0; row < geo_rows(s, s.ss[k]); ++row) order.emplace_back(k, row);
+  auto time_of = [&s](const std::pair<int, int>& e) {
+    return s.ss[e.first].first_time + e.second * s.geo_step_lines * s.line_interval;
+  };
+  std::stable_sort(order.begin(), order.end(),
+                   [&](const std::pair<int, int>& x, const std::pair<int, int>& y) {
+                     return time_of(x) < time_of(y);
+                   });
+  return order;
 }
 
 // ---------------------------------------------------------------- product
@@ -285,20 +380,10 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
   ImageSphValues sp;
   sp.first_line = s.t0;
   sp.last_line = s.stop;
-  const SubSwath& s1 = s.ss[0];
-  const SubSwath& s5 = s.ss[4];
-  const double taus[3] = {s1.near_tau, (s1.near_tau + s5.far_tau) / 2, s5.far_tau};
-  const double times[2] = {s.t0, s.stop};
-  for (int a = 0; a < 2; ++a)
-    for (int r = 0; r < 3; ++r) {
-      GroundPoint g;
-      if (!zero_doppler_point(s.traj->at(times[a]), taus[r], &g)) {
-        *error = "no ground intersection for the product corners";
-        return false;
-      }
-      sp.corner_lat[3 * a + r] = g.geo.lat_deg;
-      sp.corner_lon[3 * a + r] = g.geo.lon_deg;
-    }
+  for (int i = 0; i < 6; ++i) {
+    sp.corner_lat[i] = s.sph_lat[i];
+    sp.corner_lon[i] = s.sph_lon[i];
+  }
   sp.pass = s.pass;
   sp.polar1 = s.polar;
   sp.range_spacing = s.range_spacing;
@@ -365,7 +450,7 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
   // Annotation data sets.
   for (int k = 0; k < kSubSwaths; ++k) {
     Bytes b(kSqSize, 0);
-    put_mjd(b, 0, s.ss[k].first_time);
+    put_mjd(b, kSqZdt, s.ss[k].first_time);
     out.write(b);
   }
   for (int k = 0; k < kSubSwaths; ++k) out.write(mpp_record(s, s.ss[k]));
@@ -379,91 +464,103 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
     }
     out.write(b);
   }
-  for (int r = 0; r < L.geo_segments; ++r)
-    for (int k = 0; k < kSubSwaths; ++k) {
-      const int g1 = r * L.geo_step;
-      const int g2 = std::min(g1 + L.geo_step, s.grid_lines - 1);
-      Bytes b;
-      if (!geo_record(s, s.ss[k], g1, g2, &b)) {
-        *error = "no ground intersection for the geolocation grid";
-        return false;
-      }
-      out.write(b);
+  for (const std::pair<int, int>& e : geo_order(s)) {
+    Bytes b;
+    if (!geo_record(s, s.ss[e.first], e.second, &b)) {
+      *error = "no ground intersection for the geolocation grid";
+      return false;
     }
+    out.write(b);
+  }
 
   // Image lines, burst after burst, in large buffered writes.
   const Pattern& p = s.pattern;
-  const int lpb = s.lines_per_burst;
   for (int k = 0; k < nmds; ++k) {
     const SubSwath& w = s.ss[k];
     const int n = w.samples;
+    const int lpb = w.lines_per_burst;
     std::vector<double> drg(n);
     std::vector<long> rcell(n);
     for (int i = 0; i < n; ++i) {
       drg[i] = (w.near_tau - s.ss[0].near_tau) + i / s.fs;
       rcell[i] = static_cast<long>(std::floor(drg[i] / p.rg_cell));
     }
+    std::unique_ptr<BandLimitedNoise> band;
+    if (o.band_limit) band.reset(new BandLimitedNoise(n, s.fs, w.band));
+    std::vector<cplx> spectrum(band ? band->bins() : 0), noise(n);
     std::vector<double> amp(n);
     const size_t rec = static_cast<size_t>(w.record_size);
     const size_t per_chunk = std::max<size_t>(1, (8u << 20) / rec);
     Bytes buf;
     buf.reserve(per_chunk * rec);
-    for (int j = 0; j < s.bursts; ++j)
-      for (int i = 0; i < lpb; ++i) {
-        const int r = j * lpb + i;
-        const double t = line_time(s, j, i);
-        const bool blank = r < o.blank_first || r >= w.records - o.blank_last;
-        const size_t base = buf.size();
-        buf.resize(base + rec);
-        uint8_t* q = &buf[base];
-        const Mjd mj = to_mjd(t);
-        const uint32_t hdr[3] = {static_cast<uint32_t>(mj.days), mj.seconds, mj.microseconds};
-        for (int h = 0; h < 3; ++h)
-          for (int x = 0; x < 4; ++x) q[4 * h + x] = static_cast<uint8_t>(hdr[h] >> (24 - 8 * x));
-        q[12] = blank ? 0xFF : 0;
-        const uint32_t num = static_cast<uint32_t>(r + 1);
-        for (int x = 0; x < 4; ++x) q[13 + x] = static_cast<uint8_t>(num >> (24 - 8 * x));
-        q += 17;
-        if (blank) {
-          std::fill(q, q + 4 * n, 0);
-        } else {
-          // Amplitude: scale x sqrt(taper power) x sqrt(reflectivity).
-          const double daz = t - s.t0;
-          const double a0 = p.scale * std::sqrt(burst_taper(i, lpb));
-          if (p.kind == "checkerboard") {
-            const long ac = static_cast<long>(std::floor(daz / p.az_cell));
-            const double hi = a0 * std::sqrt(p.high), lo = a0 * std::sqrt(p.low);
-            for (int x = 0; x < n; ++x) amp[x] = ((ac + rcell[x]) % 2 == 0) ? hi : lo;
-          } else if (p.kind == "points") {
-            std::fill(amp.begin(), amp.end(), a0 * std::sqrt(p.background));
-            for (const Target& tg : p.targets) {
-              if (std::fabs(daz - tg.t) > p.target_half_az) continue;
-              for (int x = 0; x < n; ++x)
-                if (std::fabs(drg[x] - tg.tau) <= p.target_half_rg)
-                  amp[x] = a0 * std::sqrt(p.target_level);
-            }
-          } else {
-            std::fill(amp.begin(), amp.end(), a0);
+    for (int r = 0; r < w.records; ++r) {
+      const int i = r % lpb;
+      const double t = record_time(s, w, r);
+      const bool blank = r < o.blank_first || r >= w.records - o.blank_last;
+      const size_t base = buf.size();
+      buf.resize(base + rec);
+      uint8_t* q = &buf[base];
+      const Mjd mj = blank && o.blank_zero_time ? Mjd() : to_mjd(t);
+      const uint32_t hdr[3] = {static_cast<uint32_t>(mj.days), mj.seconds, mj.microseconds};
+      for (int h = 0; h < 3; ++h)
+        for (int x = 0; x < 4; ++x)
+          q[kLineTime + 4 * h + x] = static_cast<uint8_t>(hdr[h] >> (24 - 8 * x));
+      q[kLineQuality] = blank ? 0xFF : 0;
+      const uint32_t num = static_cast<uint32_t>(r + 1);
+      for (int x = 0; x < 4; ++x) q[kLineNumber + x] = static_cast<uint8_t>(num >> (24 - 8 * x));
+      q += kLineHeader;
+      if (blank) {
+        std::fill(q, q + 4 * n, 0);
+      } else {
+        // Amplitude: scale x sqrt(taper power) x sqrt(reflectivity).
+        const double daz = t - s.t0;
+        const double a0 = p.scale * (p.tapered ? std::sqrt(burst_taper(i, lpb)) : 1.0);
+        if (p.kind == "checkerboard") {
+          const long ac = static_cast<long>(std::floor(daz / p.az_cell));
+          const double hi = a0 * std::sqrt(p.high), lo = a0 * std::sqrt(p.low);
+          for (int x = 0; x < n; ++x) amp[x] = ((ac + rcell[x]) % 2 == 0) ? hi : lo;
+        } else if (p.kind == "points") {
+          std::fill(amp.begin(), amp.end(), a0 * std::sqrt(p.background));
+          for (const Target& tg : p.targets) {
+            if (std::fabs(daz - tg.t) > p.target_half_az) continue;
+            for (int x = 0; x < n; ++x)
+              if (std::fabs(drg[x] - tg.tau) <= p.target_half_rg)
+                amp[x] = a0 * std::sqrt(p.target_level);
           }
-          Rng rng(o.seed * 0x100000001B3ULL ^ (static_cast<uint64_t>(k) << 40) ^
-                  static_cast<uint64_t>(r));
-          for (int x = 0; x < n; ++x) {
-            double gi, gq;
+        } else {
+          std::fill(amp.begin(), amp.end(), a0);
+        }
+        // Unit-variance complex normal speckle, white or band-limited.
+        Rng rng(o.seed * 0x100000001B3ULL ^ (static_cast<uint64_t>(k) << 40) ^
+                static_cast<uint64_t>(r));
+        double gi, gq;
+        if (band) {
+          for (cplx& v : spectrum) {
             rng.gauss2(&gi, &gq);
-            const uint16_t vi = static_cast<uint16_t>(quantise(amp[x] * gi));
-            const uint16_t vq = static_cast<uint16_t>(quantise(amp[x] * gq));
-            q[0] = static_cast<uint8_t>(vi >> 8);
-            q[1] = static_cast<uint8_t>(vi);
-            q[2] = static_cast<uint8_t>(vq >> 8);
-            q[3] = static_cast<uint8_t>(vq);
-            q += 4;
+            v = cplx(gi, gq);
+          }
+          band->line(spectrum, &noise);
+        } else {
+          for (cplx& v : noise) {
+            rng.gauss2(&gi, &gq);
+            v = cplx(gi, gq);
           }
         }
-        if (buf.size() + rec > buf.capacity()) {
-          out.write(buf);
-          buf.clear();
+        for (int x = 0; x < n; ++x) {
+          const uint16_t vi = static_cast<uint16_t>(quantise(amp[x] * noise[x].real()));
+          const uint16_t vq = static_cast<uint16_t>(quantise(amp[x] * noise[x].imag()));
+          q[0] = static_cast<uint8_t>(vi >> 8);
+          q[1] = static_cast<uint8_t>(vi);
+          q[2] = static_cast<uint8_t>(vq >> 8);
+          q[3] = static_cast<uint8_t>(vq);
+          q += 4;
         }
       }
+      if (buf.size() + rec > buf.capacity()) {
+        out.write(buf);
+        buf.clear();
+      }
+    }
     out.write(buf);
   }
   if (!out.close(error)) return false;
@@ -527,37 +624,49 @@ double ref_angle(const Scene& s, int slot) {
   return nominal[slot];
 }
 
+// External calibration record fields.
+constexpr size_t kXcaTime = 0, kXcaLength = 12, kXcaWsHh = 744, kXcaWsVv = 748, kXcaRefAngles = 760,
+                 kXcaPatterns = 792, kXcaPatternFloats = 804, kXcaWsSlcHh = 26520,
+                 kXcaWsSlcVv = 26524;
+constexpr int kXcaPolarisations = 4, kXcaPatternPoints = 201;
+
 bool write_xca(const Scene& s, std::string* error) {
   Bytes r(kXcaSize, 0);
-  put_mjd(r, 0, s.xca_start);
-  put_u32(r, 12, kXcaSize);
-  put_f32(r, 744, 4.5e5f);  // ws_hh
-  put_f32(r, 748, 4.6e5f);  // ws_vv
-  put_f32(r, 26520, 4.5e5f);
-  put_f32(r, 26524, 4.6e5f);
+  put_mjd(r, kXcaTime, s.xca_start);
+  put_u32(r, kXcaLength, kXcaSize);
+  put_f32(r, kXcaWsHh, 4.5e5f);
+  put_f32(r, kXcaWsVv, 4.6e5f);
+  put_f32(r, kXcaWsSlcHh, 4.5e5f);
+  put_f32(r, kXcaWsSlcVv, 4.6e5f);
   for (int slot = 0; slot < 8; ++slot) {
-    put_f32(r, 760 + 4 * slot, static_cast<float>(ref_angle(s, slot)));
-    for (int pol = 0; pol < 4; ++pol)
-      for (int i = 0; i < 201; ++i)
-        put_f32(r, 792 + (pol + 4 * slot) * 804 + 4 * i,
+    put_f32(r, kXcaRefAngles + 4 * slot, static_cast<float>(ref_angle(s, slot)));
+    for (int pol = 0; pol < kXcaPolarisations; ++pol)
+      for (int i = 0; i < kXcaPatternPoints; ++i)
+        put_f32(r, kXcaPatterns + (pol + kXcaPolarisations * slot) * kXcaPatternFloats + 4 * i,
                 static_cast<float>(xca_pattern_db(slot, (i - 100) * 0.05)));
   }
   return write_single_record_file(s, s.xca_name, "AUX XCA FILE", r, error);
 }
 
+// Instrument characterisation record fields; one block of test structures
+// (temperature, eight droop gains as doubles) per mode.
+constexpr size_t kInsTime = 0, kInsLength = 12, kInsRadarFreq = 16, kInsSampRate = 20,
+                 kInsOffsetFreq = 24, kInsRefAngles = 161920, kInsTests = 171232, kInsTestSize = 68,
+                 kInsDroop = 4;
+
 bool write_ins(const Scene& s, std::string* error) {
   Bytes r(kInsSize, 0);
-  put_mjd(r, 0, s.xca_start);
-  put_u32(r, 12, kInsSize);
-  put_f32(r, 16, static_cast<float>(s.fc));
-  put_f32(r, 20, static_cast<float>(s.fs));
-  put_f32(r, 24, 0.0f);
+  put_mjd(r, kInsTime, s.xca_start);
+  put_u32(r, kInsLength, kInsSize);
+  put_f32(r, kInsRadarFreq, static_cast<float>(s.fc));
+  put_f32(r, kInsSampRate, static_cast<float>(s.fs));
+  put_f32(r, kInsOffsetFreq, 0.0f);
   for (int slot = 0; slot < 8; ++slot)
-    put_f32(r, 161920 + 4 * slot, static_cast<float>(ref_angle(s, slot)));
+    put_f32(r, kInsRefAngles + 4 * slot, static_cast<float>(ref_angle(s, slot)));
   for (int mode = 0; mode < 5; ++mode) {
-    const size_t o = 171232 + 68 * mode;
+    const size_t o = kInsTests + kInsTestSize * mode;
     put_f32(r, o, static_cast<float>(s.temperature + (mode - 2)));
-    for (int i = 0; i < 8; ++i) put_f64(r, o + 4 + 8 * i, s.droop[i] - 0.001 * (mode - 2));
+    for (int i = 0; i < 8; ++i) put_f64(r, o + kInsDroop + 8 * i, s.droop[i] - 0.001 * (mode - 2));
   }
   return write_single_record_file(s, s.ins_name, "AUX INS FILE", r, error);
 }
@@ -641,9 +750,7 @@ ProductLayout layout_of(const Scene& s) {
   L.ant_offset = off;
   off += kSubSwaths * kAntSize;
   L.geo_offset = off;
-  L.geo_step = 5 * s.cycle_lines;
-  L.geo_segments = (s.grid_lines - 1 + L.geo_step - 1) / L.geo_step;
-  L.geo_records = L.geo_segments * kSubSwaths;
+  L.geo_records = static_cast<int>(geo_order(s).size());
   off += static_cast<int64_t>(L.geo_records) * kGeoSize;
   const int nmds = std::max(0, std::min(s.opt.mds_count, kSubSwaths));
   for (int k = 0; k < nmds; ++k) {
