@@ -20,4 +20,14 @@ std::vector<std::string> ReadDriverArguments(const char* argumentText, const cha
 // The argument at position, or "" when the list is shorter.
 const std::string& DriverArgument(const std::vector<std::string>& arguments, size_t position);
 
+// Copies a file name into a fixed name field of N characters; false (field
+// untouched) when it does not fit.
+template <size_t N>
+bool CopyDriverName(const std::string& name, char (&field)[N]) {
+  if (name.size() >= N) return false;
+  name.copy(field, name.size());
+  field[name.size()] = '\0';
+  return true;
+}
+
 }  // namespace vlr

@@ -6,6 +6,7 @@
 #include "drivers/drivers.h"
 #include "drivers/find_aux.h"
 #include "envisat/envisat_types.h"
+#include "extraction/images.h"
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
@@ -54,6 +55,20 @@ int fvlr_main_multilook_wss(const char* argumentText) {
       (!EnvisatTypes::is_dorvor(orbit.c_str()) && !EnvisatTypes::is_dorpor(orbit.c_str()))) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "DOR_VOR");
   }
-  // The import and the multilook are not part of this build.
-  stepFailed(__LINE__, "multilook not available");
+  images_conf conf;
+  images extraction(conf);
+  if (!vlr::CopyDriverName(product, extraction.input.ASA_level1_filename) ||
+      !vlr::CopyDriverName(insPath, extraction.input.ASA_INS_Filename) ||
+      !vlr::CopyDriverName(orbit, extraction.input.ASA_dor_vor) ||
+      !vlr::CopyDriverName(DriverArgument(args, kOutputRoot), extraction.output.OutputFile)) {
+    stepFailed(__LINE__, "images run()");
+  }
+  conf.Memory = 256;
+  conf.ReportLevel = 1;
+  conf.Incore = 0;
+  conf.Verbose = 0;
+  conf.ExtractData = 1;
+  if (extraction.run() != 0) stepFailed(__LINE__, "images run()");
+  // The conversion and the multilook are not part of this build.
+  stepFailed(__LINE__, "tessal2kestova()");
 }

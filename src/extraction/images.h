@@ -73,6 +73,7 @@ class images {
   struct Run;
   int runSteps(Run& r);
   int processImage(Run& r, int k);
+  int copyImage(int k);
   void removeOutputs();
 
   char headerNames_[kMaxImages][kImagesNameSize] = {};

@@ -3,11 +3,13 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cmath>
 #include <cstring>
 
 #include "extraction/asar_annotation.h"
+#include "extraction/block_writer.h"
 #include "extraction/images.h"
 #include "raster/buffer_io.h"
 #include "raster/byte_order.h"
@@ -22,8 +24,11 @@
 namespace {
 
 constexpr const char* kModule = "images_v2";
-// Read-ahead and write-behind buffers of the line copy.
+// Read-ahead buffer of the line copy, and the blocks of converted lines
+// that go to the writer.
 constexpr int kCopyBufferBytes = 8 << 20;
+constexpr int64_t kCopyBlockBytes = 8 << 20;
+constexpr int kCopyBlocks = 3;
 // Lines between two progress updates.
 constexpr int kProgressStep = 100;
 
@@ -116,56 +121,94 @@ int get_first_last(const char* product, int64_t offset, int64_t recordSize, int6
 
 int images::extractASARdata() {
   VLR_SCOPE("images::extractASARdata", kModule);
-  for (int k = 0; k < nImages_; ++k) {
-    const ImageData& d = data_[k];
-    DataFile in;
-    in.set_name(input.ASA_level1_filename);
-    in.pixels_per_line = d.samples;
-    in.lines_per_image = d.lines;
-    in.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
-    in.header_offset = d.offset;
-    in.cell_type = d.inputCellType;
-    in.byte_order = 1;
-    DataFile out;
-    out.set_name(rasterNames_[k]);
-    out.pixels_per_line = d.samples;
-    out.lines_per_image = d.lines;
-    out.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
-    out.header_offset = 0;
-    out.cell_type = d.outputCellType;
-    out.byte_order = endi() == 'm' ? 1 : 0;
+  for (int k = 0; k < nImages_; ++k) VLR_CALL(copyImage(k));
+  return 0;
+}
 
-    vlr::CkBuffer<char> line;
-    const size_t lineBytes = static_cast<size_t>(d.samples) * 8;
-    if (!line.allocate(lineBytes + asar::mds::kLinePrefixSize)) {
-      VLR_FAIL("Cannot allocate the line buffer", vlr::kLibAlloc);
-    }
-    char* prefix = line.data() + lineBytes;
-    in.set_buffer_size(kCopyBufferBytes);
-    out.set_buffer_size(kCopyBufferBytes);
-    VLR_CALL(in.open(DataFile::kOpenRead));
-    VLR_CALL(out.open(DataFile::kOpenCreate));
-    BufferIO reader(&in), writer(&out);
-    reader.num_samples = writer.num_samples = d.samples;
-    reader.num_lines = writer.num_lines = 1;
-    reader.output_type = writer.output_type = d.outputCellType;
+// Copies the lines of image k: the main thread reads and converts blocks of
+// lines through the buffered raster reader while the block writer hands the
+// previous blocks to the file system.  Memory: the read buffer and
+// kCopyBlocks blocks, whatever the product's length.
+int images::copyImage(int k) {
+  VLR_SCOPE("images::copyImage", kModule);
+  const ImageData& d = data_[k];
+  DataFile in;
+  in.set_name(input.ASA_level1_filename);
+  in.pixels_per_line = d.samples;
+  in.lines_per_image = d.lines;
+  in.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
+  in.header_offset = d.offset;
+  in.cell_type = d.inputCellType;
+  in.byte_order = 1;
+  DataFile out;
+  out.set_name(rasterNames_[k]);
+  out.pixels_per_line = d.samples;
+  out.lines_per_image = d.lines;
+  out.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
+  out.header_offset = 0;
+  out.cell_type = d.outputCellType;
+  out.byte_order = endi() == 'm' ? 1 : 0;
+  VLR_CALL(in.check_description());
+  VLR_CALL(out.check_description());
 
-    const int bar = waitbar_open("Extracting data...");
-    int rc = 0;
-    for (int32_t l = 0; l < d.lines && rc == 0; ++l) {
-      if (l % kProgressStep == 0) waitbar_update(bar, 100.0f * l / d.lines);
-      reader.first_line = writer.first_line = l;
-      rc = vlr_scope_.callee(reader.readprefix(prefix), __LINE__);
-      if (rc == 0) rc = vlr_scope_.callee(reader.readbuffer(line.data()), __LINE__);
-      if (rc == 0) rc = vlr_scope_.callee(writer.writeprefix(prefix), __LINE__);
-      if (rc == 0) rc = vlr_scope_.callee(writer.writebuffer(line.data()), __LINE__);
+  const int64_t outLine = out.line_length();
+  const int32_t blockLines = static_cast<int32_t>(std::max<int64_t>(1, kCopyBlockBytes / outLine));
+  vlr::CkBuffer<char> blocks[kCopyBlocks];
+  for (auto& b : blocks) {
+    if (!b.allocate(static_cast<size_t>(blockLines * outLine))) {
+      VLR_FAIL("Cannot allocate the line blocks", vlr::kLibAlloc);
     }
-    waitbar_close(bar);
-    in.close();
-    const int closed = out.close();
-    if (rc != 0) return rc;
-    VLR_CALL(closed);
-    VLR_CALL(out.write_hdr());
   }
+  in.set_buffer_size(kCopyBufferBytes);
+  VLR_CALL(in.open(DataFile::kOpenRead));
+  const int fd = open(rasterNames_[k], O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+  if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
+  struct FdCloser {
+    int fd;
+    ~FdCloser() {
+      if (fd >= 0) close(fd);
+    }
+  } closer{fd};
+
+  BufferIO reader(&in);
+  reader.num_samples = d.samples;
+  reader.num_lines = 1;
+  reader.output_type = d.outputCellType;
+  const int bar = waitbar_open("Extracting data...");
+  int rc = 0;
+  uint64_t tickets[kCopyBlocks] = {};
+  {
+    BlockWriter writer(fd);
+    for (int32_t first = 0, b = 0; first < d.lines && rc == 0; first += blockLines, ++b) {
+      const int32_t n = std::min(blockLines, d.lines - first);
+      char* block = blocks[b % kCopyBlocks].data();
+      writer.wait(tickets[b % kCopyBlocks]);
+      for (int32_t l = 0; l < n && rc == 0; ++l) {
+        const int32_t line = first + l;
+        if (line % kProgressStep == 0) waitbar_update(bar, 100.0f * line / d.lines);
+        char* dst = block + l * outLine;
+        reader.first_line = line;
+        rc = vlr_scope_.callee(reader.readprefix(dst), __LINE__);
+        if (rc == 0) rc = vlr_scope_.callee(reader.readbuffer(dst + out.row_prefix), __LINE__);
+      }
+      if (rc == 0) {
+        tickets[b % kCopyBlocks] =
+            writer.submit(block, static_cast<size_t>(n * outLine), first * outLine);
+      }
+    }
+    const int error = writer.finish();
+    if (rc == 0 && error != 0) {
+      VLR_REPORT(NVLR_UTILITY_Format("%s: %s", rasterNames_[k], std::strerror(error)).c_str(),
+                 ARE_ERROR);
+      rc = vlr_scope_.fail("File writing failed!", vlr::kLibWrite, __LINE__);
+    }
+  }
+  waitbar_close(bar);
+  in.close();
+  const int closed = close(fd);
+  closer.fd = -1;
+  if (rc != 0) return rc;
+  if (closed != 0) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  VLR_CALL(out.write_hdr());
   return 0;
 }
