@@ -39,13 +39,6 @@ int readProductType(const char* product, std::string& type) {
   return 0;
 }
 
-// Copies a file name into one of the extraction's fixed name fields.
-bool CopyName(const std::string& name, char (&field)[kImagesNameSize]) {
-  if (name.size() >= kImagesNameSize) return false;
-  std::memcpy(field, name.c_str(), name.size() + 1);
-  return true;
-}
-
 }  // namespace
 
 int fvlr_main_import_esa(const char* argumentText) {
@@ -88,10 +81,10 @@ int fvlr_main_import_esa(const char* argumentText) {
   }
   images_conf conf;
   images extraction(conf);
-  if (!CopyName(product, extraction.input.ASA_level1_filename) ||
-      !CopyName(orbit, extraction.input.ASA_dor_vor) ||
-      !CopyName(insPath, extraction.input.ASA_INS_Filename) ||
-      !CopyName(DriverArgument(args, kOutputRoot), extraction.output.OutputFile)) {
+  if (!vlr::CopyDriverName(product, extraction.input.ASA_level1_filename) ||
+      !vlr::CopyDriverName(orbit, extraction.input.ASA_dor_vor) ||
+      !vlr::CopyDriverName(insPath, extraction.input.ASA_INS_Filename) ||
+      !vlr::CopyDriverName(DriverArgument(args, kOutputRoot), extraction.output.OutputFile)) {
     VLR_FAIL("File name too long", vlr::kLibInconsistent);
   }
   conf.Memory = 256;
