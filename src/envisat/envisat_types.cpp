@@ -3,11 +3,16 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
+#include <string>
 
 #include "envisat/product_header.h"
+#include "runtime/ckerr.h"
+#include "runtime/file_utility.h"
 #include "time/date_text.h"
 
 namespace {
+
+constexpr const char* kModule = "envisat_types";
 
 struct TypeCode {
   const char* code;
@@ -56,10 +61,18 @@ int has_code(const char* path, const char* code) {
 }
 
 // The 27-character UTC text at `offset` as seconds since 1985; false when it
-// cannot be read.
-bool utc_at(const char* path, long offset, double* t85) {
+// cannot be read, and false with a report naming the value when it is not a
+// date (a broken date must not pass for 1-JAN-1985).
+bool utc_at(const char* path, long offset, const char* name, double* t85) {
   char text[kUtcTextWidth + 1] = {0};
   if (!read_at(path, offset, text, kUtcTextWidth)) return false;
+  DateFields fields;
+  if (date2str(text, &fields) != 0) {
+    const std::string message = NVLR_UTILITY_Format("%s of %s is not a date: \"%s\"", name, path,
+                                                    EnvisatPrintable(text).c_str());
+    are_add_report(message.c_str(), ARE_ERROR, __LINE__, "check_dorvor", kModule);
+    return false;
+  }
   *t85 = ascii2sec85(text);
   return true;
 }
@@ -125,8 +138,8 @@ int EnvisatTypes::check_dorvor(const char* product_path, const char* orbit_path)
   const int type = find_type(product_path);
   if (type < kEnvisatAsaAps || type > kEnvisatAsaWs0) return 0;
   double product_start = 0.0, orbit_start = 0.0, orbit_stop = 0.0;
-  if (!utc_at(product_path, kMphSensingStart.offset, &product_start)) return 0;
-  if (!utc_at(orbit_path, kMphSensingStart.offset, &orbit_start)) return 0;
-  if (!utc_at(orbit_path, kMphSensingStop.offset, &orbit_stop)) return 0;
+  if (!utc_at(product_path, kMphSensingStart.offset, "SENSING_START", &product_start)) return 0;
+  if (!utc_at(orbit_path, kMphSensingStart.offset, "SENSING_START", &orbit_start)) return 0;
+  if (!utc_at(orbit_path, kMphSensingStop.offset, "SENSING_STOP", &orbit_stop)) return 0;
   return orbit_start < product_start && product_start < orbit_stop ? 1 : 0;
 }

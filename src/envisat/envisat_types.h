@@ -51,6 +51,7 @@ class EnvisatTypes {
 
   // 1 when the orbit file's validity (its sensing start and stop) strictly
   // contains the sensing start of the ASAR product (find_type 1 to 11), else
-  // 0, also when either file cannot be opened or read.
+  // 0, also when either file cannot be opened or read, and when one of the
+  // three times is not a date (reported as an error naming it).
   static int check_dorvor(const char* product_path, const char* orbit_path);
 };

@@ -2,11 +2,14 @@
 
 #include <cctype>
 #include <cerrno>
+#include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 
 #include "runtime/call_scope.h"
+#include "runtime/file_utility.h"
 
 namespace {
 
@@ -15,6 +18,48 @@ constexpr const char* kModule = "images_v2";
 bool in_block(size_t blockSize, EnvisatField f) {
   return f.offset <= blockSize && f.width <= blockSize - f.offset;
 }
+
+// Characters a number may hold.
+constexpr const char* kDecimalChars = "+-0123456789.eE";
+constexpr const char* kIntegerChars = "+-0123456789";
+
+// The characters of a number field without the blanks around it: empty
+// unless the field lies in the block, is followed by its unit and holds
+// nothing but `allowed` characters.
+std::string number_text(const char* block, size_t blockSize, EnvisatField field,
+                        const char* allowed) {
+  if (block == nullptr || !in_block(blockSize, field)) return std::string();
+  const size_t end = field.offset + field.width;
+  if (field.unit != nullptr) {
+    const size_t n = std::strlen(field.unit);
+    if (n > blockSize - end || std::memcmp(block + end, field.unit, n) != 0) return std::string();
+  }
+  const char* p = block + field.offset;
+  const char* q = block + end;
+  while (p < q && *p == ' ') ++p;
+  while (q > p && q[-1] == ' ') --q;
+  std::string s(p, q);
+  if (s.find_first_not_of(allowed) != std::string::npos) return std::string();
+  return s;
+}
+
+// The descriptors of the wide-swath layout, by data set name.
+struct NamedDsd {
+  const char* name;
+  size_t sphOffset;
+};
+constexpr NamedDsd kWssDescriptors[] = {
+    {"MAIN PROCESSING PARAMS ADS", kWssDsdLayout.mainProcessing},
+    {"DOP CENTROID COEFFS ADS", kWssDsdLayout.doppler},
+    {"CHIRP PARAMS ADS", kWssDsdLayout.chirp},
+    {"MDS1 ANTENNA ELEV PATT ADS", kWssDsdLayout.antenna},
+    {"GEOLOCATION GRID ADS", kWssDsdLayout.geolocation},
+    {"MDS1", kWssDsdLayout.mds[0]},
+    {"MDS2", kWssDsdLayout.mds[1]},
+    {"MDS3", kWssDsdLayout.mds[2]},
+    {"MDS4", kWssDsdLayout.mds[3]},
+    {"MDS5", kWssDsdLayout.mds[4]},
+};
 
 void parse_values(EnvisatHeaders* h) {
   const char* m = h->mph;
@@ -37,9 +82,25 @@ void parse_values(EnvisatHeaders* h) {
   h->mds1Polar = EnvisatToken(s, kSphBlockSize, kSphMds1Polar);
   h->mds2Polar = EnvisatToken(s, kSphBlockSize, kSphMds2Polar);
   h->dataType = EnvisatToken(s, kSphBlockSize, kSphDataType);
-  h->spacingsValid = EnvisatNumber(s, kSphBlockSize, kSphRangeSpacing, &h->rangeSpacing) &&
-                     EnvisatNumber(s, kSphBlockSize, kSphAzimuthSpacing, &h->azimuthSpacing) &&
-                     EnvisatNumber(s, kSphBlockSize, kSphLineTimeInterval, &h->lineTimeInterval);
+  const struct {
+    EnvisatField field;
+    double* value;
+    const char* problem;
+  } spacings[] = {
+      {kSphRangeSpacing, &h->rangeSpacing, "RANGE_SPACING is not a finite number in metres"},
+      {kSphAzimuthSpacing, &h->azimuthSpacing, "AZIMUTH_SPACING is not a finite number in metres"},
+      {kSphLineTimeInterval, &h->lineTimeInterval,
+       "LINE_TIME_INTERVAL is not a finite number in seconds"},
+  };
+  h->spacingsValid = true;
+  h->spacingProblem = nullptr;
+  for (const auto& sp : spacings) {
+    if (!EnvisatNumber(s, kSphBlockSize, sp.field, sp.value)) {
+      h->spacingsValid = false;
+      h->spacingProblem = sp.problem;
+      break;
+    }
+  }
   const std::string& t = h->productType;
   h->wss = t == "WSS";
   h->aps = t == "APS";
@@ -68,27 +129,35 @@ std::string EnvisatText(const char* block, size_t blockSize, EnvisatField field)
 }
 
 bool EnvisatNumber(const char* block, size_t blockSize, EnvisatField field, double* value) {
-  const std::string s = EnvisatToken(block, blockSize, field);
+  const std::string s = number_text(block, blockSize, field, kDecimalChars);
   if (s.empty()) return false;
   char* end = nullptr;
   errno = 0;
   const double v = std::strtod(s.c_str(), &end);
-  const bool ok = end != s.c_str() && errno == 0;
+  const bool ok = end == s.c_str() + s.size() && errno == 0 && std::isfinite(v);
   errno = 0;
   if (ok) *value = v;
   return ok;
 }
 
 bool EnvisatInteger(const char* block, size_t blockSize, EnvisatField field, int64_t* value) {
-  const std::string s = EnvisatToken(block, blockSize, field);
+  const std::string s = number_text(block, blockSize, field, kIntegerChars);
   if (s.empty()) return false;
   char* end = nullptr;
   errno = 0;
   const long long v = std::strtoll(s.c_str(), &end, 10);
-  const bool ok = end != s.c_str() && errno == 0;
+  const bool ok = end == s.c_str() + s.size() && errno == 0;
   errno = 0;
   if (ok) *value = v;
   return ok;
+}
+
+std::string EnvisatPrintable(const std::string& text) {
+  std::string out = text;
+  for (char& c : out) {
+    if (c < ' ' || c > '~') c = '?';
+  }
+  return out;
 }
 
 bool EnvisatDataSet::fitsIn(int64_t fileSize) const {
@@ -101,16 +170,41 @@ bool EnvisatDataSet::fitsIn(int64_t fileSize) const {
 
 EnvisatDataSet EnvisatHeaders::dataSet(size_t sphOffset) const {
   EnvisatDataSet d;
-  if (sphOffset > kSphBlockSize || kDsdRecordSize > kSphBlockSize - sphOffset) return d;
-  const char* b = sph + sphOffset;
-  int64_t v[4];
-  if (!EnvisatInteger(b, kDsdRecordSize, kDsdOffset, &v[0]) ||
-      !EnvisatInteger(b, kDsdRecordSize, kDsdSize, &v[1]) ||
-      !EnvisatInteger(b, kDsdRecordSize, kDsdNumDsr, &v[2]) ||
-      !EnvisatInteger(b, kDsdRecordSize, kDsdDsrSize, &v[3]))
+  if (sphOffset > kSphBlockSize || kDsdRecordSize > kSphBlockSize - sphOffset) {
+    d.problem = "the descriptor lies outside the specific product header";
     return d;
-  for (int64_t x : v)
-    if (x < 0) return d;
+  }
+  const char* b = sph + sphOffset;
+  const struct {
+    EnvisatField field;
+    const char* notNumber;
+    const char* negative;
+  } fields[4] = {
+      {kDsdOffset, "DS_OFFSET is not a number of <bytes>", "DS_OFFSET is negative"},
+      {kDsdSize, "DS_SIZE is not a number of <bytes>", "DS_SIZE is negative"},
+      {kDsdNumDsr, "NUM_DSR is not a number", "NUM_DSR is negative"},
+      {kDsdDsrSize, "DSR_SIZE is not a number of <bytes>", "DSR_SIZE is negative"},
+  };
+  int64_t v[4];
+  for (int i = 0; i < 4; ++i) {
+    if (!EnvisatInteger(b, kDsdRecordSize, fields[i].field, &v[i])) {
+      d.problem = fields[i].notNumber;
+      return d;
+    }
+    if (v[i] < 0) {
+      d.problem = fields[i].negative;
+      return d;
+    }
+  }
+  // The data set is its records, no more and no less.
+  if (v[2] > 0 && v[3] == 0) {
+    d.problem = "DSR_SIZE is 0 for a data set with records";
+    return d;
+  }
+  if ((v[2] > 0 && v[3] > INT64_MAX / v[2]) || v[1] != v[2] * v[3]) {
+    d.problem = "DS_SIZE is not NUM_DSR x DSR_SIZE";
+    return d;
+  }
   d.offset = v[0];
   d.size = v[1];
   d.numDsr = v[2];
@@ -145,5 +239,21 @@ int read_envisat_headers(const char* path, EnvisatHeaders* headers) {
   if (!ok || size < 0) VLR_FAIL("File reading failed!", 4);
   headers->fileSize = size;
   parse_values(headers);
+  if (headers->wss) {
+    if (!headers->spacingsValid) {
+      VLR_FAIL(
+          NVLR_UTILITY_Format("Specific product header of %s: %s", path, headers->spacingProblem)
+              .c_str(),
+          4);
+    }
+    for (const NamedDsd& dsd : kWssDescriptors) {
+      const EnvisatDataSet d = headers->dataSet(dsd.sphOffset);
+      if (!d.valid) {
+        VLR_FAIL(NVLR_UTILITY_Format("Data set descriptor %s of %s: %s", dsd.name, path, d.problem)
+                     .c_str(),
+                 4);
+      }
+    }
+  }
   return 0;
 }

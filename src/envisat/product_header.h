@@ -9,10 +9,13 @@
 #include <cstdint>
 #include <string>
 
-// A value's place: offset of its first character in its block, and width.
+// A value's place: offset of its first character in its block, and width;
+// for a number, the unit text that the format puts right after it ("<bytes>"
+// after DS_SIZE), or none.
 struct EnvisatField {
   size_t offset;
   size_t width;
+  const char* unit = nullptr;
 };
 
 constexpr size_t kMphSize = 1247;       // main product header
@@ -39,16 +42,16 @@ constexpr EnvisatField kSphSwath{688, 3};
 constexpr EnvisatField kSphSampleType{724, 8};
 constexpr EnvisatField kSphMds1Polar{772, 3};
 constexpr EnvisatField kSphMds2Polar{795, 3};
-constexpr EnvisatField kSphRangeSpacing{870, 15};
-constexpr EnvisatField kSphAzimuthSpacing{905, 15};
-constexpr EnvisatField kSphLineTimeInterval{943, 15};
+constexpr EnvisatField kSphRangeSpacing{870, 15, "<m>"};
+constexpr EnvisatField kSphAzimuthSpacing{905, 15, "<m>"};
+constexpr EnvisatField kSphLineTimeInterval{943, 15, "<s>"};
 constexpr EnvisatField kSphDataType{1001, 4};
 
 // Data set descriptor values (offsets from the start of the descriptor).
-constexpr EnvisatField kDsdOffset{133, 21};
-constexpr EnvisatField kDsdSize{170, 21};
+constexpr EnvisatField kDsdOffset{133, 21, "<bytes>"};
+constexpr EnvisatField kDsdSize{170, 21, "<bytes>"};
 constexpr EnvisatField kDsdNumDsr{207, 11};
-constexpr EnvisatField kDsdDsrSize{228, 11};
+constexpr EnvisatField kDsdDsrSize{228, 11, "<bytes>"};
 
 // Where the extraction's descriptors sit in the SPH block, which differs
 // between wide-swath (WSS) products and all others.
@@ -70,19 +73,33 @@ constexpr EnvisatDsdLayout kImageDsdLayout{1619, 1899, 2459, 2739, 3299, {3859, 
 std::string EnvisatToken(const char* block, size_t blockSize, EnvisatField field);
 // The field's characters as they stand (for the date texts).
 std::string EnvisatText(const char* block, size_t blockSize, EnvisatField field);
-// A decimal number in the field ("+7.80397e+00<m>", "+0000001625<bytes>");
-// false when the field holds none or lies outside the block.
+// The number rules of every ENVISAT header value.  A number is valid only
+// when the whole field, without the blanks around it, is one decimal number
+// (sign, digits, point, exponent: no "inf", "nan" or hexadecimal), finite
+// and in range, and, when the field names a unit, that unit follows the
+// field directly: "+7.80397367e+00<m>", "+00000000000000001625<bytes>".
+// "+1625garbag" or "+0000000000000000XXXX" are not numbers.  false (value
+// untouched) otherwise, also when the field lies outside the block.
 bool EnvisatNumber(const char* block, size_t blockSize, EnvisatField field, double* value);
+// The same for an integer (digits with an optional sign only).
 bool EnvisatInteger(const char* block, size_t blockSize, EnvisatField field, int64_t* value);
 
-// One data set descriptor.  A descriptor whose fields cannot be read, or
-// hold negative values, reads as absent (all zero) with valid false.
+// A header text quoted in a report: bytes that are not printable ASCII
+// become '?'.
+std::string EnvisatPrintable(const std::string& text);
+
+// One data set descriptor.  It is valid when its four numbers follow the
+// number rules, none is negative, DS_SIZE = NUM_DSR x DSR_SIZE and DSR_SIZE
+// is positive for a data set with records.  An invalid descriptor reads as
+// absent (all zero) with valid false, and `problem` names the field at
+// fault.
 struct EnvisatDataSet {
   int64_t offset = 0;
   int64_t size = 0;
   int64_t numDsr = 0;
   int64_t dsrSize = 0;
   bool valid = false;
+  const char* problem = nullptr;  // e.g. "DS_SIZE is not a number"; nullptr when valid
   bool present() const { return valid && size > 0; }
   // True when the data set lies inside a file of `fileSize` bytes and its
   // records, numDsr of dsrSize bytes, fit inside it.
@@ -107,7 +124,8 @@ struct EnvisatHeaders {
   std::string firstLineTime, lastLineTime;  // 27-character UTC texts
   std::string swath, sampleType, mds1Polar, mds2Polar, dataType;
   double rangeSpacing = 0.0, azimuthSpacing = 0.0, lineTimeInterval = 0.0;
-  bool spacingsValid = false;  // all three numbers were read
+  bool spacingsValid = false;            // all three numbers were read
+  const char* spacingProblem = nullptr;  // the first that was not, when not
 
   // Product type flags (from productType).
   bool wss = false, aps = false, apm = false, app = false, wsm = false, gm1 = false;
@@ -122,5 +140,8 @@ struct EnvisatHeaders {
 };
 
 // Reads the MPH and SPH blocks of a product and its header values.
-// 0; 9 "File not opened!"; 4 "File reading failed!" (short MPH or SPH).
+// 0; 9 "File not opened!"; 4 "File reading failed!" (short MPH or SPH).  A
+// wide-swath product (WSS) must also hold valid spacings and a valid
+// descriptor in every slot of its layout: otherwise 4, with a report naming
+// the field.  For other products spacingsValid and dataSet() tell.
 int read_envisat_headers(const char* path, EnvisatHeaders* headers);

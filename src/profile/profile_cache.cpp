@@ -1,13 +1,18 @@
 // The process-wide parameter-file cache and its access primitive.
 #include "profile/profile_cache.h"
 
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <new>
+#include <string>
 
 #include "profile/profile_store.h"
+#include "runtime/ckerr.h"
+#include "runtime/file_utility.h"
 
 namespace vlr::profile {
 
@@ -17,6 +22,8 @@ namespace vlr::profile {
 }
 
 namespace {
+
+constexpr const char* kModule = "profilelib";
 
 // Cache entries in order of creation (oldest first).  The current entry is
 // the one found or created by the latest lookup.
@@ -35,6 +42,12 @@ ProfileCacheEntry* FindCached(const char* file) {
   return nullptr;
 }
 
+void ReportRefused(const char* file) {
+  const std::string message = NVLR_UTILITY_Format(
+      "Parameter file %s is larger than %lld bytes: not read", file, kProfileMaxFileSize);
+  are_add_report(message.c_str(), ARE_ERROR, __LINE__, "GetSetProfileChar", kModule);
+}
+
 // Finds the entry of `file`, parsing the file into a new entry on its first
 // access.  A file that cannot be opened gives an entry without sections.
 ProfileCacheEntry* FindOrLoad(const char* file) {
@@ -44,10 +57,19 @@ ProfileCacheEntry* FindOrLoad(const char* file) {
     created->file = file;
     std::FILE* stream = std::fopen(file, "rb");
     if (stream != nullptr) {
-      ParseProfile(stream, *created);
+      // The size is checked before anything is read; the parser stops at
+      // the limit as well, for files whose size is not known beforehand.
+      struct stat st;
+      const bool tooLarge = ::fstat(fileno(stream), &st) == 0 && S_ISREG(st.st_mode) &&
+                            static_cast<long long>(st.st_size) > kProfileMaxFileSize;
+      if (tooLarge || !ParseProfile(stream, *created, kProfileMaxFileSize)) {
+        created->sections.clear();
+        created->refused = true;
+      }
       std::fclose(stream);
     }
     errno = 0;
+    if (created->refused) ReportRefused(file);
     entry = created.get();
     Cache().push_back(std::move(created));
   }
@@ -77,6 +99,7 @@ ProfileEntry* FindRecord(ProfileSection& section, const char* key) {
 const char* Access(int mode, const char* section, const char* key, const char* value,
                    const char* file) {
   ProfileCacheEntry* entry = FindOrLoad(file);
+  if (entry->refused) return nullptr;
   const bool set = mode == kProfileSet;
   ProfileSection* firstMatch = nullptr;
   auto& sections = entry->sections;
@@ -119,8 +142,10 @@ bool WriteEntry(std::FILE* stream, const ProfileCacheEntry& entry) {
   return std::ferror(stream) == 0;
 }
 
-// 0 written, 1 not opened, -1 write or close failed.
+// 0 written, 1 not opened, -1 write or close failed.  A refused file is
+// left as it is.
 int WriteFile(const ProfileCacheEntry& entry) {
+  if (entry.refused) return 0;
   std::FILE* stream = std::fopen(entry.file.c_str(), "wb");
   if (stream == nullptr) return 1;
   const bool written = WriteEntry(stream, entry);
@@ -142,6 +167,12 @@ const char* GetSetProfileChar(int mode, const char* section, const char* key, co
   } catch (const std::bad_alloc&) {
     ProfileOutOfMemory(false);
   }
+}
+
+bool ProfileFileRefused(const char* file) {
+  if (file == nullptr) return false;
+  const ProfileCacheEntry* entry = FindCached(file);
+  return entry != nullptr && entry->refused;
 }
 
 int SyncProfile(const char* file) {

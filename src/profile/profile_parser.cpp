@@ -9,6 +9,17 @@ namespace {
 
 enum class State { kStart, kSectionName, kSkipLine, kLineStart, kKey, kValue };
 
+// Characters of a blank line.
+constexpr const char* kBlanks = " \t\r";
+
+bool IsBlank(char c) {
+  return c == ' ' || c == '\t' || c == '\r';
+}
+// First non-blank character of a comment line.
+bool IsCommentMark(char c) {
+  return c == '#' || c == ';';
+}
+
 // Trims the space character (only) from both ends.
 std::string Trim(const std::string& text) {
   const size_t first = text.find_first_not_of(' ');
@@ -24,7 +35,7 @@ class Parser {
   void feed(char c) {
     switch (state_) {
       case State::kStart:
-        if (c == '[') openSection();
+        beforeSections(c);
         break;
       case State::kSectionName:
         if (c == ']') {
@@ -42,15 +53,20 @@ class Parser {
       case State::kLineStart:
         if (c == '[') {
           openSection();
-        } else if (c == '=') {
+        } else if (c == '=' || IsCommentMark(c)) {
           state_ = State::kSkipLine;
-        } else if (c != ' ') {
+        } else if (c != ' ' && c != '\n') {
           token_.assign(1, c);
+          lineBegin_ = 0;
           state_ = State::kKey;
         }
         break;
       case State::kKey:
-        if (c == '[') {
+        if (c == '\n') {
+          endKeyLine();
+        } else if ((c == '[' || c == '=') && inCommentLine()) {
+          token_ += c;
+        } else if (c == '[') {
           openSection();
         } else if (c == '=') {
           key_ = Trim(token_);
@@ -78,6 +94,45 @@ class Parser {
   }
 
  private:
+  // Text before the first section is ignored, except that a '[' opens one;
+  // a '[' inside a comment line does not.
+  void beforeSections(char c) {
+    if (c == '\n') {
+      lineFresh_ = true;
+      inComment_ = false;
+      return;
+    }
+    if (inComment_) return;
+    if (lineFresh_) {
+      if (IsBlank(c)) return;
+      if (IsCommentMark(c)) {
+        inComment_ = true;
+        return;
+      }
+      lineFresh_ = false;
+    }
+    if (c == '[') openSection();
+  }
+  // The current line of the key, from lineBegin_, starts with '#' or ';'
+  // after its blanks.
+  bool inCommentLine() const {
+    const size_t first = token_.find_first_not_of(kBlanks, lineBegin_);
+    return first != std::string::npos && IsCommentMark(token_[first]);
+  }
+  // A line without '=' ends.  A blank or comment line is dropped, so that it
+  // cannot become part of the next key; any other line stays in front of
+  // the next key, line feed included (as the rows after the first of a
+  // written matrix do).
+  void endKeyLine() {
+    const size_t first = token_.find_first_not_of(kBlanks, lineBegin_);
+    if (first == std::string::npos || IsCommentMark(token_[first])) {
+      token_.resize(lineBegin_);
+      if (token_.empty()) state_ = State::kLineStart;
+      return;
+    }
+    token_ += '\n';
+    lineBegin_ = token_.size();
+  }
   void openSection() {
     entry_.sections.push_back(std::make_unique<ProfileSection>());
     token_.clear();
@@ -96,19 +151,25 @@ class Parser {
   State state_ = State::kStart;
   std::string token_;
   std::string key_;
+  size_t lineBegin_ = 0;    // start of the key's current line in token_
+  bool lineFresh_ = true;   // before a section: nothing but blanks read on this line
+  bool inComment_ = false;  // before a section: inside a comment line
 };
 
 }  // namespace
 
-void ParseProfile(std::FILE* stream, ProfileCacheEntry& entry) {
+bool ParseProfile(std::FILE* stream, ProfileCacheEntry& entry, long long maxBytes) {
   try {
     Parser parser(entry);
     char block[4096];
+    long long total = 0;
     // Line ends are normalised as in text mode: a CR directly before a LF is
     // dropped.
     bool pendingCr = false;
     size_t got;
     while ((got = std::fread(block, 1, sizeof block, stream)) > 0) {
+      total += static_cast<long long>(got);
+      if (total > maxBytes) return false;
       for (size_t i = 0; i < got; ++i) {
         const char c = block[i];
         if (pendingCr) {
@@ -127,6 +188,7 @@ void ParseProfile(std::FILE* stream, ProfileCacheEntry& entry) {
   } catch (const std::bad_alloc&) {
     ProfileOutOfMemory(true);
   }
+  return true;
 }
 
 }  // namespace vlr::profile

@@ -26,10 +26,15 @@ struct ProfileSection {
 struct ProfileCacheEntry {
   std::string file;
   std::vector<std::unique_ptr<ProfileSection>> sections;
+  // The file was larger than kProfileMaxFileSize: it has no sections, takes
+  // no values and is never written.
+  bool refused = false;
 };
 
 // Parses the parameter-file text of `stream` into `entry` (appending).
-void ParseProfile(std::FILE* stream, ProfileCacheEntry& entry);
+// False, with the parse left incomplete, when the stream holds more than
+// `maxBytes` bytes.
+bool ParseProfile(std::FILE* stream, ProfileCacheEntry& entry, long long maxBytes);
 
 // Prints the allocation-failure message and ends the process with status 1.
 [[noreturn]] void ProfileOutOfMemory(bool growing);

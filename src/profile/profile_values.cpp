@@ -23,6 +23,12 @@ const char* Text(const char* s) {
   return s != nullptr ? s : "";
 }
 
+// Result of a reader that found no value: the key is absent (10), or the
+// whole file was refused.
+int Absent(const char* file) {
+  return ProfileFileRefused(file) ? kProfileFileRefused : 10;
+}
+
 void WarnShortRead(const char* function, int line, int got, int n, const char* section,
                    const char* key, const char* file) {
   const std::string message =
@@ -92,7 +98,7 @@ template <class T>
 int ReadNumbers(const char* function, int line, const char* section, const char* key, T* values,
                 int n, const char* file) {
   const char* value = GetSetProfileChar(kProfileGet, section, key, nullptr, file);
-  if (value == nullptr) return 10;
+  if (value == nullptr) return Absent(file);
   if (n < 0 || (n > 0 && values == nullptr)) return 10;
   ErrnoGuard guard;
   try {
@@ -201,7 +207,8 @@ int WriteMatrix(const char* function, int line, const char* section, const char*
 int GetMyProfileString(const char* section, const char* key, char* buffer, int size,
                        const char* file) {
   const char* value = GetSetProfileChar(kProfileGet, section, key, nullptr, file);
-  if (value == nullptr || buffer == nullptr || size < 1) return 10;
+  if (value == nullptr) return Absent(file);
+  if (buffer == nullptr || size < 1) return 10;
   const size_t length = std::min(std::strlen(value), static_cast<size_t>(size) - 1);
   std::memcpy(buffer, value, length);
   buffer[length] = '\0';
@@ -211,7 +218,7 @@ int GetMyProfileString(const char* section, const char* key, char* buffer, int s
 int GetMyProfileStringArray(const char* section, const char* key, char** strings, int n,
                             int elementSize, const char* file) {
   const char* value = GetSetProfileChar(kProfileGet, section, key, nullptr, file);
-  if (value == nullptr) return 10;
+  if (value == nullptr) return Absent(file);
   if (n < 0 || (n > 0 && strings == nullptr)) return 10;
   const size_t capacity = elementSize > 0 ? static_cast<size_t>(elementSize) : kProfileBufferSize;
   if (value[0] != '{') return 0;

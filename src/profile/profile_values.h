@@ -12,7 +12,8 @@
 //                     element (row i, column j) is at index i + j * rows.
 //
 // Results: 0 success, 10 failure (absent key or section, too few elements,
-// bad arguments).  Readers leave the destination untouched when the key is
+// bad arguments), kProfileFileRefused (4) for every key of a file larger
+// than kProfileMaxFileSize.  Readers leave the destination untouched when the key is
 // absent, so the caller keeps its defaults.  Writers change only the cache;
 // SyncProfile writes it to disk.
 #pragma once

@@ -1,6 +1,9 @@
 #include "raster/buffer_io.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
+#include <cerrno>
 #include <cstring>
 
 #include "raster/byte_order.h"
@@ -58,6 +61,16 @@ int BufferIO::open_for_reading() {
   return file->open(DataFile::kOpenRead);
 }
 
+// A window is written into the raster as it stands: an existing file is
+// opened for writing in place (never truncated, so that the lines outside
+// the window keep their samples), a missing one is created.
+int BufferIO::open_for_writing() {
+  struct stat st;
+  const bool exists = ::stat(file->name().c_str(), &st) == 0;
+  errno = 0;
+  return file->open(exists ? DataFile::kOpenWrite : DataFile::kOpenCreate);
+}
+
 int BufferIO::readprefix(char* out) {
   VLR_SCOPE("BufferIO::readprefix", kModule);
   VLR_CALL(transfer_prefix(out, nullptr));
@@ -77,7 +90,7 @@ int BufferIO::transfer_prefix(char* out, const char* in) {
   if (check_window(kPrefix) != 0 || (out == nullptr && in == nullptr && num_lines > 0)) {
     VLR_FAIL("Invalid raster window!", vlr::kLibInconsistent);
   }
-  if (!file->is_open()) VLR_CALL(reading ? open_for_reading() : file->open(DataFile::kOpenCreate));
+  if (!file->is_open()) VLR_CALL(reading ? open_for_reading() : open_for_writing());
   const int64_t prefix = file->row_prefix;
   for (int32_t k = 0; k < num_lines; ++k) {
     VLR_CALL(file->seek(file->line_offset(first_line + k), DataFile::kSeekSet));
@@ -148,7 +161,7 @@ int BufferIO::writebuffer(const char* in) {
   if (check_window(kWrite) != 0 || (in == nullptr && window_bytes() > 0)) {
     VLR_FAIL("Invalid raster window!", vlr::kLibInconsistent);
   }
-  if (!file->is_open()) VLR_CALL(file->open(DataFile::kOpenCreate));
+  if (!file->is_open()) VLR_CALL(open_for_writing());
   const int file_type = file->cell_type;
   const int64_t file_size = cell_type_size(file_type);
   const int64_t in_size = cell_type_size(output_type);

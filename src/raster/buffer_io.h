@@ -34,7 +34,8 @@ class BufferIO {
   // size was set).
   int readprefix(char* out);
   // Stores the RowPrefix bytes of each line of the window from `in`.  Opens
-  // the file for writing (created) if closed.
+  // the file for writing if closed: an existing file in place, keeping
+  // everything outside the window; a missing one is created.
   int writeprefix(const char* in);
 
   // The window's samples into `out`: num_lines runs of num_samples elements
@@ -43,7 +44,7 @@ class BufferIO {
   int readbuffer(char* out, int capacity);
   int readbuffer(char* out);
   // Stores the window from `in` (laid out as readbuffer delivers it).  Opens
-  // the file for writing (created) if closed.
+  // the file for writing if closed, as writeprefix does.
   int writebuffer(const char* in);
 
   // Bytes of the caller's side of the window: num_lines x num_samples x the
@@ -57,6 +58,7 @@ class BufferIO {
   bool must_swap() const;
   int transfer_prefix(char* out, const char* in);
   int open_for_reading();
+  int open_for_writing();
 
   std::vector<unsigned char> scratch_;  // one conversion chunk
 };

@@ -2,6 +2,8 @@
 
 #include <cerrno>
 #include <fstream>
+#include <iterator>
+#include <string>
 
 #include "envisat/envisat_types.h"
 #include "synth_run.h"
@@ -109,6 +111,42 @@ TEST(EnvisatTypes, CheckDorvorAgainstTheRealOrbitValidity) {
     const std::string own = r.dir + r.truth.at("Scene").at("OrbitFile");
     EXPECT_EQ(EnvisatTypes::check_dorvor(r.product.c_str(), own.c_str()), 1) << c.start;
     remove_run(r);
+  }
+}
+
+// A sensing time that is not a date never counts as 1-JAN-1985: the orbit
+// file is not taken as valid.
+TEST(EnvisatTypes, CheckDorvorRefusesTimesThatAreNotDates) {
+  std::ifstream in(kVor, std::ios::binary);
+  const std::string vor((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
+  ASSERT_EQ(vor.substr(351, 20), "01-MAR-2008 21:55:27");
+  const struct {
+    const char* what;
+    const char* productStart;
+    size_t orbitAt;  // 0: orbit file unchanged
+    const char* orbitText;
+    int expected;
+  } cases[] = {
+      {"valid times", "02-MAR-2008 10:00:00.000000", 0, "", 1},
+      {"orbit start not a date", "02-MAR-2008 10:00:00.000000", 351, "xx-MAR-2008 21:55:27.000000",
+       0},
+      {"orbit start blank", "02-MAR-2008 10:00:00.000000", 351, "                           ", 0},
+      {"orbit stop not a date", "02-MAR-2008 10:00:00.000000", 394, "03-XXX-2008 00:23:27.000000",
+       0},
+      {"product start not a date", "02-MAR-2008 10:99:00.000000", 0, "", 0},
+      {"product start blank", "                           ", 0, "", 0},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    const std::string product = testing::TempDir() + "dates_product";
+    std::ofstream(product, std::ios::binary)
+        << "PRODUCT=\"ASA_WSS_1PNPDK20080302_100000\"" << std::string(312, ' ') << c.productStart
+        << std::string(1000, ' ');
+    std::string orbitText = vor;
+    if (c.orbitAt != 0) orbitText.replace(c.orbitAt, 27, c.orbitText);
+    const std::string orbit = testing::TempDir() + "dates_orbit";
+    std::ofstream(orbit, std::ios::binary) << orbitText;
+    EXPECT_EQ(EnvisatTypes::check_dorvor(product.c_str(), orbit.c_str()), c.expected);
   }
 }
 

@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdio>
 #include <cstring>
 #include <fstream>
 #include <string>
+#include <vector>
 
 #include "envisat/product_header.h"
 #include "synth_run.h"
@@ -13,6 +15,18 @@ using synth_test::run_synth;
 using synth_test::SynthRun;
 
 namespace {
+
+// A data set descriptor as the format writes it, at the start of `dsd`.
+void PutDsd(char* dsd, long long offset, long long size, long long records, long long recordSize) {
+  char text[281];
+  std::snprintf(text, sizeof text,
+                "DS_NAME=\"%-28s\"\nDS_TYPE=M\nFILENAME=\"%-62s\"\n"
+                "DS_OFFSET=%+021lld<bytes>\nDS_SIZE=%+021lld<bytes>\nNUM_DSR=%+011lld\n"
+                "DSR_SIZE=%+011lld<bytes>\n%32s\n",
+                "DATA SET", "", offset, size, records, recordSize, "");
+  ASSERT_EQ(std::strlen(text), 280u);
+  std::memcpy(dsd, text, 280);
+}
 
 double truth(const SynthRun& r, const char* s, const char* k) {
   return std::stod(r.truth.at(s).at(k));
@@ -119,24 +133,133 @@ TEST(ProductHeader, HostileDescriptorsAreCaught) {
   EXPECT_FALSE(dop.present());
   remove_run(r);
 
-  // Garbage and negative numbers in descriptor fields read as absent.
+  // Negative numbers in descriptor fields read as absent.
   EnvisatHeaders g;
   std::memset(g.sph, ' ', sizeof g.sph);
-  std::memcpy(g.sph + 1339 + 133, "+0000000000000000XXXX", 21);
-  EXPECT_FALSE(g.dataSet(1339).valid);
-  std::memcpy(g.sph + 1619 + 133, "-00000000000000001625", 21);
-  std::memcpy(g.sph + 1619 + 170, "+00000000000000000055", 21);
-  std::memcpy(g.sph + 1619 + 207, "+0000000001", 11);
-  std::memcpy(g.sph + 1619 + 228, "+0000000055", 11);
+  PutDsd(g.sph + 1619, -1625, 55, 1, 55);
   EXPECT_FALSE(g.dataSet(1619).valid);
-  std::memcpy(g.sph + 1619 + 133, "+00000000000000001625", 21);
+  PutDsd(g.sph + 1619, 1625, 55, 1, 55);
   EXPECT_TRUE(g.dataSet(1619).fitsIn(1625 + 55));
   EXPECT_FALSE(g.dataSet(1619).fitsIn(1625 + 54));
-  // More records than the data set holds.
-  std::memcpy(g.sph + 1619 + 207, "+0000000002", 11);
-  EXPECT_FALSE(g.dataSet(1619).fitsIn(1 << 20));
   // A descriptor that would run past the block.
   EXPECT_FALSE(g.dataSet(kSphBlockSize - 100).valid);
+}
+
+// A product of headers only, encoded here from the published layout: MPH
+// with the product name, SPH with the three spacings and well-formed
+// descriptors in every slot of the wide-swath layout.
+struct HandmadeProduct {
+  std::string mph = std::string(1247, ' ');
+  std::string sph = std::string(6099, ' ');
+  explicit HandmadeProduct(const std::string& name) {
+    mph.replace(0, 9, "PRODUCT=\"");
+    mph.replace(9, name.size(), name);
+    sph.replace(856, 14, "RANGE_SPACING=");
+    sph.replace(870, 18, "+7.80397367e+00<m>");
+    sph.replace(889, 16, "AZIMUTH_SPACING=");
+    sph.replace(905, 18, "+4.04000000e+00<m>");
+    sph.replace(924, 19, "LINE_TIME_INTERVAL=");
+    sph.replace(943, 18, "+1.21515000e-02<s>");
+    const struct {
+      size_t at;
+      long long records, recordSize;
+    } dsds[] = {{1339, 5, 2009},   {1619, 3, 55},     {1899, 5, 1483},   {2179, 5, 162},
+                {2459, 11, 521},   {3019, 100, 2017}, {3299, 100, 2417}, {3579, 100, 1617},
+                {3859, 100, 2817}, {4139, 100, 2217}};
+    long long offset = 7346;
+    for (const auto& d : dsds) {
+      PutDsd(&sph[d.at], offset, d.records * d.recordSize, d.records, d.recordSize);
+      offset += d.records * d.recordSize;
+    }
+  }
+  std::string write(const std::string& path) const {
+    std::ofstream(path, std::ios::binary) << mph << sph;
+    return path;
+  }
+};
+
+// Header numbers that are not numbers of the format make a wide-swath
+// product unreadable (4); any other product reads with the value marked
+// invalid and the problem naming the field.
+TEST(ProductHeader, MalformedNumbersAreRefused) {
+  struct Edit {
+    size_t at;  // offset in the SPH block
+    const char* text;
+  };
+  const struct {
+    const char* field;  // named first by the problem
+    size_t dsd;         // the descriptor's SPH offset, 0 for a spacing
+    std::vector<Edit> edits;
+  } cases[] = {
+      {"RANGE_SPACING", 0, {{870, "+inf           "}}},
+      {"RANGE_SPACING", 0, {{870, "inf            "}}},
+      {"AZIMUTH_SPACING", 0, {{905, "nan            "}}},
+      {"AZIMUTH_SPACING", 0, {{905, "+1.0e+999      "}}},
+      {"LINE_TIME_INTERVAL", 0, {{943, "+1.21515000x-02"}}},
+      {"LINE_TIME_INTERVAL", 0, {{943, "0x1.8p-7       "}}},
+      {"RANGE_SPACING", 0, {{885, "m  "}}},  // the unit "<m>" gone
+      {"DS_OFFSET", 1339, {{1339 + 133, "+0000000000000000XXXX"}}},
+      {"NUM_DSR", 1619, {{1619 + 207, "+1625garbage"}}},
+      {"NUM_DSR", 1619, {{1619 + 207, "           "}}},
+      {"DS_SIZE", 1899, {{1899 + 170, "+00000000000000007416"}}},  // 5 x 1483 + 1
+      {"DS_SIZE", 1899, {{1899 + 170, "+00000000000000007414"}}},  // 5 x 1483 - 1
+      {"DSR_SIZE", 2179, {{2179 + 239, "       "}}},               // the unit "<bytes>" gone
+      {"DSR_SIZE", 3579, {{3579 + 228, "+0000000000"}}},
+      {"DSR_SIZE", 4139, {{4139 + 228, "-0000000001"}}},
+      // NUM_DSR x DSR_SIZE beyond 64 bits.
+      {"DS_SIZE", 2459, {{2459 + 207, "+9999999999"}, {2459 + 228, "+9999999999"}}},
+  };
+  const std::string dir = testing::TempDir();
+  const std::string tail = "1PNPDK20080302_100000_000000602066_00000_31395_0000.N1";
+  for (const auto& c : cases) {
+    SCOPED_TRACE(std::string(c.field) + " \"" + c.edits[0].text + "\"");
+    HandmadeProduct wss("ASA_WSS_" + tail);
+    EnvisatHeaders h;
+    ASSERT_EQ(read_envisat_headers(wss.write(dir + "good_wss").c_str(), &h), 0);
+    for (const Edit& e : c.edits) wss.sph.replace(e.at, std::strlen(e.text), e.text);
+    EXPECT_EQ(read_envisat_headers(wss.write(dir + "bad_wss").c_str(), &h), 4);
+
+    HandmadeProduct ims("ASA_IMS_" + tail);
+    ims.sph = wss.sph;
+    ASSERT_EQ(read_envisat_headers(ims.write(dir + "bad_ims").c_str(), &h), 0);
+    const char* problem = nullptr;
+    if (c.dsd == 0) {
+      EXPECT_FALSE(h.spacingsValid);
+      problem = h.spacingProblem;
+    } else {
+      const EnvisatDataSet d = h.dataSet(c.dsd);
+      EXPECT_FALSE(d.valid);
+      EXPECT_FALSE(d.present());
+      problem = d.problem;
+    }
+    ASSERT_NE(problem, nullptr);
+    EXPECT_EQ(std::string(problem).rfind(std::string(c.field) + " ", 0), 0u) << problem;
+  }
+}
+
+// Well-formed descriptors, including those of absent data sets, read as
+// they stand.
+TEST(ProductHeader, WellFormedHandmadeHeaders) {
+  HandmadeProduct wss("ASA_WSS_1PNPDK20080302_100000_000000602066_00000_31395_0000.N1");
+  // An absent fifth sub-swath, with and without its record size.
+  PutDsd(&wss.sph[4139], 0, 0, 0, 2217);
+  PutDsd(&wss.sph[3859], 0, 0, 0, 0);
+  EnvisatHeaders h;
+  ASSERT_EQ(read_envisat_headers(wss.write(testing::TempDir() + "handmade_wss").c_str(), &h), 0);
+  ASSERT_TRUE(h.spacingsValid);
+  EXPECT_EQ(h.spacingProblem, nullptr);
+  EXPECT_DOUBLE_EQ(h.rangeSpacing, 7.80397367);
+  EXPECT_DOUBLE_EQ(h.azimuthSpacing, 4.04);
+  EXPECT_DOUBLE_EQ(h.lineTimeInterval, 0.0121515);
+  const EnvisatDataSet main = h.dataSet(1339);
+  ASSERT_TRUE(main.valid);
+  EXPECT_EQ(main.problem, nullptr);
+  EXPECT_EQ(main.offset, 7346);
+  EXPECT_EQ(main.size, 5 * 2009);
+  EXPECT_EQ(main.numDsr, 5);
+  EXPECT_EQ(main.dsrSize, 2009);
+  EnvisatDataSet mds[5];
+  EXPECT_EQ(h.imageDataSets(mds), 3);
 }
 
 TEST(ProductHeader, ShortAndMissingFiles) {

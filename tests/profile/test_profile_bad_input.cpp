@@ -1,7 +1,9 @@
 // Parameter files we did not write: arbitrary bytes, absurd counts and
 // over-long values end in the documented results, never in a crash.
 #include <climits>
+#include <cstdint>
 #include <cstring>
+#include <filesystem>
 #include <random>
 
 #include "profile_fixture.h"
@@ -71,6 +73,53 @@ TEST_F(ProfileBadInput, OverLongValuesAndNamesStayBounded) {
   EXPECT_EQ(Value(f, longName.c_str(), "A"), "2");
   int n[1];
   EXPECT_EQ(GetMyProfileIntArray("S", "K", n, 1, f.c_str()), 10);
+}
+
+// A parameter file beyond the size limit is not read at all: its keys
+// answer "refused", writes fail, and the file on disk stays as it is.
+TEST_F(ProfileBadInput, FilesBeyondTheSizeLimitAreRefused) {
+  const std::string head = "[S]\nK = 1\n";
+  const struct {
+    const char* name;
+    long long size;  // padded with NUL bytes to this size; 0: /dev/zero
+    bool refused;
+  } cases[] = {
+      {"at_limit.par", kProfileMaxFileSize, false},
+      {"over_limit.par", kProfileMaxFileSize + 1, true},
+      {"/dev/zero", 0, true},  // no size known beforehand, no end
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.name);
+    FreeProfile();
+    std::string f = c.name;
+    if (c.size > 0) {
+      f = WriteFile(c.name, head);
+      std::filesystem::resize_file(f, static_cast<uintmax_t>(c.size));
+    }
+    char buffer[8] = "unset";
+    int n = 0;
+    double d = 0;
+    char e[8];
+    char* strings[1] = {e};
+    if (!c.refused) {
+      EXPECT_EQ(GetMyProfileString("S", "K", buffer, sizeof buffer, f.c_str()), 0);
+      EXPECT_STREQ(buffer, "1");
+      continue;
+    }
+    const int reports = ReportsDuring(
+        [&] { EXPECT_EQ(GetMyProfileString("S", "K", buffer, sizeof buffer, f.c_str()), 4); });
+    EXPECT_EQ(reports, 1);
+    EXPECT_STREQ(buffer, "unset");
+    EXPECT_EQ(GetParInt(f.c_str(), "K", 1, &n, 1, "S"), 4);
+    EXPECT_EQ(GetParDouble(f.c_str(), "K", 1, &d, 1, "S"), 4);
+    EXPECT_EQ(GetMyProfileStringArray("S", "K", strings, 1, 8, f.c_str()), 4);
+    EXPECT_EQ(WriteMyProfileString("S", "K", "2", f.c_str()), 10);
+    EXPECT_EQ(SyncProfile(f.c_str()), 0);
+    if (c.size > 0) {
+      EXPECT_EQ(std::filesystem::file_size(f), static_cast<uintmax_t>(c.size));
+      EXPECT_EQ(ReadFile(f).substr(0, head.size()), head);
+    }
+  }
 }
 
 }  // namespace

@@ -39,6 +39,33 @@ class BufferFileTest : public ScratchDir {
   }
 };
 
+// A window goes into an existing raster only through an open file, and in
+// update mode every byte outside it stays, whatever the buffer.
+TEST_F(BufferFileTest, WindowWrittenIntoAnExistingRasterKeepsTheRest) {
+  BufferFile bf;
+  const std::string bytes = MakeShortComplex(&bf);
+  std::vector<fcomplex> window;
+  std::string expected = bytes;
+  const int64_t line = kPrefix + kPixels * 4;
+  for (int k = 2; k < 4; ++k) {
+    for (int s = 5; s < 10; ++s) window.emplace_back(Re(k + 100, s), Im(k + 100, s));
+    expected.replace(static_cast<size_t>(kOffset + k * line + kPrefix + 5 * 4), 5 * 4,
+                     Samples(CT_SHORT_COMPLEX, true, k + 100, 5, 5));
+  }
+  // Closed: refused, the file untouched.
+  EXPECT_EQ(bf.writebuffer(window.data(), 2, 2, 5, 5), 9);
+  EXPECT_EQ(ReadFile(Path("sc")), bytes);
+  for (int buffer : {0, 7, 50, 1 << 16}) {
+    SCOPED_TRACE("buffer " + std::to_string(buffer));
+    WriteFile(Path("sc"), bytes);
+    ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
+    ASSERT_EQ(bf.initbuffer(buffer, 0), 0);
+    ASSERT_EQ(bf.writebuffer(window.data(), 2, 2, 5, 5), 0);
+    ASSERT_EQ(bf.close(), 0);
+    EXPECT_EQ(ReadFile(Path("sc")), expected);
+  }
+}
+
 TEST_F(BufferFileTest, BufferSmallerThanALineReadsTheSameBytes) {
   BufferFile bf;
   const std::string bytes = MakeShortComplex(&bf);

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <filesystem>
 #include <string>
 
 #include "raster/buffer_io.h"
@@ -45,6 +46,8 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
                              Samples(mem, false, 2, 1, 3, real_file));
         }
 
+        // Each file type has its own size: the raster is written afresh.
+        std::filesystem::remove(Path("out"));
         DataFile target;
         Describe(&target, Path("out"), file, big, kLines, kPixels);
         BufferIO writer(&target);
@@ -64,6 +67,76 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
       }
     }
   }
+}
+
+// A window written into a closed raster goes into the file as it stands:
+// every byte outside the window (header, prefixes, other lines and samples)
+// stays, and the file keeps its size.
+TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
+  constexpr int kWideLines = 6;
+  constexpr int kWidePixels = 9;
+  const struct {
+    int type;
+    bool big;
+    int buffer;  // DataFile buffer size, 0: unbuffered
+    int firstLine, numLines, firstSample, numSamples;
+    bool prefixes;  // the prefixes of the window's lines instead of its samples
+  } cases[] = {
+      {CT_SHORT_COMPLEX, true, 0, 2, 2, 3, 4, false},
+      {CT_SHORT_COMPLEX, true, 64, 2, 2, 3, 4, false},       // buffer shorter than a line
+      {CT_SHORT_COMPLEX, true, 1 << 20, 2, 2, 3, 4, false},  // buffer larger than the file
+      {CT_FLOAT32, false, 0, 0, 1, 0, kWidePixels, false},   // the first line
+      {CT_FLOAT64, true, 64, 5, 1, 8, 1, false},             // the last sample
+      {CT_INT16, false, 0, 1, 3, 0, 0, true},
+      {CT_DOUBLE_COMPLEX, false, 4096, 3, 2, 0, 0, true},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE("type " + std::to_string(c.type) + " buffer " + std::to_string(c.buffer) +
+                 (c.prefixes ? " prefixes" : " samples"));
+    const std::string path = Path("raster");
+    std::string expected = MakeRaster(c.type, c.big, kWideLines, kWidePixels);
+    WriteFile(path, expected);
+    const int64_t size = cell_type_size(c.type);
+    const int64_t line = kPrefix + kWidePixels * size;
+    std::string window;
+    for (int k = c.firstLine; k < c.firstLine + c.numLines; ++k) {
+      const size_t at = static_cast<size_t>(kOffset + k * line);
+      if (c.prefixes) {
+        const std::string prefix(kPrefix, static_cast<char>('a' + k));
+        expected.replace(at, kPrefix, prefix);
+        window += prefix;
+      } else {
+        expected.replace(at + kPrefix + c.firstSample * size, c.numSamples * size,
+                         Samples(c.type, c.big, k + 100, c.firstSample, c.numSamples));
+        window += Samples(c.type, false, k + 100, c.firstSample, c.numSamples);
+      }
+    }
+
+    DataFile df;
+    Describe(&df, path, c.type, c.big, kWideLines, kWidePixels);
+    df.set_buffer_size(c.buffer);
+    BufferIO io(&df);
+    io.first_line = c.firstLine;
+    io.num_lines = c.numLines;
+    io.first_sample = c.firstSample;
+    io.num_samples = c.numSamples;
+    io.output_type = c.type;
+    ASSERT_FALSE(df.is_open());
+    ASSERT_EQ(c.prefixes ? io.writeprefix(window.data()) : io.writebuffer(window.data()), 0);
+    ASSERT_EQ(df.close(), 0);
+    EXPECT_EQ(ReadFile(path), expected);
+  }
+  // A raster that does not exist yet is created.
+  DataFile df;
+  Describe(&df, Path("new"), CT_INT16, false, 1, 2);
+  BufferIO io(&df);
+  io.num_lines = 1;
+  io.num_samples = 2;
+  io.output_type = CT_INT16;
+  const std::string samples = Samples(CT_INT16, false, 0, 0, 2);
+  ASSERT_EQ(io.writebuffer(samples.data()), 0);
+  ASSERT_EQ(df.close(), 0);
+  EXPECT_EQ(ReadFile(Path("new")), std::string(kOffset + kPrefix, '\0') + samples);
 }
 
 TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {
