@@ -52,6 +52,13 @@ int find_aux(const char* product, const char* directory, const char* type, std::
   VLR_REPORT(NVLR_UTILITY_Format("Searching %s", type).c_str(), 2);
   VLR_REPORT(NVLR_UTILITY_Format("WS0Date : %f", productDate).c_str(), 2);
   VLR_REPORT(NVLR_UTILITY_Format("ASA AUX file : %s", list.c_str()).c_str(), 2);
+  // The parameter-file reader takes a missing file for an empty one: a list
+  // that cannot be opened is told apart here.
+  if (FILE* l = std::fopen(list.c_str(), "r")) {
+    std::fclose(l);
+  } else {
+    VLR_FAIL("File not opened!", 9);
+  }
 
   for (int n = 0;; ++n) {
     const std::string section = NVLR_UTILITY_Format("%s_%d", type, n);

@@ -167,6 +167,12 @@ TEST_F(AuxList, AProductWithoutASensingStartDateFails) {
   }
 }
 
+TEST_F(AuxList, AMissingListIsNotOpened) {
+  std::string result = "unset";
+  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 9);
+  EXPECT_EQ(result, "unset");
+}
+
 TEST_F(AuxList, AListBeyondTheSizeLimitIsNotRead) {
   const std::string list =
       section(0, "01-JAN-2008", "01-JAN-2009", "FileName = ASA_XCA_good\n") + "\n";
