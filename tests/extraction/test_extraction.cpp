@@ -231,14 +231,21 @@ TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
     geoCoords_Obj gc;
     ASSERT_EQ(gc.readhdr(hdr.c_str()), 0);
     const bool ascending = Text(run, "Scene", "Pass") == "ASCENDING";
-    const geopoint& firstNear = ascending ? gc.SouthWest : gc.NorthEast;
-    const geopoint& lastFar = ascending ? gc.NorthEast : gc.SouthWest;
-    EXPECT_LT(Distance(firstNear.latitude, firstNear.longitude, Value(run, s, "FirstNearLat"),
-                       Value(run, s, "FirstNearLon")),
-              1.0);
-    EXPECT_LT(Distance(lastFar.latitude, lastFar.longitude, Value(run, s, "LastFarLat"),
-                       Value(run, s, "LastFarLon")),
-              1.0);
+    // A right-looking radar sees the west at near range on an ascending pass.
+    const struct {
+      const geopoint& point;
+      const char* truth;
+    } corners[] = {{ascending ? gc.SouthWest : gc.NorthEast, "FirstNear"},
+                   {ascending ? gc.SouthEast : gc.NorthWest, "FirstFar"},
+                   {ascending ? gc.NorthWest : gc.SouthEast, "LastNear"},
+                   {ascending ? gc.NorthEast : gc.SouthWest, "LastFar"}};
+    for (const auto& c : corners) {
+      EXPECT_LT(
+          Distance(c.point.latitude, c.point.longitude, Value(run, s, std::string(c.truth) + "Lat"),
+                   Value(run, s, std::string(c.truth) + "Lon")),
+          1.0)
+          << c.truth;
+    }
     // The centre lies at the middle sample and half the bursts' cycles after
     // the first line; the orbit geometry (checked against the generator on
     // its own) gives the point there.
