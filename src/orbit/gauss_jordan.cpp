@@ -1,10 +1,13 @@
 #include "orbit/gauss_jordan.h"
 
 #include <cmath>
+#include <new>
+#include <stdexcept>
 #include <utility>
 #include <vector>
 
 #include "runtime/call_scope.h"
+#include "runtime/error_codes.h"
 
 namespace {
 
@@ -16,7 +19,16 @@ int ldgaussj(double* a, int n, double* b) {
   VLR_SCOPE("ldgaussj", kModule);
   if (n < 1) VLR_FAIL("Singular matrix in ldgaussj", 1);
   const size_t un = static_cast<size_t>(n);
-  std::vector<int> indxc(un), indxr(un), ipiv(un, 0);
+  std::vector<int> indxc, indxr, ipiv;
+  try {
+    indxc.resize(un);
+    indxr.resize(un);
+    ipiv.assign(un, 0);
+  } catch (const std::bad_alloc&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  } catch (const std::length_error&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  }
   auto at = [a, un](int r, int c) -> double& { return a[static_cast<size_t>(r) * un + c]; };
   for (int i = 0; i < n; ++i) {
     // Full pivoting: the largest element among the rows and columns not yet used.

@@ -10,7 +10,8 @@ int GetStateVectorsENVI(const char* path, double t0, double dt, int n, double* p
                         double* velocities);
 
 // SVCreate(t0, dt, n) on sv, the vectors from the DORIS file, then
-// SVPolyCompute.  0 or the first failing code.
+// SVPolyCompute.  0 or the first failing code (1 from SVPolyCompute with
+// more than kMaxFitStateVectors vectors; sv then holds them unfitted).
 int GetStateVectorsENVI(const char* path, double t0, double dt, int n,
                         SAROrbitStateVectors_Obj* sv);
 

@@ -41,12 +41,80 @@ class OrbitFile {
   std::FILE* f_;
 };
 
+// The time of record j of the data set at dataSetOffset.  False when the
+// record cannot be read or its date text is malformed.
+bool read_record_time(std::FILE* f, int64_t dataSetOffset, int j, double* t) {
+  char text[kDorisRecordTime.width];
+  const int64_t at = dataSetOffset + static_cast<int64_t>(kDorisRecordSize) * j +
+                     static_cast<int64_t>(kDorisRecordTime.offset);
+  return fseeko(f, static_cast<off_t>(at), SEEK_SET) == 0 &&
+         std::fread(text, 1, sizeof text, f) == sizeof text &&
+         parse_doris_time(text, sizeof text, t);
+}
+
+// Interpolates the n vectors at tc + (i - (n-1)/2) dt, each from the nine
+// records around its own time: the window whose fifth record is the first
+// at or after the vector's time, clamped at the file's ends.  One window
+// serves only the minutes around its centre; beyond them the nine-point
+// formula extrapolates and leaves the orbit by decimetres to hundreds of
+// metres.  `first` is the first record at or after tc and `firstTime` its
+// time; the window of that record is loaded.
+int interpolate_grid(std::FILE* f, int64_t dataSetOffset, int numRecords, int first,
+                     double firstTime, double tc, int n, double dt, double* pos, double* vel) {
+  VLR_SCOPE("interpolate_grid", kModule);
+  // Record j is the first at or after the vector's time (numRecords when
+  // none is); tj is the time of record min(j, numRecords - 1).
+  int j = first;
+  double tj = firstTime;
+  int loaded = first + 1;
+  for (int i = 0; i < n; ++i) {
+    const double t = tc + (i - (n - 1) * 0.5) * dt;
+    while (j < numRecords && tj < t) {
+      if (++j == numRecords) break;
+      double next = 0.0;
+      if (!read_record_time(f, dataSetOffset, j, &next)) {
+        VLR_REPORT("Malformed orbit record", ARE_ERROR);
+        VLR_FAIL("File reading failed!", 4);
+      }
+      if (!(next > tj)) {
+        VLR_REPORT("Orbit records are not in time order", ARE_ERROR);
+        VLR_FAIL("File reading failed!", 4);
+      }
+      tj = next;
+    }
+    while (j > 0) {
+      double before = 0.0;
+      if (!read_record_time(f, dataSetOffset, j - 1, &before)) {
+        VLR_REPORT("Malformed orbit record", ARE_ERROR);
+        VLR_FAIL("File reading failed!", 4);
+      }
+      if (j < numRecords && !(before < tj)) {
+        VLR_REPORT("Orbit records are not in time order", ARE_ERROR);
+        VLR_FAIL("File reading failed!", 4);
+      }
+      if (before < t) break;
+      --j;
+      tj = before;
+    }
+    // k counts the records up to and including record j, as the scan does.
+    const int k = j < numRecords ? j + 1 : numRecords;
+    if (k != loaded) {
+      VLR_CALL(read_SVs(k, numRecords, f, dataSetOffset));
+      loaded = k;
+    }
+    VLR_CALL(interp_orb_point(t, 'p', pos + 3 * i));
+    if (vel != nullptr) VLR_CALL(interp_orb_point(t, 'v', vel + 3 * i));
+  }
+  return 0;
+}
+
 }  // namespace
 
 int interp_orb_l(const char* path, double tc, int n, double dt, double* pos, double* vel,
                  int* orbitOut, int wantAnx, double* anxOut) {
   VLR_SCOPE("interp_orb_l", kModule);
-  if (n < 0 || (n > 0 && pos == nullptr) || (wantAnx == 1 && anxOut == nullptr))
+  if (n < 0 || (n > 0 && pos == nullptr) || (n > 1 && !std::isfinite(dt)) ||
+      (wantAnx == 1 && anxOut == nullptr))
     VLR_FAIL("Invalid orbit request", 1);
   OrbitFile file(path);
   std::FILE* f = file.get();
@@ -126,11 +194,7 @@ int interp_orb_l(const char* path, double tc, int n, double dt, double* pos, dou
     *orbitOut = tc - previous.time < current.time - tc ? previous.orbit : current.orbit;
 
   VLR_CALL(read_SVs(k, numRecords, f, ds.offset));
-  for (int i = 0; i < n; ++i) {
-    const double t = tc + (i - (n - 1) * 0.5) * dt;
-    VLR_CALL(interp_orb_point(t, 'p', pos + 3 * i));
-    if (vel != nullptr) VLR_CALL(interp_orb_point(t, 'v', vel + 3 * i));
-  }
+  VLR_CALL(interpolate_grid(f, ds.offset, numRecords, k - 1, current.time, tc, n, dt, pos, vel));
 
   if (wantAnx == 1) {
     *anxOut = 0.0;

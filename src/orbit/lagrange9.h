@@ -2,10 +2,12 @@
 #pragma once
 
 // The value at time t of the Lagrange polynomial through nine samples (three
-// components each) at the times T[0..8].  The times are normalised to
-// (T - T[0]) / (T[1] - T[0]) and taken as equally spaced: the weights are the
-// fixed node products of nine equally spaced nodes.  A time that falls on a
-// node returns that node's sample unchanged.
+// components each) at the increasing times T[0..8].  The times are
+// normalised to (T - T[0]) / (T[1] - T[0]) and the node weights are computed
+// from the actual times, so nodes that are not exactly equally spaced are
+// interpolated correctly (for equally spaced nodes the weights are the fixed
+// products 40320, -5040, 1440, -720, 576, ...).  A time that falls on a node
+// returns that node's sample unchanged.
 void lagrange9(const double values[9][3], const double times[9], double t, double out[3]);
 
 // lagrange9 for k output times t[0..k-1] into out[0..k-1].

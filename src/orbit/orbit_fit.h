@@ -5,7 +5,8 @@
 // pos[3i + a] at the times t0 + i dt (i = 0 .. m-1), stores coefficient k
 // (ascending) at cpos[3k + a] and the sum of squared residuals at
 // ssePos[a]; the same for vel into cvel and sseVel when vel is not null.
-// cvel, ssePos and sseVel may be null when not wanted.  0 or the fit's code.
+// cvel, ssePos and sseVel may be null when not wanted.  0 or the fit's code
+// (7 when memory runs out).
 int orbffit(const double* pos, const double* vel, double t0, double dt, int m, double* cpos,
             double* cvel, int ncoef, double* ssePos, double* sseVel);
 

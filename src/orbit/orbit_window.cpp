@@ -11,9 +11,11 @@ namespace {
 
 constexpr const char* kModule = "interp_orb";
 
-// The interpolation weights take the records as equally spaced; a window
-// whose spacings differ from their mean by more than this fraction is
-// refused (a leap second changes a 60 s spacing by less than 2 %).
+// The interpolation weights follow the actual record times, so a record
+// somewhat early or late is interpolated correctly.  A spacing that differs
+// from the window's mean by more than this fraction means a record is
+// missing or misplaced (a leap second changes a 60 s spacing by less than
+// 2 %): such a file is refused.
 constexpr double kSpacingTolerance = 0.05;
 
 struct OrbitWindow {

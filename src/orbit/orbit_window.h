@@ -11,12 +11,13 @@
 // k > numRecords - 5, else k - 5 (so that record k - 1 is the fifth).  The
 // data set starts at dataSetOffset and holds numRecords records.
 // 0; 4 "File reading failed!" when fewer than nine records exist, a record
-// cannot be read or is malformed, or the times are not increasing and
-// equally spaced.  A failed load empties the window.
+// cannot be read or is malformed, or the times are not increasing or a
+// spacing differs from the window's mean by more than 5 % (a record missing
+// or misplaced).  A failed load empties the window.
 int read_SVs(int k, int numRecords, std::FILE* file, int64_t dataSetOffset);
 
 // Position ('p') or velocity ('v') at sec85 time t from the window by
-// nine-point Lagrange interpolation.  0; 1 when the window is empty or
+// nine-point Lagrange interpolation at the records' actual times.  0; 1 when the window is empty or
 // `which` is neither 'p' nor 'v'.
 int interp_orb_point(double t, char which, double out[3]);
 

@@ -1,10 +1,13 @@
 #include "orbit/poly_fit.h"
 
 #include <cmath>
+#include <new>
+#include <stdexcept>
 #include <vector>
 
 #include "orbit/gauss_jordan.h"
 #include "runtime/call_scope.h"
+#include "runtime/error_codes.h"
 
 namespace {
 
@@ -33,7 +36,17 @@ int dpolfit(const double* x, const double* y, int m, double* coef, int d) {
   for (int i = 0; i < m; ++i) scale = std::fmax(scale, std::fabs(x[i]));
   if (!(scale > 0.0) || !std::isfinite(scale)) scale = 1.0;
   // Power sums: sums[p] = sum of u^p for p = 0 .. 2d; rhs[j] = sum of u^j y.
-  std::vector<double> sums(2 * unc - 1, 0.0), rhs(unc, 0.0), normal(unc * unc);
+  // The sizes follow the degree, which may come from a file's count.
+  std::vector<double> sums, rhs, normal;
+  try {
+    sums.assign(2 * unc - 1, 0.0);
+    rhs.assign(unc, 0.0);
+    normal.resize(unc * unc);
+  } catch (const std::bad_alloc&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  } catch (const std::length_error&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  }
   for (int i = 0; i < m; ++i) {
     const double u = x[i] / scale;
     const double r = y[i] - (a0 + a1 * x[i]);
@@ -62,7 +75,15 @@ int dpolfit(const double* x, const double* y, int m, double* coef, int d) {
 int polfit(const double* x, const double* y, int m, double* coef, int d) {
   VLR_SCOPE("polfit", kModule);
   if (m < 1) VLR_FAIL("Too few points for the polynomial degree", 1);
-  const std::vector<double> xs(x, x + m), ys(y, y + m);
+  std::vector<double> xs, ys;
+  try {
+    xs.assign(x, x + m);
+    ys.assign(y, y + m);
+  } catch (const std::bad_alloc&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  } catch (const std::length_error&) {
+    VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+  }
   VLR_CALL(dpolfit(xs.data(), ys.data(), m, coef, d));
   return 0;
 }

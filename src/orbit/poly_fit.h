@@ -3,8 +3,8 @@
 #pragma once
 
 // Degree-d least-squares polynomial through the m points (x, y) from the
-// normal equations; coef receives d + 1 coefficients.  0, or 1 when d < 0,
-// m < d + 1 or the normal matrix is singular.
+// normal equations; coef receives d + 1 coefficients.  0; 1 when d < 0,
+// m < d + 1 or the normal matrix is singular; 7 when memory runs out.
 int dpolfit(const double* x, const double* y, int m, double* coef, int d);
 
 // dpolfit on copies of x and y.

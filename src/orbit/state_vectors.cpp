@@ -1,5 +1,7 @@
 #include "orbit/state_vectors.h"
 
+#include <cstdio>
+
 #include "orbit/gr_pt_lat_lon.h"
 #include "orbit/orbit_fit.h"
 #include "orbit/orbit_poly.h"
@@ -50,6 +52,13 @@ int SAROrbitStateVectors_Obj::SVPolyCompute() {
   VLR_SCOPE("SAROrbitStateVectors_Obj::SVPolyCompute", kModule);
   fitted_ = false;
   if (positions_.empty() || n_ < 1) VLR_FAIL("No state vectors", vlr::kLibInconsistent);
+  if (n_ > kMaxFitStateVectors) {
+    char text[160];
+    std::snprintf(text, sizeof text,
+                  "%d state vectors are too many for one orbit polynomial (at most %d)", n_,
+                  kMaxFitStateVectors);
+    VLR_FAIL(text, vlr::kLibInconsistent);
+  }
   VLR_CALL(orb_interp(0.0, positions_.data(), dt_, polys_[0].data(), polys_[1].data(),
                       polys_[2].data(), n_));
   VLR_CALL(orb_interp(0.0, velocities_.data(), dt_, polys_[3].data(), polys_[4].data(),
@@ -133,6 +142,14 @@ int SAROrbitStateVectors_Obj::clone(SAROrbitStateVectors_Obj* dst) const {
   VLR_CALL(dst->SVCreate(t0_, dt_, n_));
   dst->copyVectorsFrom(*this);
   dst->lookSign_ = lookSign_;
+  if (n_ > kMaxFitStateVectors) {
+    char text[160];
+    std::snprintf(text, sizeof text,
+                  "%d state vectors copied without their orbit polynomial (at most %d are fitted)",
+                  n_, kMaxFitStateVectors);
+    VLR_REPORT(text, ARE_WARNING);
+    return 0;
+  }
   VLR_CALL(dst->SVPolyCompute());
   return 0;
 }

@@ -153,10 +153,14 @@ class ScratchTest : public ::testing::Test {
   std::string path(const std::string& name) const { return dir_ + "/" + name; }
 
   // Writes header and records; the record count written is `count`, or the
-  // number of records when count < 0.
+  // number of records when count < 0, and the data set size agrees with it.
   std::string WriteDoris(const std::string& name, std::string header,
                          const std::vector<std::string>& records, long long count = -1) {
-    SetHeaderValue(&header, "NUM_DSR", CountText(count < 0 ? (long long)records.size() : count));
+    const long long n = count < 0 ? (long long)records.size() : count;
+    SetHeaderValue(&header, "NUM_DSR", CountText(n));
+    char size[32];
+    std::snprintf(size, sizeof size, "%+021lld", n * (long long)kRecordSize);
+    SetHeaderValue(&header, "DS_SIZE", size);
     std::string text = header;
     for (const std::string& r : records) text += r;
     const std::string file = path(name);

@@ -97,6 +97,40 @@ TEST_F(BadDoris, RecordsOutOfTimeOrderGive4) {
   EXPECT_EQ(read(WriteDoris("gap", vor_.header, gap), time(18)), 4);
 }
 
+// Every vector of a long grid reads the records around its own time, so
+// damage there is found, while a short grid around the same time does not
+// reach it.
+TEST_F(BadDoris, DamageWithinTheGridsReachGives4) {
+  struct Damage {
+    const char* what;
+    int record;
+    size_t offset;
+    std::string text;
+  };
+  const Damage damages[] = {
+      {"a date", 33, 0, "3X"},
+      {"a position", 27, 44, "+649x931.106"},
+      {"a velocity", 31, 109, "++692.698996"},
+  };
+  for (const Damage& d : damages) {
+    std::vector<std::string> damaged = records_;
+    damaged[d.record].replace(d.offset, d.text.size(), d.text);
+    const std::string file = WriteDoris("damaged", vor_.header, damaged);
+    // 41 vectors 30 s apart span records 10 to 30 around record 20.
+    double p[3 * 41], v[3 * 41];
+    EXPECT_EQ(interp_orb_l(file.c_str(), time(20), 41, 30.0, p, v, nullptr, 0, nullptr), 4)
+        << d.what;
+    EXPECT_EQ(read(file, time(20)), 0) << d.what;
+  }
+  // Records out of order after the requested time.
+  std::vector<std::string> swapped = records_;
+  std::swap(swapped[28], swapped[29]);
+  const std::string file = WriteDoris("swapped", vor_.header, swapped);
+  double p[3 * 41];
+  EXPECT_EQ(interp_orb_l(file.c_str(), time(20), 41, 30.0, p, nullptr, nullptr, 0, nullptr), 4);
+  EXPECT_EQ(read(file, time(20)), 0);
+}
+
 TEST_F(BadDoris, TruncatedFilesAndOverstatedCountsGive4) {
   // The last record cut short, the count still claiming it.
   std::vector<std::string> cut = records_;

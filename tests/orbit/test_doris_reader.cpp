@@ -2,8 +2,10 @@
 
 #include <cmath>
 #include <limits>
+#include <utility>
 #include <vector>
 
+#include "orbit/general_sar_orbit.h"
 #include "orbit/get_state_vectors_envi.h"
 #include "orbit/interp_orb_l.h"
 #include "orbit_test_files.h"
@@ -177,6 +179,144 @@ TEST_F(RealOrbit, StateVectorObjectFromTheOrbitFile) {
     for (int a = 0; a < 3; ++a) EXPECT_NEAR(sv.positions()[3 * i + a], rp[a], 0.01);
   }
   EXPECT_EQ(GetStateVectorsENVI(kVor.c_str(), records().front().t - 100.0, 5.0, 9, &sv), 13);
+}
+
+// The vectors of a scene's grid, 5 s apart, each come from the records
+// around their own time: a vector at a record's time is that record, the
+// others agree with the independent interpolation, over scenes of a minute
+// to half an hour and where the grid reaches the first or last record.
+TEST_F(RealOrbit, SceneGridsFollowTheRecordsOverTheirWholeLength) {
+  const double first = records().front().t, last = records().back().t;
+  const double middle = records()[700].t;
+  const struct {
+    const char* what;
+    double duration;
+    double t0;     // first vector of the grid, or
+    double tLast;  // last vector of the grid when t0 is 0
+  } scenes[] = {
+      {"one minute", 60.0, middle, 0.0},
+      {"ten minutes", 600.0, middle, 0.0},
+      {"half an hour", 1800.0, middle, 0.0},
+      {"half an hour from the first record", 1800.0, first, 0.0},
+      {"half an hour up to the last record", 1800.0, 0.0, last},
+  };
+  for (const auto& s : scenes) {
+    double unused = 0.0, dt = 0.0;
+    int n = 0;
+    ASSERT_EQ(StateVectorGridENVI(0.0, s.duration, &unused, &dt, &n), 0);
+    // The grid starts 0.2 duration before the scene.
+    const double t0 = s.t0 != 0.0 ? s.t0 : s.tLast - (n - 1) * dt;
+    GeneralSAROrbit o;
+    ASSERT_EQ(o.GetStateVectorsENVI(kVor.c_str(), t0 + 0.2 * s.duration, s.duration), 0) << s.what;
+    ASSERT_EQ(o.n(), n) << s.what;
+    ASSERT_EQ(o.t0(), t0) << s.what;
+    double worstP = 0.0, worstV = 0.0;
+    int onRecords = 0;
+    for (int i = 0; i < n; ++i) {
+      const double t = t0 + i * dt;
+      const double* p = o.positions() + 3 * i;
+      const double* v = o.velocities() + 3 * i;
+      const Record* on = nullptr;
+      for (const Record& r : records())
+        if (r.t == t) on = &r;
+      if (on != nullptr) {
+        ++onRecords;
+        for (int a = 0; a < 3; ++a) {
+          EXPECT_EQ(p[a], on->p[a]) << s.what << ", vector " << i;
+          EXPECT_EQ(v[a], on->v[a]) << s.what << ", vector " << i;
+        }
+        continue;
+      }
+      double rp[3], rv[3];
+      Reference(t, rp, rv);
+      for (int a = 0; a < 3; ++a) {
+        worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+        worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+      }
+    }
+    EXPECT_GE(onRecords, (n - 1) / 12) << s.what;
+    EXPECT_LT(worstP, 0.01) << s.what;
+    EXPECT_LT(worstV, 1e-3) << s.what;
+  }
+}
+
+// DORIS files written from the closed-form orbit with records at chosen
+// times.
+class ClosedFormDoris : public ScratchTest {
+ protected:
+  void SetUp() override {
+    ScratchTest::SetUp();
+    real_ = SplitDoris(kVor);
+    const size_t at = real_.header.find("SENSING_START=\"");
+    ASSERT_NE(at, std::string::npos);
+    start_ = ascii2sec85(real_.header.substr(at + 15, 27).c_str());
+    orbit_.tNode = start_ - 1000.0;
+  }
+
+  // Record i of 40, 60 s apart from the sensing start, `late` seconds off
+  // its nominal time; its state vector is the orbit's at the time it
+  // states (positions to the millimetre, velocities to the micrometre per
+  // second, as the real records).
+  std::string WriteRecords(const std::string& name, const std::vector<double>& late) {
+    std::vector<std::string> records;
+    for (int i = 0; i < 40; ++i) {
+      const double t = start_ + 60.0 * i + late[i];
+      std::string r = real_.records[0];
+      char text[32];
+      EXPECT_EQ(sec852myascii(t, text), 0);
+      r.replace(0, 27, text);
+      double p[3], v[3];
+      orbit_.at(t, p, v);
+      for (int a = 0; a < 3; ++a) {
+        std::snprintf(text, sizeof text, "%+012.3f", p[a]);
+        r.replace(44 + 13 * a, 12, text);
+        std::snprintf(text, sizeof text, "%+012.6f", v[a]);
+        r.replace(83 + 13 * a, 12, text);
+      }
+      EXPECT_EQ(ParseRecord(r).t, t);
+      records.push_back(r);
+    }
+    return WriteDoris(name, real_.header, records);
+  }
+
+  DorisText real_;
+  double start_ = 0.0;
+  CircularOrbit orbit_;
+};
+
+// The nine-point formula weights each record for the time it states: a
+// record early or late (within the 5 % the reader accepts) moves nothing
+// off the orbit.
+TEST_F(ClosedFormDoris, RecordsOffTheirNominalTimesAreWeightedWhereTheyLie) {
+  const struct {
+    const char* what;
+    std::vector<std::pair<int, double>> late;  // record, seconds late
+  } files[] = {
+      {"equally spaced", {}},
+      {"one record a second late", {{20, 1.0}}},
+      {"one record half a millisecond early", {{20, -0.0005}}},
+      {"two records two seconds off", {{18, 2.0}, {21, -2.0}}},
+  };
+  for (const auto& f : files) {
+    std::vector<double> late(40, 0.0);
+    for (const auto& l : f.late) late[l.first] = l.second;
+    const std::string file = WriteRecords("closed_form", late);
+    double worstP = 0.0, worstV = 0.0;
+    std::vector<double> times = {start_ + 60.0 * 20 + late[20]};
+    for (double t = start_ + 60.0 * 14; t <= start_ + 60.0 * 26; t += 6.1) times.push_back(t);
+    for (double t : times) {
+      double p[3], v[3], rp[3], rv[3];
+      ASSERT_EQ(interp_orb_l(file.c_str(), t, 1, 0.0, p, v, nullptr, 0, nullptr), 0) << f.what;
+      orbit_.at(t, rp, rv);
+      for (int a = 0; a < 3; ++a) {
+        worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+        worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+      }
+    }
+    // The records' rounding (0.5 mm, 0.5 um/s) bounds the agreement.
+    EXPECT_LT(worstP, 3e-3) << f.what;
+    EXPECT_LT(worstV, 3e-6) << f.what;
+  }
 }
 
 // Scenes shorter than three spacings get the five vectors centred on them.

@@ -1,7 +1,9 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstring>
 #include <string>
+#include <vector>
 
 #include "orbit/earth_constants.h"
 #include "orbit/geodetic.h"
@@ -133,6 +135,53 @@ TEST_F(StateVectorHeaders, LegacyKeys) {
   SAROrbitStateVectors_Obj back;
   ASSERT_EQ(back.readhdr(xml.c_str()), 0);
   EXPECT_EQ(back.velocities()[5], -6.0);
+}
+
+// A header may hold far more vectors than one polynomial can follow (a long
+// scene's orbit, or any count up to the largest a header may declare).  They
+// are read and copied exactly; the polynomial is refused with a code rather
+// than fitted at a degree where it is kilometres off, takes minutes or
+// exhausts memory.  Up to the limit the fit follows the orbit.
+TEST_F(StateVectorHeaders, LongOrbitsAreKeptButNotFittedByOnePolynomial) {
+  const CircularOrbit orbit;
+  const double t0 = orbit.tNode + 200.0, dt = 5.0;
+  {
+    SAROrbitStateVectors_Obj sv;
+    Sample(orbit, t0, dt, kMaxFitStateVectors, &sv);
+    ASSERT_EQ(sv.SVPolyCompute(), 0);
+    std::vector<double> times;
+    for (double s = 0.0; s <= (kMaxFitStateVectors - 1) * dt; s += 0.77) times.push_back(t0 + s);
+    double worstP = 0.0, worstV = 0.0;
+    WorstErrors(orbit, &sv, times, &worstP, &worstV);
+    EXPECT_LT(worstP, 0.2);
+    EXPECT_LT(worstV, 2e-4);
+  }
+  for (int n : {kMaxFitStateVectors + 1, 1500, kMaxStateVectors}) {
+    SAROrbitStateVectors_Obj written;
+    Sample(orbit, t0, dt, n, &written);
+    // The longest is built in memory only: its header would be large.
+    SAROrbitStateVectors_Obj read;
+    SAROrbitStateVectors_Obj* sv = &written;
+    if (n < kMaxStateVectors) {
+      const std::string file = path("long" + std::to_string(n) + ".xml");
+      ASSERT_EQ(written.writehdr(file.c_str()), 0);
+      ASSERT_EQ(read.readhdr(file.c_str()), 0) << n;
+      sv = &read;
+    }
+    ASSERT_EQ(sv->n(), n);
+    const size_t bytes = 3 * static_cast<size_t>(n) * sizeof(double);
+    EXPECT_EQ(std::memcmp(sv->positions(), written.positions(), bytes), 0) << n;
+    EXPECT_EQ(std::memcmp(sv->velocities(), written.velocities(), bytes), 0) << n;
+    EXPECT_EQ(sv->SVPolyCompute(), 1) << n;
+    double p[3];
+    EXPECT_EQ(sv->SVGetPos(t0, p), 1) << n;
+    SAROrbitStateVectors_Obj copy;
+    ASSERT_EQ(sv->clone(&copy), 0) << n;
+    ASSERT_EQ(copy.n(), n);
+    EXPECT_FALSE(copy.isFitted()) << n;
+    EXPECT_EQ(std::memcmp(copy.positions(), written.positions(), bytes), 0) << n;
+    EXPECT_EQ(std::memcmp(copy.velocities(), written.velocities(), bytes), 0) << n;
+  }
 }
 
 TEST_F(StateVectorHeaders, IncompleteOrInvalidHeaders) {

@@ -2,12 +2,13 @@
 // enables, write and read back, clones, damaged headers, and the equivalent
 // speed and distance of an image.
 #include <cmath>
+#include <cstring>
 #include <set>
 #include <string>
 
+#include "metadata_fixture.h"
 #include "sar_container/general_sar.h"
 #include "sar_container/image_sar_data.h"
-#include "metadata_fixture.h"
 #include "section_fields.h"
 
 namespace {
@@ -195,6 +196,48 @@ TEST_F(SarContainer, MissingDamagedAndHostileHeaders) {
   for (const Hostile& h : cases) {
     ASSERT_EQ(gs.GSread(edited(good, h.from, h.to).c_str()), 0);
     EXPECT_EQ(enabledSet(gs), allBut(h.off)) << h.to;
+  }
+}
+
+// A header may declare up to 100000 state vectors (a long scene's orbit, or
+// a hostile count), which both orbit sections hold as read.  A clone of the
+// container copies them whole, its orbit model follows the orbit, and no
+// single polynomial is fitted through them all.
+TEST_F(SarContainer, LongOrbitsCloneWhole) {
+  const double r = 7.07e6, w = 7500.0 / r, inc = 98.5 * M_PI / 180.0;
+  const auto at = [&](double t, double* p, double* v) {
+    const double a = 0.3 + w * (t - 1000.0), c = std::cos(inc), s = std::sin(inc);
+    const double pv[6] = {r * std::cos(a),      r * std::sin(a) * c,     r * std::sin(a) * s,
+                          -r * w * std::sin(a), r * w * std::cos(a) * c, r * w * std::cos(a) * s};
+    for (int k = 0; k < 3; ++k) p[k] = pv[k], v[k] = pv[3 + k];
+  };
+  const int n = kMaxStateVectors;
+  const double dt = 5.0;
+  GeneralSAR src;
+  ASSERT_EQ(src.orbit.SVCreate(1000.0, dt, n), 0);
+  ASSERT_EQ(src.stateVectors.SVCreate(1000.0, dt, n), 0);
+  for (int i = 0; i < n; ++i) {
+    at(1000.0 + i * dt, src.orbit.positions() + 3 * i, src.orbit.velocities() + 3 * i);
+    at(1000.0 + i * dt, src.stateVectors.positions() + 3 * i,
+       src.stateVectors.velocities() + 3 * i);
+  }
+  ASSERT_EQ(src.orbit.computeApproximateSV(), 0);
+  enableOnly(src, {GS::GS_STATEVECTORS, GS::GS_ORBIT});
+
+  GeneralSAR copy;
+  ASSERT_EQ(src.GSclone(&copy), 0);
+  ASSERT_EQ(enabledSet(copy), enabledSet(src));
+  const size_t bytes = 3 * static_cast<size_t>(n) * sizeof(double);
+  ASSERT_EQ(copy.stateVectors.n(), n);
+  EXPECT_EQ(std::memcmp(copy.stateVectors.positions(), src.orbit.positions(), bytes), 0);
+  EXPECT_EQ(std::memcmp(copy.stateVectors.velocities(), src.orbit.velocities(), bytes), 0);
+  EXPECT_FALSE(copy.stateVectors.isFitted());
+  ASSERT_EQ(copy.orbit.n(), n);
+  for (double t : {1002.5, 251234.5, 1000.0 + (n - 1) * dt - 0.3}) {
+    double p[3], truth[3], v[3];
+    ASSERT_EQ(copy.orbit.SVGetPos(t, p), 0) << t;
+    at(t, truth, v);
+    for (int k = 0; k < 3; ++k) EXPECT_NEAR(p[k], truth[k], 1e-3) << t;
   }
 }
 
