@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <cstring>
 
+#include "extraction/product_file.h"
 #include "raster/byte_order.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
@@ -15,19 +16,6 @@ namespace asar {
 namespace {
 
 constexpr const char* kModule = "images_v2";
-
-// Reads n bytes at `offset`, retrying short and interrupted reads.
-bool ReadAt(int fd, unsigned char* out, size_t n, int64_t offset) {
-  while (n > 0) {
-    const ssize_t got = pread(fd, out, n, static_cast<off_t>(offset));
-    if (got < 0 && errno == EINTR) continue;
-    if (got <= 0) return false;
-    out += got;
-    n -= static_cast<size_t>(got);
-    offset += got;
-  }
-  return true;
-}
 
 }  // namespace
 
@@ -89,7 +77,7 @@ int AnnotationTable::read(int fd, int64_t fileSize, const EnvisatDataSet& ds, si
             .c_str(),
         vlr::kLibAlloc);
   }
-  if (!ReadAt(fd, data_.data(), static_cast<size_t>(bytes), ds.offset)) {
+  if (!ReadFullyAt(fd, data_.data(), static_cast<size_t>(bytes), ds.offset)) {
     release();
     VLR_FAIL("File reading failed!", vlr::kLibRead);
   }

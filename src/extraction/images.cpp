@@ -11,6 +11,7 @@
 #include "envisat/product_header.h"
 #include "extraction/asar_annotation.h"
 #include "extraction/geolocation_polys.h"
+#include "extraction/product_file.h"
 #include "extraction/product_kind.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/geo_coords.h"
@@ -48,14 +49,6 @@ void SetText(char* field, const std::string& text) {
 
 bool Finite(double v) {
   return std::isfinite(v);
-}
-
-// A UTC text as sec85; false when it does not parse.
-bool ParseUtc(const std::string& text, double* t) {
-  DateFields fields;
-  if (text.empty() || date2str(text.c_str(), &fields) != 0) return false;
-  *t = ascii2sec85(text.c_str());
-  return Finite(*t);
 }
 
 }  // namespace
@@ -126,12 +119,8 @@ int images::runSteps(Run& r) {
   }
 
   // Annotation data sets, read whole.
-  const int fd = open(product, O_RDONLY | O_CLOEXEC);
-  if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
-  struct FdCloser {
-    int fd;
-    ~FdCloser() { close(fd); }
-  } closer{fd};
+  const asar::ScopedFd file(open(product, O_RDONLY | O_CLOEXEC));
+  if (!file.valid()) VLR_FAIL("File not opened!", vlr::kLibOpen);
   const struct Table {
     asar::AnnotationTable* table;
     size_t sphOffset;
@@ -145,7 +134,8 @@ int images::runSteps(Run& r) {
       {&r.chirp, layout.chirp, asar::chirp::kMinRecordSize, "CHIRP PARAMS ADS"},
   };
   for (const Table& t : tables) {
-    VLR_CALL(t.table->read(fd, h.fileSize, h.dataSet(t.sphOffset), t.minRecordSize, t.name));
+    VLR_CALL(
+        t.table->read(file.get(), h.fileSize, h.dataSet(t.sphOffset), t.minRecordSize, t.name));
   }
   if (r.mpp.count() == 0) {
     VLR_REPORT("WARNING: A number of 0 MPP is not supported!", ARE_CHECKPOINT);
@@ -191,7 +181,8 @@ int images::runSteps(Run& r) {
   // Sensing start and stop.
   const std::string& startText = kind.sensingFromMph ? h.sensingStart : h.firstLineTime;
   const std::string& stopText = kind.sensingFromMph ? h.sensingStop : h.lastLineTime;
-  if (!ParseUtc(startText, &r.sensingStart) || !ParseUtc(stopText, &r.sensingStop)) {
+  if (!asar::ParseUtcText(startText, &r.sensingStart) ||
+      !asar::ParseUtcText(stopText, &r.sensingStop)) {
     VLR_FAIL("Sensing start or stop time does not parse", vlr::kLibInconsistent);
   }
   VLR_REPORT(NVLR_UTILITY_Format("Sensing start time from SPH: %f\n", r.sensingStart).c_str(),

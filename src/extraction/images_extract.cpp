@@ -11,6 +11,7 @@
 #include "extraction/asar_annotation.h"
 #include "extraction/block_writer.h"
 #include "extraction/images.h"
+#include "extraction/product_file.h"
 #include "raster/buffer_io.h"
 #include "raster/byte_order.h"
 #include "raster/data_file.h"
@@ -45,26 +46,6 @@ bool LineTime(const unsigned char* prefix, double* t) {
   return std::isfinite(*t);
 }
 
-bool ReadPrefix(int fd, int64_t offset, unsigned char* out) {
-  size_t n = asar::mds::kLinePrefixSize;
-  while (n > 0) {
-    const ssize_t got = pread(fd, out, n, static_cast<off_t>(offset));
-    if (got < 0 && errno == EINTR) continue;
-    if (got <= 0) return false;
-    out += got;
-    n -= static_cast<size_t>(got);
-    offset += got;
-  }
-  return true;
-}
-
-bool ParseUtc(const std::string& text, double* t) {
-  DateFields fields;
-  if (text.empty() || date2str(text.c_str(), &fields) != 0) return false;
-  *t = ascii2sec85(text.c_str());
-  return std::isfinite(*t);
-}
-
 }  // namespace
 
 int get_first_last(const char* product, int64_t offset, int64_t recordSize, int64_t count,
@@ -84,35 +65,33 @@ int get_first_last(const char* product, int64_t offset, int64_t recordSize, int6
                            static_cast<double>(r % burstLines) * dt
                      : static_cast<double>(r) * dt;
   };
-  const int fd = open(product, O_RDONLY | O_CLOEXEC);
-  if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
-  struct FdCloser {
-    int fd;
-    ~FdCloser() { close(fd); }
-  } closer{fd};
+  const asar::ScopedFd file(open(product, O_RDONLY | O_CLOEXEC));
+  if (!file.valid()) VLR_FAIL("File not opened!", vlr::kLibOpen);
 
   unsigned char prefix[asar::mds::kLinePrefixSize];
   double t = 0.0;
   bool found = false;
   for (int64_t r = 0; r < count && !found; ++r) {
-    if (!ReadPrefix(fd, offset + r * recordSize, prefix)) VLR_FAIL("File reading failed!", 4);
+    if (!asar::ReadFullyAt(file.get(), prefix, sizeof prefix, offset + r * recordSize))
+      VLR_FAIL("File reading failed!", 4);
     if (LineTime(prefix, &t)) {
       *first = t - position(r);
       found = true;
     }
   }
-  if (!found && !ParseUtc(timing.firstLineText, first)) {
+  if (!found && !asar::ParseUtcText(timing.firstLineText, first)) {
     VLR_FAIL("No valid line and no first line time", vlr::kLibInconsistent);
   }
   found = false;
   for (int64_t r = count - 1; r >= 0 && !found; --r) {
-    if (!ReadPrefix(fd, offset + r * recordSize, prefix)) VLR_FAIL("File reading failed!", 4);
+    if (!asar::ReadFullyAt(file.get(), prefix, sizeof prefix, offset + r * recordSize))
+      VLR_FAIL("File reading failed!", 4);
     if (LineTime(prefix, &t)) {
       *last = t + position(count - 1) - position(r);
       found = true;
     }
   }
-  if (!found && !ParseUtc(timing.lastLineText, last)) {
+  if (!found && !asar::ParseUtcText(timing.lastLineText, last)) {
     VLR_FAIL("No valid line and no last line time", vlr::kLibInconsistent);
   }
   if (!(*last >= *first)) VLR_FAIL("Last line before the first line", vlr::kLibInconsistent);
@@ -161,14 +140,8 @@ int images::copyImage(int k) {
   }
   in.set_buffer_size(kCopyBufferBytes);
   VLR_CALL(in.open(DataFile::kOpenRead));
-  const int fd = open(rasterNames_[k], O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
-  if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
-  struct FdCloser {
-    int fd;
-    ~FdCloser() {
-      if (fd >= 0) close(fd);
-    }
-  } closer{fd};
+  asar::ScopedFd raster(open(rasterNames_[k], O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644));
+  if (!raster.valid()) VLR_FAIL("File not opened!", vlr::kLibOpen);
 
   BufferIO reader(&in);
   reader.num_samples = d.samples;
@@ -178,7 +151,7 @@ int images::copyImage(int k) {
   int rc = 0;
   uint64_t tickets[kCopyBlocks] = {};
   {
-    BlockWriter writer(fd);
+    BlockWriter writer(raster.get());
     for (int32_t first = 0, b = 0; first < d.lines && rc == 0; first += blockLines, ++b) {
       const int32_t n = std::min(blockLines, d.lines - first);
       char* block = blocks[b % kCopyBlocks].data();
@@ -205,8 +178,7 @@ int images::copyImage(int k) {
   }
   waitbar_close(bar);
   in.close();
-  const int closed = close(fd);
-  closer.fd = -1;
+  const int closed = raster.close();
   if (rc != 0) return rc;
   if (closed != 0) VLR_FAIL("File writing failed!", vlr::kLibWrite);
   VLR_CALL(out.write_hdr());
