@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "extraction/images.h"
+#include "extraction_fixture.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/geo_coords.h"
 #include "metadata_sections/gs_roi.h"
@@ -48,31 +49,6 @@ bool Exists(const std::string& path) {
   struct stat st;
   return stat(path.c_str(), &st) == 0;
 }
-
-// The host's side of the progress protocol: a working file and its
-// "_batch_ok" companion, so that the copy's progress bar can report.
-class HostWorkingFile : public ::testing::Environment {
- public:
-  void SetUp() override {
-    char pattern[] = "/tmp/vlr_extraction_XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    dir_ = pattern;
-    const std::string working = dir_ + "/Process.working";
-    std::FILE* f = std::fopen(working.c_str(), "w");
-    ASSERT_NE(f, nullptr);
-    std::fputs("0\nStarting\n", f);
-    std::fclose(f);
-    f = std::fopen((working + "_batch_ok").c_str(), "w");
-    ASSERT_NE(f, nullptr);
-    std::fclose(f);
-    vlr_detail::suite().workingFile = working;
-  }
-  void TearDown() override { synth_test::shell("rm -rf '" + dir_ + "'"); }
-
- private:
-  std::string dir_;
-};
-::testing::Environment* const kHost = ::testing::AddGlobalTestEnvironment(new HostWorkingFile);
 
 // Runs the extraction of a generated product into <dir>R.
 int Extract(const SynthRun& run, images_conf& conf, images* out, bool withOrbit = true) {

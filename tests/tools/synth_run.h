@@ -40,7 +40,8 @@ double mjd_time(const uint8_t* p);
 // Decimal value of a header field at an offset ("+000123<bytes>" -> 123).
 long long header_number(const std::vector<uint8_t>& file, size_t offset);
 
-// Data set descriptor k (0..17) of a wide-swath product.
+// Data set descriptor k (0..17) of an ASAR image product (wide-swath and
+// image-mode products both have 18 descriptors after the 1059-byte SPH).
 struct Dsd {
   long long offset, size, num, dsr;
 };

@@ -1,6 +1,7 @@
 // GDAL's ENVISAT driver is an independent reader of the format: the headers
-// it reports, the size of the first sub-swath and its samples must be what
-// the generator says it wrote.
+// it reports, the size of the first sub-swath (of every image of an
+// image-mode product) and its samples must be what the generator says it
+// wrote.
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -108,6 +109,71 @@ TEST_P(GdalCrossCheck, HeadersSizeAndSamplesOfTheFirstSubSwath) {
 INSTANTIATE_TEST_SUITE_P(Products, GdalCrossCheck,
                          ::testing::Values("--orbit kepler --seed 7 --pattern points",
                                            "--size small --polarisation VV --pass ascending"));
+
+// Image-mode products: GDAL finds the image-mode header values, one band per
+// image, and every band's samples at the offset the truth gives for it.
+class GdalImageMode : public ::testing::TestWithParam<const char*> {};
+
+TEST_P(GdalImageMode, HeadersBandsAndSamplesOfEveryImage) {
+  if (!have_gdal()) GTEST_SKIP() << "gdal-bin is not installed";
+  const SynthRun run = run_synth(GetParam());
+  ASSERT_EQ(run.exit_code, 0) << read_text(run.dir + "synth.log");
+  const auto& scene = run.truth.at("Scene");
+  const int images = std::stoi(scene.at("Images"));
+  ASSERT_EQ(shell("gdalinfo -nogcp '" + run.product + "' > " + run.dir + "gdalinfo.txt 2>&1"), 0);
+  std::istringstream info(read_text(run.dir + "gdalinfo.txt"));
+  std::map<std::string, std::string> md;
+  std::string line, size_line;
+  int bands = 0;
+  while (std::getline(info, line)) {
+    if (line.rfind("Size is ", 0) == 0) size_line = line;
+    if (line.rfind("Band ", 0) == 0) ++bands;
+    const size_t eq = line.find('=');
+    if (line.rfind("  ", 0) == 0 && eq != std::string::npos)
+      md[line.substr(2, eq - 2)] = trimmed(line.substr(eq + 1));
+  }
+  EXPECT_EQ(md["MPH_PRODUCT"], scene.at("Product"));
+  EXPECT_EQ(md["SPH_SPH_DESCRIPTOR"], scene.at("Descriptor"));
+  EXPECT_EQ(md["SPH_FIRST_LINE_TIME"], scene.at("SensingStartText"));
+  EXPECT_EQ(md["SPH_LAST_LINE_TIME"], scene.at("SensingStopText"));
+  EXPECT_EQ(md["SPH_SWATH"], scene.at("Swath"));
+  EXPECT_EQ(md["SPH_MDS1_TX_RX_POLAR"], run.truth.at("Image1").at("Polarisation"));
+  if (images > 1) {
+    EXPECT_EQ(md["SPH_MDS2_TX_RX_POLAR"], run.truth.at("Image2").at("Polarisation"));
+  }
+  EXPECT_EQ(md["SPH_SAMPLE_TYPE"], "COMPLEX");
+  EXPECT_EQ(md["DS_ORBIT_STATE_VECTOR_1________NAME"], scene.at("OrbitFile"));
+  EXPECT_EQ(bands, images);
+  const std::vector<uint8_t> product = read_file(run.product);
+  for (int k = 1; k <= images; ++k) {
+    const auto& img = run.truth.at("Image" + std::to_string(k));
+    const long long samples = std::stoll(img.at("Samples"));
+    const long long records = std::stoll(img.at("Records"));
+    EXPECT_EQ(size_line, "Size is " + std::to_string(samples) + ", " + std::to_string(records));
+    const std::string raw = run.dir + "band" + std::to_string(k) + ".bin";
+    ASSERT_EQ(shell("gdal_translate -q -ot CFloat32 -of ENVI -b " + std::to_string(k) + " '" +
+                    run.product + "' " + raw + " > /dev/null 2>&1"),
+              0);
+    const std::vector<uint8_t> got = read_file(raw);
+    ASSERT_EQ(got.size(), static_cast<size_t>(samples * records * 8));
+    const long long mds = std::stoll(img.at("MdsOffset"));
+    const long long rec = 17 + 4 * samples;
+    ASSERT_LE(mds + rec * records, static_cast<long long>(product.size()));
+    long long mismatches = 0;
+    for (long long r = 0; r < records; ++r)
+      for (long long s = 0; s < 2 * samples; ++s) {
+        float f;
+        std::memcpy(&f, &got[(r * 2 * samples + s) * 4], 4);
+        if (f != static_cast<float>(be16(&product[mds + r * rec + 17 + 2 * s]))) ++mismatches;
+      }
+    EXPECT_EQ(mismatches, 0) << "band " << k;
+  }
+  remove_run(run);
+}
+
+INSTANTIATE_TEST_SUITE_P(Products, GdalImageMode,
+                         ::testing::Values("--product IMS --orbit kepler --pattern points",
+                                           "--product APS --size small --pass ascending"));
 
 }  // namespace
 }  // namespace synth_test

@@ -1,5 +1,6 @@
-// envisat_synth: writes a synthetic ENVISAT ASAR wide-swath SLC product with
-// its orbit and auxiliary files, and the ground truth a reader must find.
+// envisat_synth: writes a synthetic ENVISAT ASAR SLC product (wide swath,
+// image mode or alternating polarisation) with its orbit and auxiliary
+// files, and the ground truth a reader must find.
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
@@ -18,22 +19,33 @@ namespace {
 const char* kHelp =
     "usage: envisat_synth --out DIR [options]\n"
     "\n"
-    "Writes into DIR an ASA_WSS_1P product (five sub-swaths of ScanSAR bursts), the\n"
-    "DORIS orbit file it follows, an ASA_XCA and an ASA_INS file valid at the scene\n"
-    "time, ASA_AUX_list.dat listing them, and synth_truth.txt.  Same options and seed\n"
-    "give byte-identical files.\n"
+    "Writes into DIR an ASAR SLC product (by default ASA_WSS_1P, five sub-swaths of\n"
+    "ScanSAR bursts), the DORIS orbit file it follows, an ASA_XCA and an ASA_INS file\n"
+    "valid at the scene time, ASA_AUX_list.dat listing them, and synth_truth.txt.\n"
+    "Same options and seed give byte-identical files.\n"
     "\n"
     "options:\n"
+    "  --product P          WSS | IMS | APS (default WSS)\n"
+    "                         WSS: wide-swath SLC, five sub-swaths of bursts\n"
+    "                         IMS: image-mode SLC of swath IS2, one image (MDS1)\n"
+    "                         APS: alternating-polarisation SLC of swath IS2, two\n"
+    "                         images of the same lines (MDS1 co-, MDS2 cross-polarised)\n"
+    "                       IMS and APS use the image-mode descriptor layout and\n"
+    "                       lines one pulse repetition interval apart\n"
     "  --seed N             speckle seed (default 1)\n"
     "  --size S             tiny | small | realistic (default tiny)\n"
-    "                         tiny: 4 bursts, 104 to 136 samples per sub-swath (< 1 MB)\n"
-    "                         small: 30 bursts, 272 to 352 samples per sub-swath\n"
-    "                         realistic: 282 bursts (60 s), real sample counts (~1.7 GB)\n"
+    "                         tiny: 4 bursts, 104 to 136 samples per sub-swath (< 1 MB);\n"
+    "                         IMS/APS 232 samples x 320 lines per image\n"
+    "                         small: 30 bursts, 272 to 352 samples per sub-swath;\n"
+    "                         IMS/APS 480 samples x 960 lines\n"
+    "                         realistic: 282 bursts (60 s), real sample counts (~1.7 GB);\n"
+    "                         IMS/APS 5174 samples x 26000 lines (~16 s, ~540 MB each)\n"
     "  --start TEXT         sensing start, \"DD-MMM-YYYY HH:MM:SS[.ffffff]\"; default: the\n"
     "                       first crossing of 45 degrees latitude on the requested pass\n"
     "                       at least 2 h into the orbit file (02-MAR-2008 10:00:00 with\n"
     "                       --orbit kepler)\n"
-    "  --polarisation P     HH | VV (default HH)\n"
+    "  --polarisation P     HH | VV (default HH); APS: the co-polarised image, the\n"
+    "                       second is HV or VH\n"
     "  --pass P             ascending | descending (default descending)\n"
     "  --orbit FILE|kepler  DORIS file whose trajectory the scene follows (the scene must\n"
     "                       lie inside its validity; it is copied into DIR), or a\n"
@@ -52,20 +64,24 @@ const char* kHelp =
     "                       also --blank-first\n"
     "  --blank-end N        last N records likewise; also --blank-last\n"
     "  --blank-zero-time    blank records carry zero time fields\n"
-    "  --mds-count N        write only N measurement data sets (the other DSDs empty;\n"
-    "                       4 leaves the fifth MDS descriptor with size 0)\n"
+    "  --mds-count N        WSS only: write only N measurement data sets (the other\n"
+    "                       DSDs empty; 4 leaves the fifth MDS descriptor with size 0)\n"
     "  --truncate BYTES     cut the product after BYTES bytes\n"
     "  --dsd-beyond-end K   DSD K (0..17) points 4096 bytes beyond the end of the file\n"
-    "  --zero-count K       annotation DSD K (0..6) with record count and size 0\n"
+    "  --zero-count K       annotation DSD K with record count and size 0 (WSS 0..6:\n"
+    "                       1 main parameters, 5 geolocation; IMS/APS 0..9: 2 main\n"
+    "                       parameters, 3 Doppler, 8 geolocation)\n"
     "  --wrong-type CODE    product name (and file name) starts with CODE, e.g. ASA_IMS_1P\n"
     "\n"
     "synth_truth.txt is a parameter file ([Section], Key = value), its keys described\n"
     "in tools/envisat_synth/synth_truth.cpp:\n"
-    "  [Scene]        file names, orbit source, sensing start/stop, pass, polarisation,\n"
-    "                 orbits, line interval, burst cycle, rates, product corners\n"
+    "  [Scene]        file names, product type, orbit source, sensing start/stop, pass,\n"
+    "                 polarisation, orbits, line interval, burst cycle, rates, corners\n"
     "  [SubSwath1..5] Samples, Records, LinesPerBurst, Bursts, EchoesPerBurst, Rank, PRF,\n"
     "                 BurstCycle, First/LastLineTime, Near/FarRangeTime, look bandwidth,\n"
     "                 windows, chirp power, Doppler and FM-rate polynomials, corners ...\n"
+    "  [Image1..2]    IMS/APS instead: the same without burst values, with Polarisation\n"
+    "                 and Swath\n"
     "  [Pattern]      reflectivity pattern R(daz, drg) and how samples were drawn from it\n"
     "  [Doppler], [Calibration], [Defects]\n"
     "Times are seconds since 01-JAN-1985 (with UTC texts), range times two-way seconds,\n"
@@ -105,6 +121,8 @@ int main(int argc, char** argv) {
     bool ok = true;
     if (a == "--out")
       o.out_dir = v;
+    else if (a == "--product")
+      o.product = v;
     else if (a == "--size")
       o.size = v;
     else if (a == "--start")
@@ -134,7 +152,7 @@ int main(int argc, char** argv) {
         o.truncate_at = n;
       else if (a == "--dsd-beyond-end" && n >= 0 && n < 18)
         o.dsd_beyond_end = static_cast<int>(n);
-      else if (a == "--zero-count" && n >= 0 && n <= 6)
+      else if (a == "--zero-count" && n >= 0 && n <= 9)
         o.zero_count = static_cast<int>(n);
       else
         ok = false;

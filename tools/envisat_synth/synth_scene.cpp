@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 
 #include "synth_time.h"
 
@@ -41,6 +42,22 @@ const double kProcGain[kSubSwaths] = {1.0, 1.02, 0.98, 1.05, 0.96};
 constexpr double kLineInterval = 0.01172;  // s
 constexpr int kGeoStepLines = 90;          // geolocation grid lines 90 line intervals apart
 
+// Image-mode images: swath IS2 (incidence about 19 to 27 degrees), one look,
+// lines one pulse repetition interval apart.  The second image of an
+// alternating-polarisation product (cross-polarised) has its own calibration
+// and noise values; geometry and processing are those of the first.
+constexpr double kImagePrf = 1652.415692;  // Hz
+constexpr double kImagePulseLen = 27.12e-6, kImagePulseBw = 16.0e6, kImageLookBw = 15.55e6;
+constexpr double kImageNearTau = 5.57e-3;  // s
+constexpr int kImageRank = 9;
+constexpr int kImageXcaSlot = 1;  // is2
+constexpr double kImageAzLookBw = 1316.0, kImageWindowCoef = 0.75;
+const float kImageTimeDiff[2] = {-0.3296f, -0.3301f};
+const double kImageChirpPower[2] = {1.04, 0.91};
+const double kImageExtCal[2] = {1.05e5, 1.18e5};
+const double kImageNoise[2] = {2.1, 1.45};
+const double kImageProcGain[2] = {1.0, 1.0};
+
 struct SizePlan {
   int samples[kSubSwaths];  // per sub-swath, 0 for the real counts
   int overlap;              // samples shared by neighbours when the layout is compressed
@@ -59,6 +76,38 @@ bool plan_for(const std::string& size, SizePlan* p) {
   else
     return false;
   return true;
+}
+
+// Image-mode sizes: one image of `samples` x `lines`, grid lines `geo_step`
+// line intervals apart.
+struct ImagePlan {
+  int samples, lines, geo_step;
+  int checker_az, checker_rg;
+  int targets_az, targets_rg;
+};
+
+bool image_plan_for(const std::string& size, ImagePlan* p) {
+  if (size == "tiny")
+    *p = {232, 320, 64, 3, 4, 2, 3};
+  else if (size == "small")
+    *p = {480, 960, 96, 6, 6, 4, 4};
+  else if (size == "realistic")
+    *p = {5174, 26000, 1300, 12, 10, 8, 10};
+  else
+    return false;
+  return true;
+}
+
+// The line interval as the SPH states it ("%+.8e"), so that the times of the
+// records are exactly those a reader computes from the header.
+double stated_interval(double prf) {
+  char buf[32];
+  std::snprintf(buf, sizeof buf, "%+.8e", 1.0 / prf);
+  return std::strtod(buf, nullptr);
+}
+
+std::string crossed(const std::string& polar) {
+  return polar.substr(0, 2) + (polar[0] == 'H' ? "V" : "H");
 }
 
 State state_at(const Scene& s, double t) {
@@ -154,6 +203,62 @@ double mean_power(const Pattern& p, const SubSwath& w) {
   return 2.0 * (p.scale * p.scale * taper + 1.0 / 12.0);
 }
 
+// Corners, centre, reference look angle and FM rate of an image whose
+// timing and range are set.
+bool derive_geometry(const Scene& s, SubSwath* w, std::string* error) {
+  const double tc = round_us((w->first_time + w->last_time) / 2);
+  const double tauc = (w->near_tau + w->far_tau) / 2;
+  if (!corner(s, w->first_time, w->near_tau, &w->first_near) ||
+      !corner(s, w->first_time, w->far_tau, &w->first_far) ||
+      !corner(s, w->last_time, w->near_tau, &w->last_near) ||
+      !corner(s, w->last_time, w->far_tau, &w->last_far) || !corner(s, tc, tauc, &w->centre)) {
+    *error = "no ground intersection for the scene geometry";
+    return false;
+  }
+  w->elev_centre = w->centre.look;
+  w->fm_origin_tau = static_cast<float>(w->near_tau * 1e9) * 1e-9;
+  if (!fit_fm_rate(s, w)) {
+    *error = "no ground intersection for the azimuth FM rate";
+    return false;
+  }
+  return true;
+}
+
+// Image k of an image-mode product: every image covers the same lines and
+// ranges; the second is the cross-polarised one.
+void set_image(const Scene& s, const ImagePlan& plan, int k, SubSwath* w) {
+  w->beam = s.swath;
+  w->polar = k == 0 ? s.polar : crossed(s.polar);
+  w->xca_slot = kImageXcaSlot;
+  w->prf = kImagePrf;
+  w->rank = kImageRank;
+  w->echoes = 0;
+  w->pulse_len = kImagePulseLen;
+  w->pulse_bw = kImagePulseBw;
+  w->look_bw = kImageLookBw;
+  w->samples = plan.samples;
+  w->near_tau = kImageNearTau;
+  w->far_tau = w->near_tau + (w->samples - 1) / s.fs;
+  w->lines_per_burst = 0;
+  w->bursts = 0;
+  w->records = plan.lines;
+  w->first_time = round_us(s.t0);
+  w->last_time = record_time(s, *w, w->records - 1);
+  w->time_diff = kImageTimeDiff[k];
+  w->chirp_power = kImageChirpPower[k];
+  w->dop_delta = 0;
+  w->rg_window_coef = kImageWindowCoef;
+  w->az_window_coef = kImageWindowCoef;
+  w->az_look_bw = kImageAzLookBw;
+  w->proc_gain = kImageProcGain[k];
+  w->ext_cal = kImageExtCal[k];
+  w->noise = kImageNoise[k];
+  w->record_size = 17 + 4LL * w->samples;
+  w->band = s.opt.band_limit ? w->pulse_bw : s.fs;
+  const Pattern& p = s.pattern;
+  w->mean_power = (p.kind == "uniform" || p.kind == "flat") ? mean_power(p, *w) : 0.0;
+}
+
 }  // namespace
 
 double burst_taper(int i, int lines_per_burst) {
@@ -181,14 +286,44 @@ double Pattern::at(double daz, double drg) const {
 }
 
 double record_time(const Scene& s, const SubSwath& w, int r) {
+  if (w.lines_per_burst <= 0) return round_us(w.first_time + r * s.line_interval);
   const int burst = r / w.lines_per_burst, line = r % w.lines_per_burst;
   return round_us(w.first_time + burst * s.burst_cycle + line * s.line_interval);
 }
 
+int mds_written(const Scene& s) {
+  return s.opt.mds_count < 0 ? s.images : std::min(s.opt.mds_count, s.images);
+}
+
 bool build_scene(const Options& opt, Scene* s, std::string* error) {
   s->opt = opt;
+  if (opt.product != "WSS" && opt.product != "IMS" && opt.product != "APS") {
+    *error = "product must be WSS, IMS or APS";
+    return false;
+  }
+  s->product_type = opt.product;
+  s->wide_swath = opt.product == "WSS";
+  s->images = s->wide_swath ? kSubSwaths : (opt.product == "APS" ? 2 : 1);
+  if (!s->wide_swath) {
+    s->swath = "IS2";
+    s->descriptor = opt.product == "APS" ? "AP Mode SLC Image" : "Image Mode SLC Image";
+    s->algorithm = "RAN/DOP";
+    if (opt.mds_count >= 0) {
+      *error = "--mds-count applies to WSS products only";
+      return false;
+    }
+  }
+  // Annotation descriptors: 0..6 in the wide-swath layout, 0..9 (up to the
+  // map projection descriptor) in the image-mode layout.
+  const int last_annotation = s->wide_swath ? 6 : 9;
+  if (opt.zero_count > last_annotation) {
+    *error = "--zero-count names an annotation descriptor: 0.." + std::to_string(last_annotation) +
+             " for " + opt.product;
+    return false;
+  }
   SizePlan plan;
-  if (!plan_for(opt.size, &plan)) {
+  ImagePlan iplan;
+  if (!plan_for(opt.size, &plan) || !image_plan_for(opt.size, &iplan)) {
     *error = "unknown size '" + opt.size + "' (tiny, small, realistic)";
     return false;
   }
@@ -210,16 +345,24 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
 
   // Burst timing: the burst cycle is the sum of the sub-swath dwell times,
   // (rank + echoes) / PRF each; lines of a burst are one line interval apart,
-  // and the cycle is no whole number of line intervals.
-  s->line_interval = kLineInterval;
-  s->burst_cycle = 0.0;
-  for (int k = 0; k < kSubSwaths; ++k) s->burst_cycle += (kRank[k] + kEchoes[k]) / kPrf[k];
-  s->geo_step_lines = kGeoStepLines;
+  // and the cycle is no whole number of line intervals.  Image-mode lines
+  // follow each other at the pulse repetition interval.
   double duration = 0.0;  // from the earliest first line to the latest last line
-  for (int k = 0; k < kSubSwaths; ++k) {
-    const double last = kFirstOffset[k] * s->burst_cycle + (plan.bursts - 1) * s->burst_cycle +
-                        (kLinesPerBurst[k] - 1) * s->line_interval;
-    duration = std::max(duration, last);
+  if (s->wide_swath) {
+    s->line_interval = kLineInterval;
+    s->burst_cycle = 0.0;
+    for (int k = 0; k < kSubSwaths; ++k) s->burst_cycle += (kRank[k] + kEchoes[k]) / kPrf[k];
+    s->geo_step_lines = kGeoStepLines;
+    for (int k = 0; k < kSubSwaths; ++k) {
+      const double last = kFirstOffset[k] * s->burst_cycle + (plan.bursts - 1) * s->burst_cycle +
+                          (kLinesPerBurst[k] - 1) * s->line_interval;
+      duration = std::max(duration, last);
+    }
+  } else {
+    s->line_interval = stated_interval(kImagePrf);
+    s->burst_cycle = 0.0;
+    s->geo_step_lines = iplan.geo_step;
+    duration = (iplan.lines - 1) * s->line_interval;
   }
 
   // Trajectory and scene start.
@@ -273,7 +416,7 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   // Pattern kind first: the mean power of each sub-swath depends on it.
   Pattern& p = s->pattern;
   p.kind = opt.pattern;
-  p.tapered = p.kind != "uniform";
+  p.tapered = p.kind != "uniform" && s->wide_swath;  // the taper is that of the bursts
 
   // Range layout: real near ranges and sample counts, or a compressed layout
   // whose neighbours overlap by `overlap` samples less a part of a sample.
@@ -281,9 +424,19 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   s->range_spacing = kLightSpeed / (2.0 * s->fs);
   double near = kRealNearTau[0];
   s->stop = s->t0;
-  for (int k = 0; k < kSubSwaths; ++k) {
+  for (int k = 0; k < s->images; ++k) {
     SubSwath& w = s->ss[k];
     w.index = k;
+    if (!s->wide_swath) {
+      set_image(*s, iplan, k, &w);
+      min_samples = k == 0 ? w.samples : std::min(min_samples, w.samples);
+      s->stop = std::max(s->stop, w.last_time);
+      if (!derive_geometry(*s, &w, error)) return false;
+      continue;
+    }
+    w.beam = "SS" + std::to_string(k + 1);
+    w.polar = s->polar;
+    w.xca_slot = k == 0 ? 7 : k + 1;  // SS1 has its own slot, SS2..SS5 share IS3..IS6
     w.prf = kPrf[k];
     w.rank = kRank[k];
     w.echoes = kEchoes[k];
@@ -313,21 +466,7 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     w.record_size = 17 + 4LL * w.samples;
     w.band = opt.band_limit ? w.pulse_bw : s->fs;
     w.mean_power = (p.kind == "uniform" || p.kind == "flat") ? mean_power(p, w) : 0.0;
-    const double tc = round_us((w.first_time + w.last_time) / 2);
-    const double tauc = (w.near_tau + w.far_tau) / 2;
-    if (!corner(*s, w.first_time, w.near_tau, &w.first_near) ||
-        !corner(*s, w.first_time, w.far_tau, &w.first_far) ||
-        !corner(*s, w.last_time, w.near_tau, &w.last_near) ||
-        !corner(*s, w.last_time, w.far_tau, &w.last_far) || !corner(*s, tc, tauc, &w.centre)) {
-      *error = "no ground intersection for the scene geometry";
-      return false;
-    }
-    w.elev_centre = w.centre.look;
-    w.fm_origin_tau = static_cast<float>(w.near_tau * 1e9) * 1e-9;
-    if (!fit_fm_rate(*s, &w)) {
-      *error = "no ground intersection for the azimuth FM rate";
-      return false;
-    }
+    if (!derive_geometry(*s, &w, error)) return false;
   }
   if (opt.first_tie_sample < 1 || opt.first_tie_sample > min_samples - 20) {
     *error = "first tie sample must lie between 1 and " + std::to_string(min_samples - 20);
@@ -335,18 +474,21 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   }
   // Azimuth spacing: ground distance travelled by the mid-range point per line.
   {
-    const double tc = s->ss[2].centre.t;
-    const double tau = s->ss[2].centre.tau;
+    const SubSwath& middle = s->ss[s->images / 2];
+    const double tc = middle.centre.t;
+    const double tau = middle.centre.tau;
     GroundPoint a, b;
     zero_doppler_point(s->traj->at(tc - 0.5), tau, &a);
     zero_doppler_point(s->traj->at(tc + 0.5), tau, &b);
     s->azimuth_spacing = norm(b.x - a.x) * s->line_interval;
   }
   // Product corners: first and last line of the product at the near range of
-  // SS1, the middle of the swath and the far range of SS5.
+  // the first image (SS1), the middle of the swath and the far range of the
+  // last (SS5).
+  const SubSwath& far_image = s->ss[s->images - 1];
   {
-    const double taus[3] = {s->ss[0].near_tau, (s->ss[0].near_tau + s->ss[4].far_tau) / 2,
-                            s->ss[4].far_tau};
+    const double taus[3] = {s->ss[0].near_tau, (s->ss[0].near_tau + far_image.far_tau) / 2,
+                            far_image.far_tau};
     const double times[2] = {s->t0, s->stop};
     for (int a = 0; a < 2; ++a)
       for (int r = 0; r < 3; ++r) {
@@ -372,17 +514,21 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   s->temperature = 27.5;
 
   // Reflectivity pattern on (time from the first line, range time from SS1 near).
-  const double rg_extent = s->ss[4].far_tau - s->ss[0].near_tau;
-  p.az_cell = duration / plan.checker_az;
-  p.rg_cell = rg_extent / plan.checker_rg;
+  const double rg_extent = far_image.far_tau - s->ss[0].near_tau;
+  const int checker_az = s->wide_swath ? plan.checker_az : iplan.checker_az;
+  const int checker_rg = s->wide_swath ? plan.checker_rg : iplan.checker_rg;
+  const int targets_az = s->wide_swath ? plan.targets_az : iplan.targets_az;
+  const int targets_rg = s->wide_swath ? plan.targets_rg : iplan.targets_rg;
+  p.az_cell = duration / checker_az;
+  p.rg_cell = rg_extent / checker_rg;
   if (p.kind == "points") {
     p.target_half_az = 1.0 * s->line_interval;
     p.target_half_rg = 1.0 / s->fs;
-    for (int a = 0; a < plan.targets_az; ++a)
-      for (int r = 0; r < plan.targets_rg; ++r) {
+    for (int a = 0; a < targets_az; ++a)
+      for (int r = 0; r < targets_rg; ++r) {
         Target tg;
-        tg.t = round_us(duration * (a + 0.5) / plan.targets_az);
-        tg.tau = rg_extent * (r + 0.5) / plan.targets_rg;
+        tg.t = round_us(duration * (a + 0.5) / targets_az);
+        tg.tau = rg_extent * (r + 0.5) / targets_rg;
         Corner c;
         if (!corner(*s, s->t0 + tg.t, s->ss[0].near_tau + tg.tau, &c)) {
           *error = "no ground intersection for a point target";
@@ -397,9 +543,9 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   // File names by the ESA convention.
   char buf[128];
   const int dur_s = static_cast<int>(std::lround(s->stop - s->t0));
-  std::snprintf(buf, sizeof buf, "ASA_WSS_1PNPDK%s_%08d2%03d_%05d_%05d_%04d.N1",
-                format_compact(s->t0).c_str(), dur_s, s->cycle % 1000, s->rel_orbit,
-                s->abs_orbit % 100000, static_cast<int>(opt.seed % 10000));
+  std::snprintf(buf, sizeof buf, "ASA_%s_1PNPDK%s_%08d2%03d_%05d_%05d_%04d.N1",
+                s->product_type.c_str(), format_compact(s->t0).c_str(), dur_s, s->cycle % 1000,
+                s->rel_orbit, s->abs_orbit % 100000, static_cast<int>(opt.seed % 10000));
   s->product_name = buf;
   if (!opt.wrong_type.empty()) {
     std::string code = opt.wrong_type.substr(0, 10);

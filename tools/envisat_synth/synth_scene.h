@@ -1,5 +1,7 @@
-// The scene the generator writes: options, timing, sub-swath layout,
-// reflectivity pattern, and the geometric truth derived from the trajectory.
+// The scene the generator writes: options, timing, the layout of its images
+// (the sub-swaths of a wide-swath product, or the one or two images of an
+// image-mode product), reflectivity pattern, and the geometric truth derived
+// from the trajectory.
 #pragma once
 
 #include <cstdint>
@@ -12,12 +14,18 @@
 namespace synth {
 
 constexpr int kSubSwaths = 5;
+// Most images of one product: the five sub-swaths of a wide-swath product.
+constexpr int kMaxImages = kSubSwaths;
 
 struct Options {
   std::string out_dir;
   uint64_t seed = 1;
+  // WSS: wide-swath SLC, five sub-swaths of bursts; IMS: image-mode SLC, one
+  // image; APS: alternating-polarisation SLC, two images of one swath.
+  std::string product = "WSS";
   std::string size = "tiny";  // tiny, small, realistic
   std::string start;          // sensing start text; empty: the default
+  // HH or VV; of an APS product the co-polarised image (the other is crossed).
   std::string polarisation = "HH";
   std::string pass;   // ascending, descending; empty: descending (or as --start gives)
   std::string orbit;  // a DORIS file or "kepler"
@@ -27,7 +35,8 @@ struct Options {
   // Defects.
   int blank_first = 0, blank_last = 0;
   bool blank_zero_time = false;  // blank records carry zero time fields
-  int mds_count = 5;
+  // Measurement data sets written (WSS only); -1: all.
+  int mds_count = -1;
   int64_t truncate_at = -1;
   int dsd_beyond_end = -1;
   int zero_count = -1;
@@ -39,10 +48,17 @@ struct Corner {
   double lat = 0, lon = 0, incidence = 0, look = 0;
 };
 
-// One sub-swath (beam): its own timing, sampling and processing values.
+// One sub-swath (beam) of a wide-swath product, or one image of an
+// image-mode product: its own timing, sampling and processing values.
 struct SubSwath {
   int index = 0;  // 0..4
+  // "SS1".."SS5", or the swath of an image-mode image ("IS2").
+  std::string beam;
+  std::string polar;  // "H/H", "V/V", "H/V", "V/H"
+  int xca_slot = 0;   // slot of the calibration files (0..7)
   int samples = 0;
+  // Images without bursts have lines_per_burst and bursts 0: their records
+  // are one line interval apart.
   int lines_per_burst = 0, bursts = 0, records = 0;
   double prf = 0, pulse_len = 0, pulse_bw = 0, look_bw = 0;
   int rank = 0, echoes = 0;
@@ -85,16 +101,25 @@ struct Pattern {
 
 struct Scene {
   Options opt;
+  std::string product_type = "WSS";  // WSS, IMS, APS
+  bool wide_swath = true;            // bursts and sub-swaths
+  int images = kSubSwaths;           // entries of ss[] in use
+  // SPH swath, descriptor and algorithm.
+  std::string swath = "WS ";
+  std::string descriptor = "Wide Swath SLC Image";
+  std::string algorithm = "SPECAN ";
+
   std::unique_ptr<Trajectory> traj;
   bool kepler = false;
   std::string orbit_source;  // path of the real file or "kepler"
-  double t0 = 0, stop = 0;   // earliest first line and latest last line of all sub-swaths
+  double t0 = 0, stop = 0;   // earliest first line and latest last line of all images
+  // Line interval; burst cycle, 0 for images without bursts.
   double line_interval = 0, burst_cycle = 0;
   int geo_step_lines = 0;  // line intervals between geolocation grid lines
   double fs = 19.20768e6, fc = 5.331004416e9;
   double range_spacing = 0, azimuth_spacing = 0;
-  SubSwath ss[kSubSwaths];
-  std::string pass, polar;
+  SubSwath ss[kMaxImages];
+  std::string pass, polar;  // polar: that of the first image
   int abs_orbit = 0, rel_orbit = 0, cycle = 0;
   Pattern pattern;
   // Doppler centroid: per record coefficients about the reference range time.
@@ -113,8 +138,11 @@ struct Scene {
 
 // Builds the scene; false with a message on bad options.
 bool build_scene(const Options& opt, Scene* scene, std::string* error);
+// Number of measurement data sets written (the first images of ss[]).
+int mds_written(const Scene& s);
 // Zero-Doppler time of MDS record r (from 0) of a sub-swath: line r mod L of
-// burst r / L, bursts a burst cycle apart, lines a line interval apart.
+// burst r / L, bursts a burst cycle apart, lines a line interval apart.  An
+// image without bursts has its records one line interval apart.
 double record_time(const Scene& s, const SubSwath& w, int r);
 // Two-way elevation pattern of the generated calibration files, in dB, at an
 // angle offset (degrees) from the reference angle of slot `slot` (0..7).

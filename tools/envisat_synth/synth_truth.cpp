@@ -9,20 +9,36 @@
 //
 // [Scene]
 //   Product, OrbitFile, OrbitSource, XcaFile, InsFile, AuxList, Size, Seed
+//   ProductType                 WSS, IMS or APS (characters 4 to 6 of Product)
 //   SensingStart, SensingStop   earliest first line and latest last line of
-//                               all sub-swaths (also the SPH line times)
-//   Pass, Polarisation, AbsOrbit, RelOrbit
-//   SubSwaths                   number of MDS written
-//   LineTimeInterval            interval of the lines inside a burst
-//   BurstCycle                  sum over sub-swaths of (Rank + EchoesPerBurst) / PRF
+//                               all images (also the SPH line times)
+//   Pass, AbsOrbit, RelOrbit
+//   Polarisation                that of the first image (SPH MDS1_TX_RX_POLAR)
+//   SubSwaths                   WSS: number of MDS written
+//   Images                      IMS, APS: number of MDS written (1, 2)
+//   Swath, Descriptor           IMS, APS: SPH swath ("IS2") and descriptor
+//   LineTimeInterval            interval of the lines inside a burst (WSS), of
+//                               all lines (IMS, APS; as the SPH states it)
+//   BurstCycle                  WSS: sum over sub-swaths of (Rank + EchoesPerBurst) / PRF
 //   RangeSamplingRate, CarrierFrequency, RangeSpacing, AzimuthSpacing, TotalSize
 //   SphFirstNearLat/Lon ... SphLastFarLat/Lon   the six product corners of the
-//                               SPH (First/Last line; Near of SS1, Mid, Far of SS5)
-// [SubSwathK], K = 1..5
+//                               SPH (First/Last line; Near of SS1, Mid, Far of SS5;
+//                               IMS, APS: near, mid and far of the image)
+// [SubSwathK], K = 1..5: the sub-swaths of a WSS product
+// [ImageK], K = 1..Images: the images of an IMS or APS product (MDS K), with
+//   the keys below that do not concern bursts or sub-swaths (no
+//   LinesPerBurst, Bursts, EchoesPerBurst, Rank, BurstCycle,
+//   NearRangeOffsetSamples, DopplerDelta), and
+//   Polarisation                "H/H", "V/V", "H/V", "V/H" (SPH MDSK_TX_RX_POLAR)
+//   Swath                       the swath of the image, "IS2"
+//   Records are one LineTimeInterval apart: record r at FirstLineTime +
+//   r LineTimeInterval (whole us).  The images of an APS product cover the
+//   same lines and ranges and share one geolocation grid.
 //   Samples, Records, LinesPerBurst (L), Bursts, EchoesPerBurst, Rank, PRF,
 //   BurstCycle                  as in [Scene]
 //   PulseLength, PulseBandwidth chirp length (s) and bandwidth
-//   RangeLookBandwidth          range look bandwidth (slot K of its array)
+//   RangeLookBandwidth          range look bandwidth (slot K of its array; the
+//                               first slot for every image of IMS, APS)
 //   RangeSpectrumBandwidth      two-sided bandwidth of the samples' range
 //                               spectrum (the sampling rate unless band-limited)
 //   FirstLineTime               first line of the first burst (record 0)
@@ -43,10 +59,11 @@
 //   RangeWindowType, RangeWindowCoefficient, AzimuthWindowType,
 //   AzimuthWindowCoefficient, AzimuthLookBandwidth
 //   ProcessorGain, ExternalCalibrationFactor, NoisePower
-//   ChirpPower                  chirp power of the sub-swath's chirp record
+//   ChirpPower                  chirp power of the sub-swath's (image's) chirp record
 //   DopplerDelta                its int16 added to the Doppler constant term
 //   DopplerRecordJ              "time c0 c1 c2 c3 c4" of Doppler record J with
 //                               the delta added: f = sum ci (tau - DopplerRangeTime)^i
+//                               (images: the record's own coefficients)
 //   DopplerRangeTime            reference range time of the Doppler polynomials
 //   FmRateC0, FmRateC1, FmRateC2, FmRateRangeTime
 //                               azimuth FM rate C0 + C1 r + C2 r^2 (Hz/s),
@@ -58,6 +75,7 @@
 // [Calibration] elevation patterns, reference angles, droop gains
 // [Defects]     the defects written on request
 #include <algorithm>
+#include <cctype>
 #include <cmath>
 #include <cstdio>
 #include <string>
@@ -95,14 +113,22 @@ const char* kHeader =
     "Range times: two-way delay in seconds. Angles, latitudes, longitudes: degrees (WGS84).\n"
     "Corners are the zero-Doppler ground points of the first/last line at the near/far\n"
     "range of each sub-swath; the centre is at CentreTime and CentreRangeTime.\n";
+const char* kImageHeader =
+    "Ground truth of a generated ENVISAT ASAR image-mode scene.\n"
+    "Times: seconds since 01-JAN-1985 00:00:00 (86400 s a day), UTC text beside.\n"
+    "Range times: two-way delay in seconds. Angles, latitudes, longitudes: degrees (WGS84).\n"
+    "Corners are the zero-Doppler ground points of the first/last line at the near/far\n"
+    "range of each image; the centre is at CentreTime and CentreRangeTime.\n";
 
 }  // namespace
 
 bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
+  const bool wss = s.wide_swath;
   Truth t;
-  t.comment(kHeader);
+  t.comment(wss ? kHeader : kImageHeader);
   t.section("Scene");
   t.text("Product", s.product_name);
+  t.text("ProductType", s.product_type);
   t.text("OrbitFile", s.orbit_name);
   t.text("OrbitSource", s.kepler ? "kepler" : "real DORIS file " + s.orbit_source);
   t.text("XcaFile", s.xca_name);
@@ -116,9 +142,15 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.text("Polarisation", s.polar);
   t.integer("AbsOrbit", s.abs_orbit);
   t.integer("RelOrbit", s.rel_orbit);
-  t.integer("SubSwaths", std::max(0, std::min(s.opt.mds_count, kSubSwaths)));
+  if (wss) {
+    t.integer("SubSwaths", mds_written(s));
+  } else {
+    t.integer("Images", mds_written(s));
+    t.text("Swath", s.swath);
+    t.text("Descriptor", s.descriptor);
+  }
   t.num("LineTimeInterval", s.line_interval, "%.12e");
-  t.num("BurstCycle", s.burst_cycle, "%.12e");
+  if (wss) t.num("BurstCycle", s.burst_cycle, "%.12e");
   t.num("RangeSamplingRate", s.fs, "%.3f");
   t.num("CarrierFrequency", s.fc, "%.3f");
   t.num("RangeSpacing", s.range_spacing, "%.9f");
@@ -130,17 +162,22 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
     t.num(std::string("Sph") + sph[i] + "Lon", s.sph_lon[i], "%.7f");
   }
 
-  for (int k = 0; k < kSubSwaths; ++k) {
+  for (int k = 0; k < s.images; ++k) {
     const SubSwath& w = s.ss[k];
-    t.section("SubSwath" + std::to_string(k + 1));
+    t.section((wss ? "SubSwath" : "Image") + std::to_string(k + 1));
     t.integer("Samples", w.samples);
     t.integer("Records", w.records);
-    t.integer("LinesPerBurst", w.lines_per_burst);
-    t.integer("Bursts", w.bursts);
-    t.integer("EchoesPerBurst", w.echoes);
-    t.integer("Rank", w.rank);
+    if (wss) {
+      t.integer("LinesPerBurst", w.lines_per_burst);
+      t.integer("Bursts", w.bursts);
+      t.integer("EchoesPerBurst", w.echoes);
+      t.integer("Rank", w.rank);
+    } else {
+      t.text("Polarisation", w.polar);
+      t.text("Swath", w.beam);
+    }
     t.num("PRF", w.prf, "%.6f");
-    t.num("BurstCycle", s.burst_cycle, "%.12e");
+    if (wss) t.num("BurstCycle", s.burst_cycle, "%.12e");
     t.num("PulseLength", w.pulse_len, "%.9e");
     t.num("PulseBandwidth", w.pulse_bw, "%.3f");
     t.num("RangeLookBandwidth", w.look_bw, "%.3f");
@@ -151,7 +188,7 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
     t.time("AcquisitionStartTime", w.first_time + static_cast<double>(w.time_diff));
     t.num("NearRangeTime", w.near_tau, "%.15e");
     t.num("FarRangeTime", w.far_tau, "%.15e");
-    t.num("NearRangeOffsetSamples", (w.near_tau - s.ss[0].near_tau) * s.fs, "%.6f");
+    if (wss) t.num("NearRangeOffsetSamples", (w.near_tau - s.ss[0].near_tau) * s.fs, "%.6f");
     t.num("RangeSpacing", s.range_spacing, "%.9f");
     t.integer("FirstTieSample", s.opt.first_tie_sample);
     t.time("CentreTime", w.centre.t);
@@ -177,7 +214,7 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
     t.num("ExternalCalibrationFactor", w.ext_cal, "%.3f");
     t.num("NoisePower", w.noise, "%.6f");
     t.num("ChirpPower", w.chirp_power, "%.6f");
-    t.integer("DopplerDelta", w.dop_delta);
+    if (wss) t.integer("DopplerDelta", w.dop_delta);
     t.num("DopplerRangeTime", s.dop_ref_tau, "%.15e");
     for (size_t j = 0; j < s.dop_times.size(); ++j) {
       char b[160];
@@ -196,7 +233,9 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.section("Pattern");
   t.text("Kind", p.kind);
   t.text("Coordinates",
-         "daz = zero-Doppler time - SensingStart (s); drg = range time - NearRangeTime of SS1 (s)");
+         std::string("daz = zero-Doppler time - SensingStart (s); drg = range time - "
+                     "NearRangeTime of ") +
+             (wss ? "SS1 (s)" : "Image1 (s)"));
   t.text("Samples",
          "I and Q normal, std dev Scale * sqrt(Taper(i)) * sqrt(R(daz, drg)), "
          "rounded to int16; i = line within its burst (0..LinesPerBurst-1)");
@@ -238,9 +277,10 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.section("Doppler");
   t.integer("Records", static_cast<long long>(s.dop_times.size()));
   t.num("ReferenceRangeTime", s.dop_ref_tau, "%.12e");
-  t.text("Polynomial",
-         "f = C0 + C1 * (range time - ReferenceRangeTime) + DopplerDelta of the "
-         "sub-swath (see DopplerRecordJ of each sub-swath)");
+  t.text("Polynomial", wss ? "f = C0 + C1 * (range time - ReferenceRangeTime) + DopplerDelta of "
+                             "the sub-swath (see DopplerRecordJ of each sub-swath)"
+                           : "f = C0 + C1 * (range time - ReferenceRangeTime), the same for "
+                             "every image");
   t.num("C1", s.dop_c1, "%.6e");
   for (size_t j = 0; j < s.dop_times.size(); ++j) {
     char b[96];
@@ -252,9 +292,16 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.text("PatternDb",
          "G(offset) = -(0.75 + 0.05 * slot) * offset^2 (two-way dB, offset in "
          "degrees from the reference angle; all polarisations)");
-  t.text("Slots", "SS1 -> 7 (ss1), SS2..SS5 -> 2..5 (is3_ss2..is6_ss5)");
-  for (int k = 0; k < kSubSwaths; ++k)
-    t.num("ReferenceAngleSS" + std::to_string(k + 1), s.ss[k].elev_centre, "%.6f");
+  if (wss) {
+    t.text("Slots", "SS1 -> 7 (ss1), SS2..SS5 -> 2..5 (is3_ss2..is6_ss5)");
+    for (int k = 0; k < kSubSwaths; ++k)
+      t.num("ReferenceAngleSS" + std::to_string(k + 1), s.ss[k].elev_centre, "%.6f");
+  } else {
+    std::string slot_name = s.swath;
+    for (char& c : slot_name) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+    t.text("Slots", s.swath + " -> " + std::to_string(s.ss[0].xca_slot) + " (" + slot_name + ")");
+    t.num("ReferenceAngle" + s.swath, s.ss[0].elev_centre, "%.6f");
+  }
   t.num("Temperature", s.temperature + 0.0, "%.3f");
   std::string droop;
   for (int i = 0; i < 8; ++i) droop += (i ? " " : "") + std::to_string(s.droop[i]);
@@ -267,7 +314,7 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.integer("BlankFirst", s.opt.blank_first);
   t.integer("BlankLast", s.opt.blank_last);
   t.text("BlankTimes", s.opt.blank_zero_time ? "zero" : "kept");
-  t.integer("MdsCount", std::max(0, std::min(s.opt.mds_count, kSubSwaths)));
+  t.integer("MdsCount", mds_written(s));
   t.integer("TruncateAt", s.opt.truncate_at);
   t.integer("DsdBeyondEnd", s.opt.dsd_beyond_end);
   t.integer("ZeroCountDsd", s.opt.zero_count);

@@ -18,17 +18,12 @@ namespace synth {
 namespace {
 
 constexpr int kSqSize = 170, kMppSize = 2009, kDopSize = 55, kChirpSize = 1483, kAntSize = 162,
-              kGeoSize = 521;
+              kGeoSize = 521, kSrGrSize = 55;
 constexpr size_t kSqZdt = 0;
 constexpr int kXcaSize = 26552, kInsSize = 171648;
 constexpr int kTies = 11;
 // Image line header: zero-Doppler time, quality flag (-1 blank), line number.
 constexpr size_t kLineTime = 0, kLineQuality = 12, kLineNumber = 13, kLineHeader = 17;
-
-// Calibration-file slot of a sub-swath: SS1 has its own, SS2..SS5 share IS3..IS6.
-int slot_of(int k) {
-  return k == 0 ? 7 : k + 1;
-}
 
 using Bytes = std::vector<uint8_t>;
 
@@ -136,15 +131,25 @@ std::array<int, kSubSwaths> slot_owners(int own_slot, int k) {
   throw std::logic_error("no slot assignment");
 }
 
-// Per-beam array of floats or of unsigned integers at `off`.
+// Per-beam array of floats or of unsigned integers at `off`.  A wide-swath
+// record spreads the sub-swaths over the slots as slot_owners says; an
+// image-mode record holds its image's value in slot 0 and zeros elsewhere.
 template <typename Get>
 void put_beams_f32(Bytes& b, size_t off, const Scene& s, int own_slot, int k, Get get) {
+  if (!s.wide_swath) {
+    put_f32(b, off, static_cast<float>(get(s.ss[k])));
+    return;
+  }
   const std::array<int, kSubSwaths> owner = slot_owners(own_slot, k);
   for (int e = 0; e < kSubSwaths; ++e)
     put_f32(b, off + 4 * e, static_cast<float>(get(s.ss[owner[e]])));
 }
 template <typename Get>
 void put_beams_u32(Bytes& b, size_t off, const Scene& s, int own_slot, int k, Get get) {
+  if (!s.wide_swath) {
+    put_u32(b, off, static_cast<uint32_t>(get(s.ss[k])));
+    return;
+  }
   const std::array<int, kSubSwaths> owner = slot_owners(own_slot, k);
   for (int e = 0; e < kSubSwaths; ++e)
     put_u32(b, off + 4 * e, static_cast<uint32_t>(get(s.ss[owner[e]])));
@@ -174,7 +179,7 @@ Bytes mpp_record(const Scene& s, const SubSwath& w) {
   put_mjd(b, kMppLastZdt, w.last_time);
   put_text(b, kMppWorkOrder, "SYNTH0000001");
   put_f32(b, kMppTimeDiff, 0.0f);
-  put_text(b, kMppSwath, "SS" + std::to_string(k + 1));
+  put_text(b, kMppSwath, w.beam);
   put_f32(b, kMppRangeSpacing, static_cast<float>(s.range_spacing));
   put_f32(b, kMppAzimuthSpacing, static_cast<float>(s.azimuth_spacing));
   put_f32(b, kMppLineInterval, static_cast<float>(s.line_interval));
@@ -212,7 +217,8 @@ Bytes mpp_record(const Scene& s, const SubSwath& w) {
   put_f32(b, kMppProcGain, static_cast<float>(w.proc_gain));
   put_f32(b, kMppExtCal, static_cast<float>(w.ext_cal));
   put_f32(b, kMppNoise, static_cast<float>(w.noise));
-  for (int i = 0; i < 4; ++i) put_u32(b, kMppBeamOverlap + 4 * i, 200);
+  if (s.wide_swath)
+    for (int i = 0; i < 4; ++i) put_u32(b, kMppBeamOverlap + 4 * i, 200);
   // Five orbit state vectors spread over the sub-swath (1e-2 m, 1e-5 m/s).
   for (int j = 0; j < 5; ++j) {
     const double t = round_us(w.first_time + (w.last_time - w.first_time) * j / 4.0);
@@ -238,8 +244,10 @@ Bytes dop_record(const Scene& s, int j) {
   put_f32(b, kDopCoef, static_cast<float>(s.dop_c0[j]));
   put_f32(b, kDopCoef + 4, static_cast<float>(s.dop_c1));
   put_f32(b, kDopConf, 0.9f);
-  for (int k = 0; k < kSubSwaths; ++k)
-    put_i16(b, kDopDelta + 2 * k, static_cast<int16_t>(s.ss[k].dop_delta));
+  // Offsets of the sub-swaths' constant terms: wide-swath products only.
+  if (s.wide_swath)
+    for (int k = 0; k < kSubSwaths; ++k)
+      put_i16(b, kDopDelta + 2 * k, static_cast<int16_t>(s.ss[k].dop_delta));
   return b;
 }
 
@@ -248,11 +256,11 @@ constexpr size_t kChirpZdt = 0, kChirpBeam = 13, kChirpPolar = 16, kChirpWidth =
                  kChirpSidelobe = 23, kChirpIslr = 27, kChirpPeak = 31, kChirpRePower = 35,
                  kChirpElevPower = 39, kChirpRefPower = 44, kChirpNormSource = 48;
 
-Bytes chirp_record(const Scene& s, const SubSwath& w) {
+Bytes chirp_record(const SubSwath& w) {
   Bytes b(kChirpSize, 0);
   put_mjd(b, kChirpZdt, w.first_time);
-  put_text(b, kChirpBeam, "SS" + std::to_string(w.index + 1));
-  put_text(b, kChirpPolar, s.polar);
+  put_text(b, kChirpBeam, w.beam);
+  put_text(b, kChirpPolar, w.polar);
   put_f32(b, kChirpWidth, static_cast<float>(1.0 / w.pulse_bw));
   put_f32(b, kChirpSidelobe, -13.2f);
   put_f32(b, kChirpIslr, -10.1f);
@@ -272,7 +280,7 @@ constexpr size_t kAntZdt = 0, kAntBeam = 13, kAntRangeTime = 16, kAntAngle = 60,
 bool ant_record(const Scene& s, const SubSwath& w, Bytes* out) {
   Bytes b(kAntSize, 0);
   put_mjd(b, kAntZdt, w.first_time);
-  put_text(b, kAntBeam, "SS" + std::to_string(w.index + 1));
+  put_text(b, kAntBeam, w.beam);
   const State st = s.traj->at(w.centre.t);
   for (int j = 0; j < kTies; ++j) {
     const double tau = tie_tau(s, w, tie_sample(w, 1, j));
@@ -281,7 +289,7 @@ bool ant_record(const Scene& s, const SubSwath& w, Bytes* out) {
     put_f32(b, kAntRangeTime + 4 * j, static_cast<float>(tau * 1e9));
     put_f32(b, kAntAngle + 4 * j, static_cast<float>(g.look_deg));
     put_f32(b, kAntGain + 4 * j,
-            static_cast<float>(xca_pattern_db(slot_of(w.index), g.look_deg - w.elev_centre)));
+            static_cast<float>(xca_pattern_db(w.xca_slot, g.look_deg - w.elev_centre)));
   }
   *out = std::move(b);
   return true;
@@ -328,7 +336,7 @@ bool geo_record(const Scene& s, const SubSwath& w, int row, Bytes* out) {
   if (!put_ties(s, w, t1, b, 0)) return false;
   put_mjd(b, kGeoLastZdt, t2);
   if (!put_ties(s, w, t2, b, kGeoLastLine)) return false;
-  put_text(b, kGeoSwath, "SS" + std::to_string(w.index + 1));
+  put_text(b, kGeoSwath, w.beam);
   *out = std::move(b);
   return true;
 }
@@ -340,10 +348,12 @@ int geo_rows(const Scene& s, const SubSwath& w) {
   return std::max(1, static_cast<int>(std::ceil((w.last_time - w.first_time) / span - 1e-9)));
 }
 
-// The grid records of all sub-swaths in time order: (sub-swath, row).
+// The grid records of all sub-swaths in time order: (sub-swath, row).  The
+// images of an image-mode product share one grid, that of the first.
 std::vector<std::pair<int, int>> geo_order(const Scene& s) {
   std::vector<std::pair<int, int>> order;
-  for (int k = 0; k < kSubSwaths; ++k)
+  const int grids = s.wide_swath ? s.images : 1;
+  for (int k = 0; k < grids; ++k)
     for (int row = 0; row < geo_rows(s, s.ss[k]); ++row) order.emplace_back(k, row);
   auto time_of = [&s](const std::pair<int, int>& e) {
     return s.ss[e.first].first_time + e.second * s.geo_step_lines * s.line_interval;
@@ -356,9 +366,98 @@ std::vector<std::pair<int, int>> geo_order(const Scene& s) {
 }
 
 // ---------------------------------------------------------------- product
+// Sets descriptor i of `d` to an annotation data set of n records.
+void set_ads(std::vector<DsdValues>& d, int i, const char* name, int64_t off, int64_t n,
+             int64_t size) {
+  d[i].name = name;
+  d[i].type = 'A';
+  d[i].offset = off;
+  d[i].size = n * size;
+  d[i].num_dsr = n;
+  d[i].dsr_size = size;
+}
+
+// Descriptor of MDS k+1: its records when it is written, else empty.
+void set_mds(const Scene& s, const ProductLayout& L, int k, DsdValues* v) {
+  v->name = "MDS" + std::to_string(k + 1);
+  v->type = 'M';
+  if (k < mds_written(s)) {
+    v->offset = L.mds_offset[k];
+    v->num_dsr = s.ss[k].records;
+    v->dsr_size = s.ss[k].record_size;
+    v->size = v->num_dsr * v->dsr_size;
+  }
+}
+
+// Reference descriptors: auxiliary files by name, no data.
+void set_refs(std::vector<DsdValues>& d, int first, const std::vector<const char*>& names,
+              const std::vector<std::string>& files) {
+  for (size_t i = 0; i < names.size(); ++i) {
+    d[first + i].name = names[i];
+    d[first + i].type = 'R';
+    d[first + i].filename = files[i];
+  }
+}
+
+constexpr int kProductDsds = 18;
+const char* const kProcessorConfig =
+    "ASA_CON_AXVIEC20070101_000000_20070101_000000_20991231_000000";
+const char* const kExternalCharacterisation =
+    "ASA_XCH_AXVIEC20070101_000000_20070101_000000_20991231_000000";
+
+// The wide-swath descriptor order: annotation 0..6, MDS1..MDS5 at 7..11,
+// references 12..16 and the Doppler grid at 17.
+std::vector<DsdValues> wide_swath_dsds(const Scene& s, const ProductLayout& L) {
+  std::vector<DsdValues> d(kProductDsds);
+  set_ads(d, 0, "MDS1 SQ ADS", L.sq_offset, kSubSwaths, kSqSize);
+  set_ads(d, 1, "MAIN PROCESSING PARAMS ADS", L.mpp_offset, kSubSwaths, kMppSize);
+  set_ads(d, 2, "DOP CENTROID COEFFS ADS", L.dop_offset, L.dop_records, kDopSize);
+  set_ads(d, 3, "CHIRP PARAMS ADS", L.chirp_offset, kSubSwaths, kChirpSize);
+  set_ads(d, 4, "MDS1 ANTENNA ELEV PATT ADS", L.ant_offset, kSubSwaths, kAntSize);
+  set_ads(d, 5, "GEOLOCATION GRID ADS", L.geo_offset, L.geo_records, kGeoSize);
+  set_ads(d, 6, "SR GR ADS", 0, 0, kSrGrSize);
+  for (int k = 0; k < kSubSwaths; ++k) set_mds(s, L, k, &d[7 + k]);
+  set_refs(d, 12,
+           {"LEVEL 0 PRODUCT", "ASAR PROCESSOR CONFIG", "INSTRUMENT CHARACTERIZATION",
+            "EXTERNAL CALIBRATION", "ORBIT STATE VECTOR 1"},
+           {"ASA_WS__0PNPDK" + s.product_name.substr(14, 48), kProcessorConfig, s.ins_name,
+            s.xca_name, s.orbit_name});
+  set_ads(d, 17, "DOP CENTROID GRID ADS", 0, 0, 0);
+  return d;
+}
+
+// The image-mode descriptor order: per-MDS quality, main processing
+// parameters, Doppler, slant-to-ground (empty in slant-range products),
+// chirp, per-MDS antenna patterns, geolocation, map projection (empty),
+// MDS1, MDS2, then the references.  The second MDS's own descriptors are
+// empty in single-image products.
+std::vector<DsdValues> image_mode_dsds(const Scene& s, const ProductLayout& L) {
+  std::vector<DsdValues> d(kProductDsds);
+  const int two = s.images > 1 ? 1 : 0;
+  set_ads(d, 0, "MDS1 SQ ADS", L.sq_offset, 1, kSqSize);
+  set_ads(d, 1, "MDS2 SQ ADS", two ? L.sq_offset + kSqSize : 0, two, kSqSize);
+  set_ads(d, 2, "MAIN PROCESSING PARAMS ADS", L.mpp_offset, s.images, kMppSize);
+  set_ads(d, 3, "DOP CENTROID COEFFS ADS", L.dop_offset, L.dop_records, kDopSize);
+  set_ads(d, 4, "SR GR ADS", 0, 0, kSrGrSize);
+  set_ads(d, 5, "CHIRP PARAMS ADS", L.chirp_offset, s.images, kChirpSize);
+  set_ads(d, 6, "MDS1 ANTENNA ELEV PATT ADS", L.ant_offset, 1, kAntSize);
+  set_ads(d, 7, "MDS2 ANTENNA ELEV PATT ADS", two ? L.ant_offset + kAntSize : 0, two, kAntSize);
+  set_ads(d, 8, "GEOLOCATION GRID ADS", L.geo_offset, L.geo_records, kGeoSize);
+  set_ads(d, 9, "MAP PROJECTION GADS", 0, 0, 0);
+  d[9].type = 'G';
+  for (int k = 0; k < 2; ++k) set_mds(s, L, k, &d[10 + k]);
+  const std::string level0 = s.product_type == "APS" ? "ASA_AP__0PNPDK" : "ASA_IM__0PNPDK";
+  set_refs(d, 12,
+           {"LEVEL 0 PRODUCT", "ASAR PROCESSOR CONFIG", "INSTRUMENT CHARACTERIZATION",
+            "EXTERNAL CHARACTERIZATION", "EXTERNAL CALIBRATION", "ORBIT STATE VECTOR 1"},
+           {level0 + s.product_name.substr(14, 48), kProcessorConfig, s.ins_name,
+            kExternalCharacterisation, s.xca_name, s.orbit_name});
+  return d;
+}
+
 bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
   const Options& o = s.opt;
-  const int nmds = std::max(0, std::min(o.mds_count, kSubSwaths));
+  const int nmds = mds_written(s);
   MphValues m;
   m.product = s.product_name;
   m.proc_time = std::floor(s.t0) + 86400.0;
@@ -384,61 +483,24 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
     sp.corner_lat[i] = s.sph_lat[i];
     sp.corner_lon[i] = s.sph_lon[i];
   }
+  sp.descriptor = s.descriptor;
+  sp.swath = s.swath;
+  sp.algorithm = s.algorithm;
   sp.pass = s.pass;
-  sp.polar1 = s.polar;
+  sp.polar1 = s.ss[0].polar;
+  if (s.images > 1 && !s.wide_swath) sp.polar2 = s.ss[1].polar;
   sp.range_spacing = s.range_spacing;
   sp.azimuth_spacing = s.azimuth_spacing;
   sp.line_interval = s.line_interval;
   sp.line_length = s.ss[0].samples;
 
-  // Data set descriptors in the wide-swath order.
-  std::vector<DsdValues> d(18);
-  auto ads = [&](int i, const char* name, int64_t off, int64_t n, int64_t size) {
-    d[i].name = name;
-    d[i].type = 'A';
-    d[i].offset = off;
-    d[i].size = n * size;
-    d[i].num_dsr = n;
-    d[i].dsr_size = size;
-  };
-  ads(0, "MDS1 SQ ADS", L.sq_offset, kSubSwaths, kSqSize);
-  ads(1, "MAIN PROCESSING PARAMS ADS", L.mpp_offset, kSubSwaths, kMppSize);
-  ads(2, "DOP CENTROID COEFFS ADS", L.dop_offset, L.dop_records, kDopSize);
-  ads(3, "CHIRP PARAMS ADS", L.chirp_offset, kSubSwaths, kChirpSize);
-  ads(4, "MDS1 ANTENNA ELEV PATT ADS", L.ant_offset, kSubSwaths, kAntSize);
-  ads(5, "GEOLOCATION GRID ADS", L.geo_offset, L.geo_records, kGeoSize);
-  ads(6, "SR GR ADS", 0, 0, 55);
-  for (int k = 0; k < kSubSwaths; ++k) {
-    DsdValues& v = d[7 + k];
-    v.name = "MDS" + std::to_string(k + 1);
-    v.type = 'M';
-    if (k < nmds) {
-      v.offset = L.mds_offset[k];
-      v.num_dsr = s.ss[k].records;
-      v.dsr_size = s.ss[k].record_size;
-      v.size = v.num_dsr * v.dsr_size;
-    }
-  }
-  const char* refs[6] = {
-      "LEVEL 0 PRODUCT",      "ASAR PROCESSOR CONFIG", "INSTRUMENT CHARACTERIZATION",
-      "EXTERNAL CALIBRATION", "ORBIT STATE VECTOR 1",  "DOP CENTROID GRID ADS"};
-  const std::string ref_files[6] = {"ASA_WS__0PNPDK" + s.product_name.substr(14, 48),
-                                    "ASA_CON_AXVIEC20070101_000000_20070101_000000_20991231_000000",
-                                    s.ins_name,
-                                    s.xca_name,
-                                    s.orbit_name,
-                                    ""};
-  for (int i = 0; i < 6; ++i) {
-    d[12 + i].name = refs[i];
-    d[12 + i].type = i == 5 ? 'A' : 'R';
-    d[12 + i].filename = ref_files[i];
-  }
+  std::vector<DsdValues> d = s.wide_swath ? wide_swath_dsds(s, L) : image_mode_dsds(s, L);
   // Requested defects in the descriptors.
-  if (o.zero_count >= 0 && o.zero_count <= 6) {
+  if (o.zero_count >= 0) {
     d[o.zero_count].num_dsr = 0;
     d[o.zero_count].size = 0;
   }
-  if (o.dsd_beyond_end >= 0 && o.dsd_beyond_end < 18)
+  if (o.dsd_beyond_end >= 0 && o.dsd_beyond_end < static_cast<int>(d.size()))
     d[o.dsd_beyond_end].offset = L.tot_size + 4096;
 
   Output out;
@@ -448,15 +510,15 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
   out.write(head);
 
   // Annotation data sets.
-  for (int k = 0; k < kSubSwaths; ++k) {
+  for (int k = 0; k < s.images; ++k) {
     Bytes b(kSqSize, 0);
     put_mjd(b, kSqZdt, s.ss[k].first_time);
     out.write(b);
   }
-  for (int k = 0; k < kSubSwaths; ++k) out.write(mpp_record(s, s.ss[k]));
+  for (int k = 0; k < s.images; ++k) out.write(mpp_record(s, s.ss[k]));
   for (int j = 0; j < L.dop_records; ++j) out.write(dop_record(s, j));
-  for (int k = 0; k < kSubSwaths; ++k) out.write(chirp_record(s, s.ss[k]));
-  for (int k = 0; k < kSubSwaths; ++k) {
+  for (int k = 0; k < s.images; ++k) out.write(chirp_record(s.ss[k]));
+  for (int k = 0; k < s.images; ++k) {
     Bytes b;
     if (!ant_record(s, s.ss[k], &b)) {
       *error = "no ground intersection for the antenna pattern records";
@@ -494,7 +556,7 @@ bool write_product(const Scene& s, const ProductLayout& L, std::string* error) {
     Bytes buf;
     buf.reserve(per_chunk * rec);
     for (int r = 0; r < w.records; ++r) {
-      const int i = r % lpb;
+      const int i = lpb > 0 ? r % lpb : 0;  // line within its burst
       const double t = record_time(s, w, r);
       const bool blank = r < o.blank_first || r >= w.records - o.blank_last;
       const size_t base = buf.size();
@@ -616,11 +678,11 @@ bool write_single_record_file(const Scene& s, const std::string& name, const std
 }
 
 double ref_angle(const Scene& s, int slot) {
-  // Slots of the wide-swath sub-swaths carry their centre look angles; the
-  // image-mode-only slots keep nominal values.
-  const double nominal[8] = {16.628, 20.138, 0, 0, 0, 0, 38.058, 0};
-  for (int k = 0; k < kSubSwaths; ++k)
-    if (slot_of(k) == slot) return s.ss[k].elev_centre;
+  // Slots of the scene's images carry their centre look angles; the others
+  // keep nominal values (those of a real calibration file).
+  const double nominal[8] = {16.628, 20.138, 25.243, 29.533, 32.818, 35.633, 38.058, 19.163};
+  for (int k = 0; k < s.images; ++k)
+    if (s.ss[k].xca_slot == slot) return s.ss[k].elev_centre;
   return nominal[slot];
 }
 
@@ -739,20 +801,20 @@ ProductLayout layout_of(const Scene& s) {
   ProductLayout L;
   int64_t off = kMphSize + kWssSphSize;
   L.sq_offset = off;
-  off += kSubSwaths * kSqSize;
+  off += s.images * kSqSize;
   L.mpp_offset = off;
-  off += kSubSwaths * kMppSize;
+  off += s.images * kMppSize;
   L.dop_offset = off;
   L.dop_records = static_cast<int>(s.dop_times.size());
   off += static_cast<int64_t>(L.dop_records) * kDopSize;
   L.chirp_offset = off;
-  off += kSubSwaths * kChirpSize;
+  off += s.images * kChirpSize;
   L.ant_offset = off;
-  off += kSubSwaths * kAntSize;
+  off += s.images * kAntSize;
   L.geo_offset = off;
   L.geo_records = static_cast<int>(geo_order(s).size());
   off += static_cast<int64_t>(L.geo_records) * kGeoSize;
-  const int nmds = std::max(0, std::min(s.opt.mds_count, kSubSwaths));
+  const int nmds = mds_written(s);
   for (int k = 0; k < nmds; ++k) {
     L.mds_offset[k] = off;
     off += static_cast<int64_t>(s.ss[k].records) * s.ss[k].record_size;

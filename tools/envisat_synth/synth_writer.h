@@ -16,7 +16,7 @@ bool write_scene(const Scene& scene, std::string* error);
 struct ProductLayout {
   int64_t sq_offset = 0, mpp_offset = 0, dop_offset = 0, chirp_offset = 0, ant_offset = 0,
           geo_offset = 0;
-  int64_t mds_offset[kSubSwaths] = {0, 0, 0, 0, 0};
+  int64_t mds_offset[kMaxImages] = {0, 0, 0, 0, 0};
   int geo_records = 0, dop_records = 0;
   int64_t tot_size = 0;
 };
