@@ -5,14 +5,98 @@
 
 #include <gtest/gtest.h>
 #include <stdlib.h>
+#include <sys/stat.h>
 
+#include <cmath>
+#include <cstdint>
 #include <cstdio>
+#include <cstdlib>
+#include <cstring>
 #include <string>
+#include <vector>
 
+#include "extraction/images.h"
+#include "orbit/earth_constants.h"
+#include "orbit/geodetic.h"
 #include "runtime/suite_state.h"
 #include "synth_run.h"
 
 namespace extraction_test {
+
+using synth_test::SynthRun;
+
+// Bytes of the time and quality prefix of every line.
+constexpr size_t kPrefix = 17;
+
+inline std::string Text(const SynthRun& run, const std::string& section, const std::string& key) {
+  const auto s = run.truth.find(section);
+  if (s == run.truth.end() || s->second.count(key) == 0) return "nan";
+  return s->second.at(key);
+}
+inline double Value(const SynthRun& run, const std::string& section, const std::string& key) {
+  return std::atof(Text(run, section, key).c_str());
+}
+inline bool Exists(const std::string& path) {
+  struct stat st;
+  return stat(path.c_str(), &st) == 0;
+}
+
+// The orbit file an extraction test hands over: the one the generator wrote,
+// none, or another file.
+constexpr const char* kGeneratedOrbit = nullptr;
+constexpr const char* kNoOrbit = "";
+
+// Runs the extraction of a generated product into <dir>R.
+inline int Extract(const SynthRun& run, images_conf& conf, images* out,
+                   const char* orbit = kGeneratedOrbit) {
+  std::snprintf(out->input.ASA_level1_filename, kImagesNameSize, "%s", run.product.c_str());
+  const std::string orbitFile =
+      orbit == kGeneratedOrbit ? run.dir + Text(run, "Scene", "OrbitFile") : std::string(orbit);
+  std::snprintf(out->input.ASA_dor_vor, kImagesNameSize, "%s", orbitFile.c_str());
+  std::snprintf(out->input.ASA_INS_Filename, kImagesNameSize, "%s%s", run.dir.c_str(),
+                Text(run, "Scene", "InsFile").c_str());
+  std::snprintf(out->output.OutputFile, kImagesNameSize, "%sR", run.dir.c_str());
+  conf.Verbose = 1;
+  return out->run();
+}
+
+// Distance in metres between two points of the ellipsoid given in degrees.
+inline double Distance(double lat1, double lon1, double lat2, double lon2) {
+  double a[3], b[3];
+  const double p1[3] = {lat1 / kRadToDeg, lon1 / kRadToDeg, 0.0};
+  const double p2[3] = {lat2 / kRadToDeg, lon2 / kRadToDeg, 0.0};
+  geo2cart(a, p1);
+  geo2cart(b, p2);
+  return std::sqrt((a[0] - b[0]) * (a[0] - b[0]) + (a[1] - b[1]) * (a[1] - b[1]) +
+                   (a[2] - b[2]) * (a[2] - b[2]));
+}
+
+// Every record of an image's MDS (truth section `section`) against its
+// raster: prefix bytes unchanged, samples the product's big-endian int16
+// values as floats.
+inline void ExpectRasterHoldsEveryRecord(const SynthRun& run, const std::vector<uint8_t>& product,
+                                         const std::string& section, const std::string& raster) {
+  const int samples = static_cast<int>(Value(run, section, "Samples"));
+  const int records = static_cast<int>(Value(run, section, "Records"));
+  const size_t offset = static_cast<size_t>(Value(run, section, "MdsOffset"));
+  const size_t inRecord = kPrefix + 4 * static_cast<size_t>(samples);
+  ASSERT_EQ(static_cast<double>(inRecord), Value(run, section, "RecordSize"));
+  const size_t outRecord = kPrefix + 8 * static_cast<size_t>(samples);
+  const std::vector<uint8_t> out = synth_test::read_file(raster);
+  ASSERT_EQ(out.size(), outRecord * records) << raster;
+  ASSERT_LE(offset + inRecord * records, product.size());
+  for (int r = 0; r < records; ++r) {
+    const uint8_t* in = product.data() + offset + inRecord * r;
+    const uint8_t* line = out.data() + outRecord * r;
+    ASSERT_EQ(std::memcmp(in, line, kPrefix), 0) << raster << " prefix of record " << r;
+    for (int s = 0; s < 2 * samples; ++s) {
+      float v;
+      std::memcpy(&v, line + kPrefix + 4 * s, 4);
+      ASSERT_EQ(v, static_cast<float>(synth_test::be16(in + kPrefix + 2 * s)))
+          << raster << " record " << r << " component " << s;
+    }
+  }
+}
 
 // The host's side of the progress protocol: a working file and its
 // "_batch_ok" companion, so that the copy's progress bar can report.

@@ -32,75 +32,11 @@
 
 namespace {
 
-using synth_test::SynthRun;
+using namespace extraction_test;
 
-constexpr size_t kPrefix = 17;
-
-std::string Text(const SynthRun& run, const std::string& section, const std::string& key) {
-  const auto s = run.truth.find(section);
-  if (s == run.truth.end() || s->second.count(key) == 0) return "nan";
-  return s->second.at(key);
-}
-double Value(const SynthRun& run, const std::string& section, const std::string& key) {
-  return std::atof(Text(run, section, key).c_str());
-}
 std::string Image(int k) {
   return "Image" + std::to_string(k);
 }
-bool Exists(const std::string& path) {
-  struct stat st;
-  return stat(path.c_str(), &st) == 0;
-}
-
-// Runs the extraction of a generated product into <dir>R, with the orbit
-// file the generator wrote or with `orbit`.
-int Extract(const SynthRun& run, images_conf& conf, images* out, const std::string& orbit = "") {
-  std::snprintf(out->input.ASA_level1_filename, kImagesNameSize, "%s", run.product.c_str());
-  const std::string orbitFile = orbit.empty() ? run.dir + Text(run, "Scene", "OrbitFile") : orbit;
-  std::snprintf(out->input.ASA_dor_vor, kImagesNameSize, "%s", orbitFile.c_str());
-  std::snprintf(out->input.ASA_INS_Filename, kImagesNameSize, "%s%s", run.dir.c_str(),
-                Text(run, "Scene", "InsFile").c_str());
-  std::snprintf(out->output.OutputFile, kImagesNameSize, "%sR", run.dir.c_str());
-  conf.Verbose = 1;
-  return out->run();
-}
-
-double Distance(double lat1, double lon1, double lat2, double lon2) {
-  double a[3], b[3];
-  const double p1[3] = {lat1 / kRadToDeg, lon1 / kRadToDeg, 0.0};
-  const double p2[3] = {lat2 / kRadToDeg, lon2 / kRadToDeg, 0.0};
-  geo2cart(a, p1);
-  geo2cart(b, p2);
-  return std::sqrt((a[0] - b[0]) * (a[0] - b[0]) + (a[1] - b[1]) * (a[1] - b[1]) +
-                   (a[2] - b[2]) * (a[2] - b[2]));
-}
-
-// Every record of the image's MDS against its raster: prefix bytes
-// unchanged, samples the product's big-endian int16 values as floats.
-void ExpectRasterHoldsEveryRecord(const SynthRun& run, const std::vector<uint8_t>& product,
-                                  const std::string& section, const std::string& raster) {
-  const int samples = static_cast<int>(Value(run, section, "Samples"));
-  const int records = static_cast<int>(Value(run, section, "Records"));
-  const size_t offset = static_cast<size_t>(Value(run, section, "MdsOffset"));
-  const size_t inRecord = kPrefix + 4 * static_cast<size_t>(samples);
-  ASSERT_EQ(static_cast<double>(inRecord), Value(run, section, "RecordSize"));
-  const size_t outRecord = kPrefix + 8 * static_cast<size_t>(samples);
-  const std::vector<uint8_t> out = synth_test::read_file(raster);
-  ASSERT_EQ(out.size(), outRecord * records) << raster;
-  ASSERT_LE(offset + inRecord * records, product.size());
-  for (int r = 0; r < records; ++r) {
-    const uint8_t* in = product.data() + offset + inRecord * r;
-    const uint8_t* line = out.data() + outRecord * r;
-    ASSERT_EQ(std::memcmp(in, line, kPrefix), 0) << raster << " prefix of record " << r;
-    for (int s = 0; s < 2 * samples; ++s) {
-      float v;
-      std::memcpy(&v, line + kPrefix + 4 * s, 4);
-      ASSERT_EQ(v, static_cast<float>(synth_test::be16(in + kPrefix + 2 * s)))
-          << raster << " record " << r << " component " << s;
-    }
-  }
-}
-
 // A generated product and what the data-set information of its images must
 // say: the acquisition mode of its kind and the polarisation of each image.
 struct Kind {
@@ -346,7 +282,7 @@ TEST(WithoutExtraction, FailingRunRemovesItsHeaderButNeverTheProduct) {
   images_conf conf;
   conf.ExtractData = 0;
   images ex(conf);
-  EXPECT_NE(Extract(run, conf, &ex, vlr_test::kSamplePor), 0);
+  EXPECT_NE(Extract(run, conf, &ex, vlr_test::kSamplePor.c_str()), 0);
   EXPECT_EQ(ex.rasterName(0), run.product);  // the failure came after the names
   EXPECT_EQ(synth_test::read_file(run.product), before);
   EXPECT_FALSE(Exists(run.product + ".hdr"));
