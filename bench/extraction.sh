@@ -36,25 +36,28 @@ samples=$(awk -F' = ' '/^\[SubSwath/ { s = 1 } s && $1 == "Samples" { n = $2 }
 ss1=$(awk -F' = ' '/^\[SubSwath1\]/ { s = 1 } s && $1 == "Samples" { n = $2 }
   s && $1 == "Records" { printf "%.0f", n * $2; exit }' "$work/synth_truth.txt")
 
-best() {  # best wall time of three runs of a command
-  b=
-  for i in 1 2 3; do
-    t0=$(date +%s.%N)
-    "$@" > /dev/null 2>&1
-    t1=$(date +%s.%N)
-    t=$(awk "BEGIN { print $t1 - $t0 }")
-    if [ -z "$b" ] || awk "BEGIN { exit !($t < $b) }"; then b=$t; fi
-    rm -f "$work"/R? "$work"/R?.hdr "$work"/dd.bin "$work"/gdal.bin*
-    sync
-  done
-  echo "$b"
+# One timed run of a command; its outputs are removed and the file system
+# synchronised after it, so that no run pays for an earlier one's writes.
+timed() {
+  t0=$(date +%s.%N)
+  "$@" > /dev/null 2>&1
+  t1=$(date +%s.%N)
+  rm -f "$work"/R? "$work"/R?.hdr "$work"/dd.bin "$work"/gdal.bin*
+  sync
+  awk "BEGIN { print $t1 - $t0 }"
 }
+min() { awk -v a="$1" -v b="$2" 'BEGIN { print (b == "" || a < b) ? a : b }'; }
 
+# Rounds of all four commands, interleaved so that a slow spell of the
+# machine does not fall on one of them only; the best time of each counts.
 cat "$product" > /dev/null
-read_s=$(best cat "$product")
-write_s=$(best dd if=/dev/zero of="$work/dd.bin" bs=1M count=$(( 2 * bytes / 1048576 )))
-gdal_s=$(best gdal_translate -q -of ENVI -ot CFloat32 -b 1 "$product" "$work/gdal.bin")
-ours_s=$(best "$build/bin/bench_extraction" "$product" "$work/R")
+read_s=; write_s=; gdal_s=; ours_s=
+for round in 1 2 3 4 5; do
+  read_s=$(min "$(timed cat "$product")" "$read_s")
+  write_s=$(min "$(timed dd if=/dev/zero of="$work/dd.bin" bs=1M count=$(( 2 * bytes / 1048576 )))" "$write_s")
+  ours_s=$(min "$(timed "$build/bin/bench_extraction" "$product" "$work/R")" "$ours_s")
+  gdal_s=$(min "$(timed gdal_translate -q -of ENVI -ot CFloat32 -b 1 "$product" "$work/gdal.bin")" "$gdal_s")
+done
 "$build/bin/bench_extraction" "$product" "$work/R" > "$work/last.txt"
 rss=$(awk '$1 == "peak_rss_mib" { print $2 }' "$work/last.txt")
 
