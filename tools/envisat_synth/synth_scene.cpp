@@ -203,6 +203,18 @@ double mean_power(const Pattern& p, const SubSwath& w) {
   return 2.0 * (p.scale * p.scale * taper + 1.0 / 12.0);
 }
 
+// Time and range of the centre an importer states in its header.
+double header_centre_time(const Scene& s, const SubSwath& w) {
+  if (s.wide_swath && w.lines_per_burst > 0) {
+    const double bursts = std::round(static_cast<double>(w.records) / w.lines_per_burst);
+    return w.first_time + bursts * s.burst_cycle / 2;
+  }
+  return (w.first_time + w.last_time) / 2;
+}
+double header_centre_tau(const Scene& s, const SubSwath& w) {
+  return w.near_tau + std::ceil(w.samples / 2.0) / s.fs;
+}
+
 // Corners, centre, reference look angle and FM rate of an image whose
 // timing and range are set.
 bool derive_geometry(const Scene& s, SubSwath* w, std::string* error) {
@@ -211,7 +223,8 @@ bool derive_geometry(const Scene& s, SubSwath* w, std::string* error) {
   if (!corner(s, w->first_time, w->near_tau, &w->first_near) ||
       !corner(s, w->first_time, w->far_tau, &w->first_far) ||
       !corner(s, w->last_time, w->near_tau, &w->last_near) ||
-      !corner(s, w->last_time, w->far_tau, &w->last_far) || !corner(s, tc, tauc, &w->centre)) {
+      !corner(s, w->last_time, w->far_tau, &w->last_far) || !corner(s, tc, tauc, &w->centre) ||
+      !corner(s, header_centre_time(s, *w), header_centre_tau(s, *w), &w->header_centre)) {
     *error = "no ground intersection for the scene geometry";
     return false;
   }

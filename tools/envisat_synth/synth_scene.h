@@ -68,6 +68,10 @@ struct SubSwath {
   double first_time = 0, last_time = 0;
   float time_diff = 0;
   Corner first_near, first_far, last_near, last_far, centre;
+  // The centre an importer states in its header: the middle sample
+  // (half the samples, rounded up) and, for bursts, half the bursts' cycles
+  // after the first line (else the middle line).
+  Corner header_centre;
   double chirp_power = 0;
   int dop_delta = 0;
   double rg_window_coef = 0, az_window_coef = 0, az_look_bw = 0;

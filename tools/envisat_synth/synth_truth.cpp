@@ -55,6 +55,11 @@
 //   CentreTime, CentreRangeTime middle of the first/last lines and near/far
 //   Near/Centre/FarIncidence, CentreLookAngle
 //   FirstNear/FirstFar/LastNear/LastFar/Centre Lat and Lon
+//   HeaderCentreTime, HeaderCentreRangeTime, HeaderCentreLat/Lon
+//                               the centre an importer states in its header:
+//                               the middle sample (half the samples rounded
+//                               up), and half the bursts' cycles after the
+//                               first line (image products: the middle line)
 //   MdsOffset, RecordSize
 //   RangeWindowType, RangeWindowCoefficient, AzimuthWindowType,
 //   AzimuthWindowCoefficient, AzimuthLookBandwidth
@@ -203,6 +208,10 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
       t.num(std::string(n[i]) + "Lat", c[i]->lat, "%.7f");
       t.num(std::string(n[i]) + "Lon", c[i]->lon, "%.7f");
     }
+    t.time("HeaderCentreTime", w.header_centre.t);
+    t.num("HeaderCentreRangeTime", w.header_centre.tau, "%.15e");
+    t.num("HeaderCentreLat", w.header_centre.lat, "%.7f");
+    t.num("HeaderCentreLon", w.header_centre.lon, "%.7f");
     t.integer("MdsOffset", L.mds_offset[k]);
     t.integer("RecordSize", w.record_size);
     t.text("RangeWindowType", "HAMMING");
