@@ -64,7 +64,7 @@ struct images::Run {
   int elementSize = 4;  // bytes of one sample in the product
   double sensingStart = 0.0, sensingStop = 0.0;
   double burstCycle = 0.0;
-  int32_t summedLines = 0;  // output lines over all main-parameters records
+  int64_t summedLines = 0;  // output lines over all main-parameters records
 };
 
 int images::run() {
@@ -175,7 +175,7 @@ int images::runSteps(Run& r) {
   }
   if (r.mpp.count() < 1) VLR_FAIL("No main processing parameters record", vlr::kLibInconsistent);
   for (int i = 0; i < r.mpp.count(); ++i) {
-    r.summedLines += static_cast<int32_t>(r.mpp.record(i).u32(asar::mpp::kNumOutputLines));
+    r.summedLines += r.mpp.record(i).u32(asar::mpp::kNumOutputLines);
   }
 
   // Sensing start and stop.
@@ -304,17 +304,22 @@ int images::processImage(Run& r, int k) {
   // overlap in time); its region describes the zero-Doppler line grid.
   const double farTime = nearTime + (samples - 1.0) * rangeInterval;
   const double interval = h.lineTimeInterval;
-  int32_t lineTimes = 0;
+  int64_t lineTimes = 0;
   if (wss) {
-    lineTimes = static_cast<int32_t>(std::lround((last - first) / interval)) + 1;
+    const double steps = (last - first) / interval;
+    // Far beyond any product: a damaged time or interval, not a line grid.
+    if (!(steps >= 0.0 && steps < 1e9)) {
+      VLR_FAIL(NVLR_UTILITY_Format("Image %d: impossible line timing", k + 1).c_str(),
+               vlr::kLibInconsistent);
+    }
+    lineTimes = std::llround(steps) + 1;
   } else {
-    lineTimes =
-        kind.linesSummed ? r.summedLines : static_cast<int32_t>(m.u32(asar::mpp::kNumOutputLines));
+    lineTimes = kind.linesSummed ? r.summedLines : m.u32(asar::mpp::kNumOutputLines);
     if (lineTimes != records) {
-      VLR_FAIL(
-          NVLR_UTILITY_Format("Image %d: %d output lines but %d records", k + 1, lineTimes, records)
-              .c_str(),
-          vlr::kLibInconsistent);
+      VLR_FAIL(NVLR_UTILITY_Format("Image %d: %lld output lines but %d records", k + 1,
+                                   static_cast<long long>(lineTimes), records)
+                   .c_str(),
+               vlr::kLibInconsistent);
     }
   }
   if (lineTimes < 1) VLR_FAIL("Image without lines", vlr::kLibInconsistent);
@@ -507,7 +512,7 @@ int images::processImage(Run& r, int k) {
   region.roi.FastTimeLength = farTime - nearTime;
   region.roi.SlowStartTime = 0.0;
   region.roi.SlowTimeDelta = interval;
-  region.roi.Lines = lineTimes;
+  region.roi.Lines = static_cast<int>(lineTimes);
   region.roi.SlowTimeLength = last - first;
   VLR_CALL(region.writehdr(hdr));
 
