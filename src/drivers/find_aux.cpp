@@ -20,15 +20,6 @@ constexpr long kMphSensingStartOffset = 351;
 constexpr size_t kUtcTextLength = 27;
 constexpr const char* kListName = "ASA_AUX_list.dat";
 
-// A date text as sec85; false when it is not a date (an empty text
-// included), so that a broken date never passes for 1-JAN-1985.
-bool ParseDate(const char* text, double* t85) {
-  DateFields fields;
-  if (date2str(text, &fields) != 0) return false;
-  *t85 = ascii2sec85(text);
-  return true;
-}
-
 }  // namespace
 
 int find_aux(const char* product, const char* directory, const char* type, std::string& result) {
@@ -41,7 +32,7 @@ int find_aux(const char* product, const char* directory, const char* type, std::
   std::fclose(f);
   if (!read) VLR_FAIL("File reading failed!", 4);
   double productDate = 0.0;
-  if (!ParseDate(start, &productDate)) {
+  if (!parse_sec85(start, &productDate)) {
     VLR_FAIL(NVLR_UTILITY_Format("Sensing start of %s is not a date: \"%s\"", product,
                                  EnvisatPrintable(start).c_str())
                  .c_str(),
@@ -73,13 +64,13 @@ int find_aux(const char* product, const char* directory, const char* type, std::
     const bool hasStop = GetMyProfileString(section.c_str(), "StopDate", stopText, sizeof stopText,
                                             list.c_str()) == 0;
     double startDate = 0.0, stopDate = 0.0;
-    if (!ParseDate(startText, &startDate)) {
+    if (!parse_sec85(startText, &startDate)) {
       VLR_FAIL(NVLR_UTILITY_Format("StartDate of [%s] in %s is not a date: \"%s\"", section.c_str(),
                                    list.c_str(), EnvisatPrintable(startText).c_str())
                    .c_str(),
                10);
     }
-    if (!hasStop || !ParseDate(stopText, &stopDate)) {
+    if (!hasStop || !parse_sec85(stopText, &stopDate)) {
       VLR_FAIL(
           NVLR_UTILITY_Format("StopDate of [%s] in %s is missing or not a date: \"%s\"",
                               section.c_str(), list.c_str(), EnvisatPrintable(stopText).c_str())

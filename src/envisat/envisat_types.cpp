@@ -66,14 +66,12 @@ int has_code(const char* path, const char* code) {
 bool utc_at(const char* path, long offset, const char* name, double* t85) {
   char text[kUtcTextWidth + 1] = {0};
   if (!read_at(path, offset, text, kUtcTextWidth)) return false;
-  DateFields fields;
-  if (date2str(text, &fields) != 0) {
+  if (!parse_sec85(text, t85)) {
     const std::string message = NVLR_UTILITY_Format("%s of %s is not a date: \"%s\"", name, path,
                                                     EnvisatPrintable(text).c_str());
     are_add_report(message.c_str(), ARE_ERROR, __LINE__, "check_dorvor", kModule);
     return false;
   }
-  *t85 = ascii2sec85(text);
   return true;
 }
 

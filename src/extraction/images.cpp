@@ -181,8 +181,8 @@ int images::runSteps(Run& r) {
   // Sensing start and stop.
   const std::string& startText = kind.sensingFromMph ? h.sensingStart : h.firstLineTime;
   const std::string& stopText = kind.sensingFromMph ? h.sensingStop : h.lastLineTime;
-  if (!asar::ParseUtcText(startText, &r.sensingStart) ||
-      !asar::ParseUtcText(stopText, &r.sensingStop)) {
+  if (!parse_sec85(startText.c_str(), &r.sensingStart) ||
+      !parse_sec85(stopText.c_str(), &r.sensingStop)) {
     VLR_FAIL("Sensing start or stop time does not parse", vlr::kLibInconsistent);
   }
   VLR_REPORT(NVLR_UTILITY_Format("Sensing start time from SPH: %f\n", r.sensingStart).c_str(),

@@ -82,7 +82,7 @@ int get_first_last(const char* product, int64_t offset, int64_t recordSize, int6
       found = true;
     }
   }
-  if (!found && !asar::ParseUtcText(timing.firstLineText, first)) {
+  if (!found && !parse_sec85(timing.firstLineText.c_str(), first)) {
     VLR_FAIL("No valid line and no first line time", vlr::kLibInconsistent);
   }
   found = false;
@@ -94,7 +94,7 @@ int get_first_last(const char* product, int64_t offset, int64_t recordSize, int6
       found = true;
     }
   }
-  if (!found && !asar::ParseUtcText(timing.lastLineText, last)) {
+  if (!found && !parse_sec85(timing.lastLineText.c_str(), last)) {
     VLR_FAIL("No valid line and no last line time", vlr::kLibInconsistent);
   }
   if (!(*last >= *first)) VLR_FAIL("Last line before the first line", vlr::kLibInconsistent);

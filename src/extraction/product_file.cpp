@@ -3,9 +3,6 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cmath>
-
-#include "time/date_text.h"
 
 namespace asar {
 
@@ -31,13 +28,6 @@ bool ReadFullyAt(int fd, void* out, size_t n, int64_t offset) {
     offset += got;
   }
   return true;
-}
-
-bool ParseUtcText(const std::string& text, double* t) {
-  DateFields fields;
-  if (text.empty() || date2str(text.c_str(), &fields) != 0) return false;
-  *t = ascii2sec85(text.c_str());
-  return std::isfinite(*t);
 }
 
 }  // namespace asar

@@ -1,10 +1,9 @@
-// Small file helpers of the extraction: a descriptor closed on every path,
-// exact positioned reads, and UTC texts of the product headers.
+// Small file helpers of the extraction: a descriptor closed on every path
+// and exact positioned reads.
 #pragma once
 
 #include <cstddef>
 #include <cstdint>
-#include <string>
 
 namespace asar {
 
@@ -27,9 +26,5 @@ class ScopedFd {
 // Reads exactly n bytes at `offset`, retrying short and interrupted reads;
 // false on an error or the end of the file.
 bool ReadFullyAt(int fd, void* out, size_t n, int64_t offset);
-
-// A UTC text ("02-MAR-2008 10:00:00.000000") as sec85; false when it is not
-// a date.
-bool ParseUtcText(const std::string& text, double* t);
 
 }  // namespace asar

@@ -110,6 +110,15 @@ double ascii2sec85(const char* text) {
   return seconds;
 }
 
+bool parse_sec85(const char* text, double* t) {
+  double seconds = 0.0;
+  if (text == nullptr || DateDiff(text, "1-JAN-1985", &seconds) != 0 || !std::isfinite(seconds)) {
+    return false;
+  }
+  *t = seconds;
+  return true;
+}
+
 int sec852myascii(double t, char* buffer) {
   if (std::isnan(t)) {
     std::fputs("Date is not a valid time\n", stderr);

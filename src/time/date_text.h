@@ -47,6 +47,9 @@ int DateDiff(const char* a, const char* b, double* seconds);
 // A date text as sec85.  On an invalid text prints "Error: incorrect date
 // format, code %d" to stderr and returns 0.0.
 double ascii2sec85(const char* text);
+// The checked form for texts read from files: false (t untouched) when the
+// text is not a date, so that a broken date never passes for 1-JAN-1985.
+bool parse_sec85(const char* text, double* t);
 
 // Writes the date text of sec85 time t into `buffer` (kSec85TextSize bytes).
 // The fraction is truncated to whole microseconds; a time within one unit of

@@ -16,6 +16,9 @@
 #include <vector>
 
 #include "extraction/images.h"
+#include "metadata_sections/sampling_constants.h"
+#include "metadata_sections/sar_pulse.h"
+#include "metadata_sections/spectral_windows.h"
 #include "orbit/earth_constants.h"
 #include "orbit/geodetic.h"
 #include "runtime/suite_state.h"
@@ -121,6 +124,37 @@ class HostWorkingFile : public ::testing::Environment {
  private:
   std::string dir_;
 };
+
+// The sampling constants, spectral windows and pulse of an image's header
+// against the truth section `s`.
+// `burstCycle` is 0 for images without bursts.
+inline void ExpectSamplingWindowsAndPulse(const SynthRun& run, const std::string& s,
+                                          const std::string& hdr, double burstCycle) {
+  SamplingConstants_Obj sc;
+  ASSERT_EQ(sc.readhdr(hdr.c_str()), 0);
+  EXPECT_NEAR(sc.prf_hz, Value(run, s, "PRF"), 1e-3);
+  if (burstCycle > 0.0) {
+    EXPECT_NEAR(sc.bri_s, burstCycle, 1e-9);
+  } else {
+    EXPECT_EQ(sc.bri_s, 0.0);
+  }
+  EXPECT_NEAR(sc.fc_hz, Value(run, "Scene", "CarrierFrequency"), 1e3);
+  EXPECT_NEAR(sc.frg_hz, Value(run, "Scene", "RangeSamplingRate"), 1.0);
+  EXPECT_NEAR(sc.Brg_hz, Value(run, s, "PulseBandwidth"), 1.0);
+
+  SpectralWindows_Obj sw;
+  ASSERT_EQ(sw.readhdr(hdr.c_str()), 0);
+  EXPECT_NEAR(sw.RgLookBandwidth, Value(run, s, "RangeLookBandwidth"), 1.0);
+  EXPECT_NEAR(sw.AzLookBandwidth, Value(run, s, "AzimuthLookBandwidth"), 1e-3);
+  EXPECT_STREQ(sw.RgMatchedFilterType, Text(run, s, "RangeWindowType").c_str());
+  EXPECT_STREQ(sw.AzMatchedFilterType, Text(run, s, "AzimuthWindowType").c_str());
+  EXPECT_NEAR(sw.RgMatchedFilterCoef, Value(run, s, "RangeWindowCoefficient"), 1e-6);
+  EXPECT_NEAR(sw.AzMatchedFilterCoef, Value(run, s, "AzimuthWindowCoefficient"), 1e-6);
+
+  SARPulse_Obj pulse;
+  ASSERT_EQ(pulse.readhdr(hdr.c_str()), 0);
+  EXPECT_NEAR(pulse.PulseLength, Value(run, s, "PulseLength"), 1e-12);
+}
 
 // One object for the whole program (an inline variable is initialised once).
 inline ::testing::Environment* const kHostWorkingFile =

@@ -76,26 +76,7 @@ TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
     EXPECT_NEAR(swath.ChirpPower, Value(run, s, "ChirpPower"), 1e-6);
     EXPECT_NEAR(swath.NoisePower, Value(run, s, "NoisePower"), 1e-6);
 
-    SamplingConstants_Obj sc;
-    ASSERT_EQ(sc.readhdr(hdr.c_str()), 0);
-    EXPECT_NEAR(sc.prf_hz, Value(run, s, "PRF"), 1e-3);
-    EXPECT_NEAR(sc.bri_s, cycle, 1e-9);
-    EXPECT_NEAR(sc.fc_hz, Value(run, "Scene", "CarrierFrequency"), 1e3);
-    EXPECT_NEAR(sc.frg_hz, Value(run, "Scene", "RangeSamplingRate"), 1.0);
-    EXPECT_NEAR(sc.Brg_hz, Value(run, s, "PulseBandwidth"), 1.0);
-
-    SpectralWindows_Obj sw;
-    ASSERT_EQ(sw.readhdr(hdr.c_str()), 0);
-    EXPECT_NEAR(sw.RgLookBandwidth, Value(run, s, "RangeLookBandwidth"), 1.0);
-    EXPECT_NEAR(sw.AzLookBandwidth, Value(run, s, "AzimuthLookBandwidth"), 1e-3);
-    EXPECT_STREQ(sw.RgMatchedFilterType, Text(run, s, "RangeWindowType").c_str());
-    EXPECT_STREQ(sw.AzMatchedFilterType, Text(run, s, "AzimuthWindowType").c_str());
-    EXPECT_NEAR(sw.RgMatchedFilterCoef, Value(run, s, "RangeWindowCoefficient"), 1e-6);
-    EXPECT_NEAR(sw.AzMatchedFilterCoef, Value(run, s, "AzimuthWindowCoefficient"), 1e-6);
-
-    SARPulse_Obj pulse;
-    ASSERT_EQ(pulse.readhdr(hdr.c_str()), 0);
-    EXPECT_NEAR(pulse.PulseLength, Value(run, s, "PulseLength"), 1e-12);
+    ExpectSamplingWindowsAndPulse(run, s, hdr, cycle);
 
     // The region: the zero-Doppler line grid of the sub-swath.
     const double first = Value(run, s, "FirstLineTime");
