@@ -1,13 +1,16 @@
 // "main_import_ESA#": ASAR wide-swath product to five sub-swath rasters.
+#include <cerrno>
 #include <cstdio>
 #include <cstring>
 #include <string>
 #include <vector>
 
+#include "convert/imagesar_kestova.h"
 #include "drivers/driver_arguments.h"
 #include "drivers/drivers.h"
 #include "drivers/find_aux.h"
 #include "extraction/images.h"
+#include "profile/profile_par.h"
 #include "runtime/call_scope.h"
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
@@ -22,6 +25,9 @@ constexpr const char* kTitle = "Import ESA Products";
 // The product-type characters of the MPH product name ("WSS" in ASA_WSS_1P...).
 constexpr long kProductTypeOffset = 13;
 constexpr size_t kProductTypeLength = 3;
+constexpr const char* kParameterFile = "import_esa.hdr";
+constexpr const char* kParameterSection = "GeneralProcessingConf";
+constexpr int kSubSwaths = 5;
 
 enum ImportArgument : size_t { kProduct = 0, kDoris = 1, kXca = 2, kOutputRoot = 3, kIns = 4 };
 
@@ -36,6 +42,25 @@ int readProductType(const char* product, std::string& type) {
   std::fclose(f);
   if (!read) VLR_FAIL("File reading failed!", vlr::kLibRead);
   type = chars;
+  return 0;
+}
+
+// Writes the list file root: one line "<root>k_slc" per sub-swath.  It is
+// written beside and renamed over the target, so the host never reads a
+// partial list.
+int writeListFile(const std::string& root) {
+  VLR_SCOPE("writeListFile", kModule);
+  const std::string temporary = root + ".list_tmp";
+  FILE* f = std::fopen(temporary.c_str(), "w");
+  if (f == nullptr) VLR_FAIL("File not opened!", vlr::kLibOpen);
+  bool written = true;
+  for (int k = 1; k <= kSubSwaths; ++k)
+    written = std::fprintf(f, "%s%d_slc\n", root.c_str(), k) > 0 && written;
+  written = std::fclose(f) == 0 && written;
+  if (!written || std::rename(temporary.c_str(), root.c_str()) != 0) {
+    std::remove(temporary.c_str());
+    VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  }
   return 0;
 }
 
@@ -54,6 +79,13 @@ int fvlr_main_import_esa(const char* argumentText) {
 
   std::string directory;
   NVLR_UTILITY_GetEnvCode(directory, "VELORAN_CEOS_DES_FILES_DIR");
+  // The report level is handed to the conversion, which does not use it: a
+  // parameter file without it keeps the default.
+  int reportLevel = 1;
+  const std::string parameterFile = directory + kParameterFile;
+  if (GetParInt(parameterFile.c_str(), "ReportLevel", 1, &reportLevel, 1, kParameterSection) != 0)
+    reportLevel = 1;
+  const std::string& root = DriverArgument(args, kOutputRoot);
 
   const std::string& product = DriverArgument(args, kProduct);
   if (product == vlr::kNotOK) {
@@ -84,15 +116,21 @@ int fvlr_main_import_esa(const char* argumentText) {
   if (!vlr::CopyDriverName(product, extraction.input.ASA_level1_filename) ||
       !vlr::CopyDriverName(orbit, extraction.input.ASA_dor_vor) ||
       !vlr::CopyDriverName(insPath, extraction.input.ASA_INS_Filename) ||
-      !vlr::CopyDriverName(DriverArgument(args, kOutputRoot), extraction.output.OutputFile)) {
+      !vlr::CopyDriverName(root, extraction.output.OutputFile)) {
     VLR_FAIL("File name too long", vlr::kLibInconsistent);
   }
   conf.Memory = 256;
   conf.ReportLevel = 1;
   conf.Incore = 0;
   conf.Verbose = 0;
+  // A list file of an earlier run over the same root would name rasters that
+  // this run replaces: it goes first, and the new one is written only when
+  // all five sub-swaths are complete.
+  if (NVLR_UTILITY_FileExists(root.c_str()) && std::remove(root.c_str()) != 0)
+    VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  errno = 0;
   VLR_CALL(extraction.run());
-  // The conversion to the suite header is not part of this build.
-  NVLR_UTILITY_RaiseError(vlr::kCodeProcessingStepFailed, kModule, __LINE__,
-                          "conversion not available");
+  VLR_CALL(tessal2kestova(root.c_str(), xcaPath.c_str(), reportLevel));
+  VLR_CALL(writeListFile(root));
+  return 0;
 }

@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cmath>
 #include <cstdio>
 #include <cstring>
@@ -340,6 +341,8 @@ int images::processImage(Run& r, int k) {
     VLR_REPORT("Cannot remove file", ARE_WARNING);
   if (stat(header.c_str(), &st) == 0 && std::remove(header.c_str()) != 0)
     VLR_REPORT("Cannot remove file", ARE_WARNING);
+  // A raster or header that is not there yet leaves ENOENT behind.
+  errno = 0;
   std::snprintf(rasterNames_[k], kImagesNameSize, "%s", raster.c_str());
   std::snprintf(headerNames_[k], kImagesNameSize, "%s", header.c_str());
   const char* hdr = headerNames_[k];

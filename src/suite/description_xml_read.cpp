@@ -363,7 +363,10 @@ class SectionReader {
     for (int r = node(matrixNode).firstChild; r != kNoNode; r = node(r).nextSibling)
       widest = std::max(widest, node(r).childCount);
     const int rows = count(matrixNode, "NumberOfRows", node(matrixNode).childCount);
-    const int columns = count(matrixNode, "NumberOfColumns", widest);
+    // A matrix without rows (an empty polynomial family, say) still states
+    // its width; it holds no element, so any width up to the limit is fine.
+    const int columns =
+        count(matrixNode, "NumberOfColumns", rows == 0 ? CVLR_DS_MAX_ELEMENTS : widest);
     if (static_cast<long long>(rows) * columns > CVLR_DS_MAX_ELEMENTS)
       fail("matrix of " + std::to_string(rows) + " x " + std::to_string(columns) + " is too large");
     field.resize(rows, columns);

@@ -191,6 +191,10 @@ TEST_F(HeaderXml, EveryShapeAndValueReadsBackExactly) {
   CDescriptionHeader read = header({"Shapes", "Other"});
   ASSERT_TRUE(readHeader(read, work("round").c_str(), 1));
   expectFilled(read);
+  // A matrix without rows keeps its width.
+  EXPECT_EQ(readCode(wrap("      <Grid><DoubleMatrix NumberOfRows = \"0\" NumberOfColumns = "
+                          "\"7\"></DoubleMatrix></Grid>\n")),
+            0);
 }
 
 TEST_F(HeaderXml, WrittenFileHasTheHeaderLayout) {

@@ -1,0 +1,276 @@
+// The suite header of a converted sub-swath against the generator's truth,
+// closed forms and the library header read on its own.
+#include <sys/stat.h>
+
+#include <cmath>
+#include <string>
+#include <vector>
+
+#include "convert_fixture.h"
+#include "orbit/interp_orb_l.h"
+#include "runtime/environment.h"
+
+namespace {
+
+using namespace convert_test;
+
+TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
+  const int k = 2;
+  const std::string s = swath(k);
+  const std::string raster = copySwath(k, "R2");
+  const std::string name = raster + "_slc_hdr";
+  vlr_test::WriteFile(name + "_orb.sml", "an older orbit header");
+  ASSERT_EQ(writehdr_kestova((raster + ".hdr").c_str(), name.c_str(), vlr_test::kSampleXca.c_str()),
+            0);
+  EXPECT_FALSE(vlr_test::Exists(name + "_orb.sml"));
+  EXPECT_TRUE(vlr_test::Exists(raster + "_slc.sml"));
+  EXPECT_TRUE(vlr_test::Exists(raster + "_slc.hdr"));
+  EXPECT_EQ(ckerr_count(), 0);
+  const auto lib = library(raster + ".hdr");
+  const auto hp = suiteHeader(name);
+  CDescriptionHeader& h = *hp;
+
+  // State vectors: the library's, value for value.
+  const GeneralSAROrbit& orbit = lib->orbit;
+  ASSERT_EQ(I(h, "nStateVectors"), orbit.n());
+  EXPECT_EQ(S(h, "TimeFirst"), DateText(orbit.t0()));
+  EXPECT_EQ(D(h, "TimeDelta"), orbit.dt());
+  const char* components[] = {"pos_x", "pos_y", "pos_z", "vel_x", "vel_y", "vel_z"};
+  for (int c = 0; c < 6; ++c) {
+    ASSERT_EQ(F(h, components[c])->columns(), orbit.n()) << components[c];
+    const double* v = c < 3 ? orbit.positions() : orbit.velocities();
+    for (int i = 0; i < orbit.n(); ++i) EXPECT_EQ(D(h, components[c], i), v[3 * i + c % 3]);
+  }
+
+  // Geometry: near, middle and far slant range, spacings and times.
+  const double nearTime = value(s, "NearRangeTime"), farTime = value(s, "FarRangeTime");
+  for (int i = 0; i < 3; ++i)
+    EXPECT_NEAR(D(h, "SlantRange", i),
+                (nearTime + i * (farTime - nearTime) / 2) * kHalfSpeedOfLight, 0.05);
+  EXPECT_NEAR(D(h, "FastTime"), nearTime, 3e-10);
+  EXPECT_NEAR(D(h, "PixelSpacingRg"), value("Scene", "RangeSpacing"), 1e-6);
+  // The generator's spacing: ground distance per line at mid swath.
+  const double spacingAz = value("Scene", "AzimuthSpacing");
+  EXPECT_NEAR(D(h, "PixelSpacingAz"), spacingAz, 0.005 * spacingAz);
+  EXPECT_NEAR(D(h, "ProcessingVelocity"), spacingAz / value("Scene", "LineTimeInterval"),
+              0.005 * spacingAz / value("Scene", "LineTimeInterval"));
+  EXPECT_EQ(S(h, "AzimuthStartTime"), truth("Scene", "SensingStartText"));
+  EXPECT_NEAR(Sec85(S(h, "AzimuthStopTime")),
+              value("Scene", "SensingStart") + value(s, "LastLineTime") - value(s, "FirstLineTime"),
+              2e-6);
+  EXPECT_EQ(I(h, "NAzimuthLooks"), 1);
+  EXPECT_EQ(I(h, "NRangeLooks"), 1);
+
+  // Doppler centroid and rate of the sub-swath.
+  double dopTime = 0, dopC0 = 0, dopC1 = 0;
+  ASSERT_EQ(
+      std::sscanf(truth(s, "DopplerRecord0").c_str(), "%lf %lf %lf", &dopTime, &dopC0, &dopC1), 3);
+  ASSERT_EQ(I(h, "nDopCenDataSet"), 2);
+  EXPECT_NEAR(Sec85(S(h, "DopCenRefTime")), dopTime, 1e-6);
+  EXPECT_NEAR(D(h, "DopCenRgRefTime"), value(s, "DopplerRangeTime"), 1e-12);
+  EXPECT_EQ(getInteger(F(h, "DopCenPol_nCoeff"), 1), 5);
+  EXPECT_NEAR(getDoubleAt(F(h, "DopCenRangeCoeff"), 0, 0), dopC0, 1e-3);
+  EXPECT_NEAR(getDoubleAt(F(h, "DopCenRangeCoeff"), 0, 1), dopC1, std::fabs(dopC1) * 1e-6);
+  ASSERT_EQ(I(h, "nDopRateDataSet"), 1);
+  const char* rate[] = {"FmRateC0", "FmRateC1", "FmRateC2"};
+  for (int c = 0; c < 3; ++c) {
+    EXPECT_NEAR(getDoubleAt(F(h, "DopRateRangeCoeff"), 0, c), value(s, rate[c]),
+                std::fabs(value(s, rate[c])) * 1e-6);
+  }
+
+  // Sampling, pulse, calibration, bursts.
+  EXPECT_NEAR(D(h, "CarrierFrequency"), value("Scene", "CarrierFrequency"), 1e3);
+  EXPECT_NEAR(D(h, "SamplingRate"), value("Scene", "RangeSamplingRate"), 1.0);
+  EXPECT_NEAR(D(h, "PRF"), value(s, "PRF"), 1e-3);
+  EXPECT_NEAR(D(h, "PRFExtracted"), value(s, "PRF"), 1e-3);
+  EXPECT_NEAR(D(h, "PulseDuration"), value(s, "PulseLength"), 1e-12);
+  EXPECT_NEAR(D(h, "BandWidth"), value(s, "PulseBandwidth"), 1.0);
+  EXPECT_NEAR(D(h, "CalConstProc"), value(s, "ExternalCalibrationFactor"), 1e-2);
+  EXPECT_EQ(I(h, "Rank"), value(s, "Rank"));
+  EXPECT_EQ(I(h, "Echoes_per_burst"), value(s, "EchoesPerBurst"));
+  EXPECT_EQ(I(h, "Lines_per_burst"), value(s, "LinesPerBurst"));
+  EXPECT_EQ(I(h, "Bursts"), value(s, "Bursts"));
+  EXPECT_EQ(I(h, "Order"), 2);  // SS2 is third in the burst sequence
+  EXPECT_NEAR(D(h, "Acquisition_Start_Time"), value(s, "AcquisitionStartTime"), 1e-6);
+  EXPECT_NEAR(D(h, "NoisePower"), value(s, "NoisePower"), 1e-6);
+  EXPECT_NEAR(D(h, "ChirpPower"), value(s, "ChirpPower"), 1e-6);
+  EXPECT_NEAR(D(h, "Inter_Burst_Time"), value("Scene", "BurstCycle"), 1e-9);
+  EXPECT_NEAR(D(h, "RgFilterCoeff"), value(s, "RangeWindowCoefficient"), 1e-6);
+  EXPECT_NEAR(D(h, "AzWinCoeff"), value(s, "AzimuthWindowCoefficient"), 1e-6);
+  EXPECT_EQ(D(h, "RO_REF"), lib->dataSetInfo.RO_REF);
+
+  // Raster layout of the extracted raster.
+  EXPECT_EQ(S(h, "CellType"), "FLOAT_COMPLEX");
+  EXPECT_EQ(S(h, "DataUnits"), "SLC");
+  EXPECT_EQ(I(h, "NrOfPixelsPerLine"), value(s, "Samples"));
+  EXPECT_EQ(I(h, "NrOfLinesPerImage"), value(s, "Records"));
+  EXPECT_EQ(I(h, "RowPrefix"), 17);
+  EXPECT_EQ(I(h, "HeaderOffset"), 0);
+  EXPECT_EQ(S(h, "BytesOrder"), "LSBF");
+
+  // Scene centre and corners.
+  const geoCoords_Obj& g = lib->geoCoords;
+  EXPECT_NEAR(D(h, "LatNorthing"), value(s, "HeaderCentreLat"), 2e-5);
+  EXPECT_NEAR(D(h, "LonEasting"), value(s, "HeaderCentreLon"), 2e-5);
+  EXPECT_EQ(D(h, "IncidenceAngle"), g.Center.incidence);
+  EXPECT_EQ(D(h, "RangeLookAngle"), g.Center.lookAngle);
+
+  const std::vector<std::string> keys = {
+      "ORIGIN DATA",       "ACQUISITION TIME",  "UTM_HEMISPHERE",       "UTM_ZONE",
+      "SCENE DATA",        "SOFTWARE",          "CORNER POINT 3  X",    "CORNER POINT 3  Y",
+      "CORNER POINT 4  X", "CORNER POINT 4  Y", "CORNER POINT 2  X",    "CORNER POINT 2  Y",
+      "CORNER POINT 1  X", "CORNER POINT 1  Y", "CENTER SCENE POINT X", "CENTER SCENE POINT Y"};
+  const auto rows = OtherInfo(h);
+  ASSERT_EQ(rows.size(), keys.size());
+  for (size_t i = 0; i < keys.size(); ++i) EXPECT_EQ(rows[i].first, keys[i]);
+  EXPECT_EQ(rows[0].second, "ENVISAT_WSM");
+  EXPECT_EQ(rows[1].second, truth("Scene", "SensingStartText"));
+  // 45 degrees north, 150 degrees east.
+  EXPECT_EQ(rows[2].second, "NORTH");
+  EXPECT_EQ(rows[3].second, "56");
+  EXPECT_EQ(rows[4].second, std::string("ENVISAT-1|ENVISAT_WSS|SS2|H/H|") +
+                                lib->dataSetInfo.OrbitConfiguration + "|SLANT_RANGE");
+  // The writer of the suite header names this program.
+  EXPECT_EQ(rows[5].second, kVeloranIdentification);
+  // A descending pass: the first line's near range lies north-east.
+  const struct {
+    size_t row;
+    const char* truthPoint;
+  } corners[] = {{6, "FirstFar"}, {8, "FirstNear"}, {10, "LastFar"}, {12, "LastNear"}};
+  ASSERT_EQ(truth("Scene", "Pass"), "DESCENDING");
+  for (const auto& c : corners) {
+    EXPECT_NEAR(std::stod(rows[c.row].second), value(s, std::string(c.truthPoint) + "Lon"), 2e-5);
+    EXPECT_NEAR(std::stod(rows[c.row + 1].second), value(s, std::string(c.truthPoint) + "Lat"),
+                2e-5);
+  }
+  EXPECT_NEAR(std::stod(rows[14].second), value(s, "HeaderCentreLon"), 2e-5);
+  EXPECT_NEAR(std::stod(rows[15].second), value(s, "HeaderCentreLat"), 2e-5);
+  EXPECT_FALSE(isSet(F(h, "EnvisatFixHeader.PRODUCT")));
+
+  // The same file through python's XML parser.
+  const std::string sml = raster + "_slc.sml";
+  const std::vector<std::string> slant = XmlValues(sml, "SlantRange");
+  ASSERT_EQ(slant.size(), 3u);
+  for (int i = 0; i < 3; ++i) EXPECT_EQ(std::stod(slant[i]), D(h, "SlantRange", i));
+  const std::vector<std::string> other = XmlValues(sml, "OtherInfo");
+  ASSERT_EQ(other.size(), 2 * keys.size());
+  for (size_t i = 0; i < keys.size(); ++i) EXPECT_EQ(other[2 * i], keys[i]);
+}
+
+// Twelve state vectors from the orbit file, and scene centres on both sides
+// of the equator and of the date line.
+TEST_F(Conversion, StateVectorCountAndUtmZoneFollowTheHeader) {
+  const std::string raster = copySwath(1, "R1");
+  const std::string hdr = raster + ".hdr";
+  const std::string orbitFile = run_->dir + truth("Scene", "OrbitFile");
+  const double tc = value("SubSwath1", "CentreTime");
+  editHeader(hdr, [&](GeneralSAR& gs) {
+    ASSERT_EQ(gs.orbit.SVCreate(tc - 27.5, 5.0, 12), 0);
+    ASSERT_EQ(interp_orb_l(orbitFile.c_str(), tc, 12, 5.0, gs.orbit.positions(),
+                           gs.orbit.velocities(), nullptr, 0, nullptr),
+              0);
+    ASSERT_EQ(gs.orbit.computeApproximateSV(), 0);
+    gs.GSdisable(GeneralSAR::GS_STATEVECTORS);
+  });
+  const struct {
+    double lat, lon;
+    const char* hemisphere;
+    const char* zone;
+  } centres[] = {
+      {-0.1, 7.5, "SOUTH", "32"}, {0.0, 187.5, "NORTH", "2"}, {10.0, 180.0, "NORTH", "60"}};
+  for (const auto& c : centres) {
+    SCOPED_TRACE(c.lon);
+    editHeader(hdr,
+               [&](GeneralSAR& gs) { gs.geoCoords.Center.set(c.lat, c.lon, 0.0, 20.0, 18.0); });
+    const std::string name = raster + "_slc_hdr";
+    ASSERT_EQ(writehdr_kestova(hdr.c_str(), name.c_str(), nullptr), 0);
+    const auto h = suiteHeader(name);
+    EXPECT_EQ(OtherInfoValue(*h, "UTM_HEMISPHERE"), c.hemisphere);
+    EXPECT_EQ(OtherInfoValue(*h, "UTM_ZONE"), c.zone);
+    ASSERT_EQ(I(*h, "nStateVectors"), 12);
+    const auto lib = library(hdr);
+    for (const char* v : {"pos_x", "pos_y", "pos_z", "vel_x", "vel_y", "vel_z"}) {
+      ASSERT_EQ(F(*h, v)->columns(), 12) << v;
+    }
+    for (int i = 0; i < 12; ++i) {
+      EXPECT_EQ(D(*h, "pos_z", i), lib->orbit.positions()[3 * i + 2]);
+      EXPECT_EQ(D(*h, "vel_x", i), lib->orbit.velocities()[3 * i]);
+    }
+    EXPECT_EQ(S(*h, "TimeFirst"), DateText(tc - 27.5));
+  }
+}
+
+TEST_F(Conversion, PolarisationOutsideTheFourEndsWithoutHeader) {
+  const std::string raster = copySwath(1, "R1");
+  for (const char* polarisation : {"", "X/Y", "HH"}) {
+    SCOPED_TRACE(polarisation);
+    editHeader(raster + ".hdr", [&](GeneralSAR& gs) {
+      std::snprintf(gs.dataSetInfo.Polarization, kParStringSize, "%s", polarisation);
+    });
+    EXPECT_EQ(writehdr_kestova((raster + ".hdr").c_str(), (raster + "_slc_hdr").c_str(), nullptr),
+              1);
+    EXPECT_FALSE(vlr_test::Exists(raster + "_slc.sml"));
+    EXPECT_FALSE(vlr_test::Exists(raster + "_slc.hdr"));
+    EXPECT_EQ(ckerr_count(), 0);
+    EXPECT_EQ(ckerr_depth(), 0);
+  }
+  EXPECT_NE(processLog().find("PROCESSING ERROR: Wrong Polarization Type"), std::string::npos);
+}
+
+// A sub-swath extracted without orbit: no state vectors, no corners, and no
+// azimuth spacing rather than a negative one.
+TEST_F(Conversion, HeaderWithoutOrbitKeepsOnlyWhatItHolds) {
+  const std::string raster = copySwath(1, "R1");
+  auto gs = library(raster + ".hdr");
+  for (const auto o : {GeneralSAR::GS_ORBIT, GeneralSAR::GS_STATEVECTORS, GeneralSAR::GS_GEOCOORDS})
+    gs->GSdisable(o);
+  const std::string bare = work("N.hdr");
+  ASSERT_EQ(gs->GSwrite(bare.c_str()), 0);
+  ASSERT_EQ(writehdr_kestova(bare.c_str(), work("N_slc_hdr").c_str(), nullptr), 0);
+  const auto h = suiteHeader(work("N_slc_hdr"));
+  EXPECT_EQ(I(*h, "nStateVectors"), 0);
+  EXPECT_EQ(F(*h, "pos_x")->columns(), 0);
+  EXPECT_FALSE(isSet(F(*h, "PixelSpacingAz")));
+  EXPECT_EQ(D(*h, "ProcessingVelocity"), -1.0);
+  EXPECT_FALSE(isSet(F(*h, "LatNorthing")));
+  EXPECT_EQ(OtherInfoValue(*h, "UTM_ZONE"), "<missing>");
+  EXPECT_EQ(OtherInfo(*h).size(), 4u);
+  EXPECT_NEAR(D(*h, "PixelSpacingRg"), value("Scene", "RangeSpacing"), 1e-6);
+}
+
+// Rasters of other sample types are described by their own types, never as
+// floats; a type the suite cannot name is refused.
+TEST_F(Conversion, RasterCellTypeKeepsItsSampleSize) {
+  const std::string raster = copySwath(1, "R1");
+  const std::string hdr = raster + ".hdr", name = raster + "_slc_hdr";
+  const struct {
+    int cellType;
+    const char* suite;
+    const char* units;
+  } types[] = {{CT_FLOAT32, "FLOAT", "AMPLITUDE"},
+               {CT_SHORT_COMPLEX, "SHORT_COMPLEX", "SLC"},
+               {CT_INT16, "SHORT", "AMPLITUDE"}};
+  for (const auto& t : types) {
+    editHeader(hdr, [&](GeneralSAR& gs) { gs.datafile.data.cell_type = t.cellType; });
+    ASSERT_EQ(writehdr_kestova(hdr.c_str(), name.c_str(), nullptr), 0);
+    const auto h = suiteHeader(name);
+    EXPECT_EQ(S(*h, "CellType"), t.suite);
+    EXPECT_EQ(S(*h, "DataUnits"), t.units);
+  }
+  editHeader(hdr, [](GeneralSAR& gs) { gs.datafile.data.cell_type = CT_INT32_COMPLEX; });
+  EXPECT_EQ(writehdr_kestova(hdr.c_str(), work("X_hdr").c_str(), nullptr), 1);
+  EXPECT_FALSE(vlr_test::Exists(work("X.sml")));
+}
+
+TEST_F(Conversion, UnreadableLibraryHeadersAreRefused) {
+  EXPECT_EQ(writehdr_kestova(work("absent.hdr").c_str(), work("A_hdr").c_str(), nullptr), 1);
+  vlr_test::WriteFile(work("empty.hdr"), "<?xml version=\"1.0\"?>\n<TessalXmlDoc/>\n");
+  EXPECT_EQ(writehdr_kestova(work("empty.hdr").c_str(), work("A_hdr").c_str(), nullptr), 1);
+  EXPECT_EQ(writehdr_kestova(nullptr, work("A_hdr").c_str(), nullptr), 1);
+  EXPECT_EQ(writehdr_kestova(work(std::string(600, 'x')).c_str(), work("A_hdr").c_str(), nullptr),
+            1);
+  EXPECT_FALSE(vlr_test::Exists(work("A.sml")));
+  EXPECT_EQ(ckerr_count(), 0);
+}
+
+}  // namespace
