@@ -513,7 +513,10 @@ int images::processImage(Run& r, int k) {
   region.roi.FastTimeDelta = rangeInterval;
   region.roi.Samples = d.samples;
   region.roi.FastTimeLength = farTime - nearTime;
-  region.roi.SlowStartTime = 0.0;
+  // The region starts at the image's own first line, so that each sub-swath
+  // header says when its lines were taken (the sub-swaths of one product
+  // start up to a burst cycle apart).
+  region.roi.SlowStartTime = first;
   region.roi.SlowTimeDelta = interval;
   region.roi.Lines = static_cast<int>(lineTimes);
   region.roi.SlowTimeLength = last - first;

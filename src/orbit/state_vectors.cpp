@@ -1,5 +1,6 @@
 #include "orbit/state_vectors.h"
 
+#include <cerrno>
 #include <cstdio>
 
 #include "orbit/gr_pt_lat_lon.h"
@@ -119,11 +120,14 @@ int SAROrbitStateVectors_Obj::readhdr(const char* file) {
   // Older parameter-file form.
   double t0 = 0.0, dt = 0.0;
   int n = 0;
+  // A header without state vectors (an image extracted without orbit) is
+  // not an error of the header: the caller learns it from the code alone.
   if (GetParDouble(file, "TimeFirst", 1, &t0, 1, kSection) != 0 ||
       GetParDouble(file, "TimeDelta", 1, &dt, 1, kSection) != 0 ||
       GetParInt(file, "nStateVectors", 1, &n, 1, kSection) != 0) {
     destroyBuffers();
-    VLR_FAIL("File reading failed!", vlr::kLibRead);
+    errno = 0;
+    return vlr::kLibRead;
   }
   VLR_CALL(SVCreate(t0, dt, n));
   if (n > 0 && (GetParDouble(file, "pos", 3 * n, positions_.data(), 1, kSection) != 0 ||

@@ -50,7 +50,7 @@ TEST_F(Conversion, RoundTripGivesBackEveryCarriedValue) {
   EXPECT_DOUBLE_EQ(rb.FastTimeDelta, r.FastTimeDelta);
   EXPECT_DOUBLE_EQ(rb.SlowTimeDelta, r.SlowTimeDelta);
   EXPECT_NEAR(rb.SlowTimeLength, r.SlowTimeLength, 2e-6);
-  EXPECT_NEAR(rb.SlowStartTime, value("Scene", "SensingStart"), 1e-6);
+  EXPECT_NEAR(rb.SlowStartTime, value("SubSwath4", "FirstLineTime"), 1e-6);
   EXPECT_EQ(rb.Samples, r.Samples);
   EXPECT_EQ(rb.Lines, r.Lines);
   EXPECT_GT(back->attitude.Eq_speed, 6000.0);

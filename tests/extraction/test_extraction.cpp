@@ -87,6 +87,7 @@ TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
     // The grid stores range times as float nanoseconds: half a nanosecond
     // of resolution at 5.5 ms, far below one sample (52 ns).
     EXPECT_NEAR(roi.roi.FastStartTime, nearTime, 3e-10);
+    EXPECT_NEAR(roi.roi.SlowStartTime, first, 1e-6);
     EXPECT_NEAR(roi.roi.SlowTimeLength, last - first, 1e-6);
     EXPECT_DOUBLE_EQ(roi.roi.SlowTimeDelta, interval);
     EXPECT_EQ(roi.roi.Lines, std::lround((last - first) / interval) + 1);
