@@ -22,6 +22,7 @@ using namespace kestova;
 // Texts of the suite header.
 constexpr const char* kSensorName = "ENVISAT-1";
 constexpr const char* kSlantRangeGeometry = "SLANT_RANGE";
+constexpr const char* kGroundRangeGeometry = "GROUND_RANGE";
 constexpr const char* kIncreasingTime = "INCREASE TIME DIRECTION";
 constexpr const char* kSoftware = "Zorvek v1.0";
 constexpr const char* kSlantRangeProjection = "SLANT RANGE";
@@ -324,7 +325,11 @@ int WriteMappedFields(GeneralSAR& gs, const ImageTiming& timing, CDescriptionHea
   w.text("StateVectorReference", "ECR");
   VLR_CALL(WriteStateVectors(gs, w));
 
-  w.text("InitialGeometry.Projection", kSlantRangeGeometry);
+  // A composed product resampled to ground range is not in slant range: its
+  // spacings are ground distances, which viewers must not project again.
+  const bool groundRange =
+      timing.composed && std::strcmp(info.Projection, kSlantRangeProjection) != 0;
+  w.text("InitialGeometry.Projection", groundRange ? kGroundRangeGeometry : kSlantRangeGeometry);
   w.real("InitialGeometry.SceneHeading", info.SceneHeading);
   w.text("InitialGeometry.TimeDirectionPixel", kIncreasingTime);
   w.text("InitialGeometry.TimeDirectionLines", kIncreasingTime);

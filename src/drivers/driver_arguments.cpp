@@ -1,5 +1,8 @@
 #include "drivers/driver_arguments.h"
 
+#include <cstdio>
+
+#include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/list_file.h"
 #include "runtime/process_log.h"
@@ -20,6 +23,23 @@ std::vector<std::string> ReadDriverArguments(const char* argumentText, const cha
 const std::string& DriverArgument(const std::vector<std::string>& arguments, size_t position) {
   static const std::string kEmpty;
   return position < arguments.size() ? arguments[position] : kEmpty;
+}
+
+int WriteImportListFile(const std::string& root) {
+  VLR_SCOPE("WriteImportListFile", "main_import_esa");
+  constexpr int kSubSwaths = 5;
+  const std::string temporary = root + ".list_tmp";
+  FILE* f = std::fopen(temporary.c_str(), "w");
+  if (f == nullptr) VLR_FAIL("File not opened!", kLibOpen);
+  bool written = true;
+  for (int k = 1; k <= kSubSwaths; ++k)
+    written = std::fprintf(f, "%s%d_slc\n", root.c_str(), k) > 0 && written;
+  written = std::fclose(f) == 0 && written;
+  if (!written || std::rename(temporary.c_str(), root.c_str()) != 0) {
+    std::remove(temporary.c_str());
+    VLR_FAIL("File writing failed!", kLibWrite);
+  }
+  return 0;
 }
 
 }  // namespace vlr

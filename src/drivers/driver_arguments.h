@@ -30,4 +30,9 @@ bool CopyDriverName(const std::string& name, char (&field)[N]) {
   return true;
 }
 
+// Writes the list file of an import over root: one line "<root>k_slc" per
+// sub-swath, through a temporary file renamed over the target so that the
+// host never reads a partial list.  0, 9 ("File not opened!") or 5.
+int WriteImportListFile(const std::string& root);
+
 }  // namespace vlr

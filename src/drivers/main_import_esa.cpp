@@ -27,7 +27,6 @@ constexpr long kProductTypeOffset = 13;
 constexpr size_t kProductTypeLength = 3;
 constexpr const char* kParameterFile = "import_esa.hdr";
 constexpr const char* kParameterSection = "GeneralProcessingConf";
-constexpr int kSubSwaths = 5;
 
 enum ImportArgument : size_t { kProduct = 0, kDoris = 1, kXca = 2, kOutputRoot = 3, kIns = 4 };
 
@@ -42,25 +41,6 @@ int readProductType(const char* product, std::string& type) {
   std::fclose(f);
   if (!read) VLR_FAIL("File reading failed!", vlr::kLibRead);
   type = chars;
-  return 0;
-}
-
-// Writes the list file root: one line "<root>k_slc" per sub-swath.  It is
-// written beside and renamed over the target, so the host never reads a
-// partial list.
-int writeListFile(const std::string& root) {
-  VLR_SCOPE("writeListFile", kModule);
-  const std::string temporary = root + ".list_tmp";
-  FILE* f = std::fopen(temporary.c_str(), "w");
-  if (f == nullptr) VLR_FAIL("File not opened!", vlr::kLibOpen);
-  bool written = true;
-  for (int k = 1; k <= kSubSwaths; ++k)
-    written = std::fprintf(f, "%s%d_slc\n", root.c_str(), k) > 0 && written;
-  written = std::fclose(f) == 0 && written;
-  if (!written || std::rename(temporary.c_str(), root.c_str()) != 0) {
-    std::remove(temporary.c_str());
-    VLR_FAIL("File writing failed!", vlr::kLibWrite);
-  }
   return 0;
 }
 
@@ -131,6 +111,6 @@ int fvlr_main_import_esa(const char* argumentText) {
   errno = 0;
   VLR_CALL(extraction.run());
   VLR_CALL(tessal2kestova(root.c_str(), xcaPath.c_str(), reportLevel));
-  VLR_CALL(writeListFile(root));
+  VLR_CALL(vlr::WriteImportListFile(root));
   return 0;
 }

@@ -303,16 +303,21 @@ std::string geocodedText(CDescriptionHeader& header, const EnviKeywords& keys, c
 
 // The pixel size of a slant-range image on the ground: the range spacing
 // divided by the sine of the incidence angle, the azimuth spacing as it is.
-// Nothing when a value is missing or the angle is not in (0, 90] degrees.
+// An image resampled to ground range ("GROUND_RANGE") already has ground
+// spacings.  Nothing when a value is missing or the angle is not in (0, 90]
+// degrees.
 std::string slantRangePixelSize(CDescriptionHeader& header) {
   std::string geometry;
   double range = 0.0, azimuth = 0.0, incidence = 0.0;
-  if (!text(header, "InitialGeometry.Projection", geometry) || geometry != "SLANT_RANGE" ||
+  if (!text(header, "InitialGeometry.Projection", geometry) ||
+      (geometry != "SLANT_RANGE" && geometry != "GROUND_RANGE") ||
       !numberAt(header, "Processing.PixelSpacingRg", range) ||
-      !numberAt(header, "Processing.PixelSpacingAz", azimuth) ||
-      !numberAt(header, "ChannelInfo.IncidenceAngle", incidence)) {
+      !numberAt(header, "Processing.PixelSpacingAz", azimuth)) {
     return std::string();
   }
+  if (geometry == "GROUND_RANGE")
+    return "pixel size = {" + number(range) + ", " + number(azimuth) + ", units=Meters}\n";
+  if (!numberAt(header, "ChannelInfo.IncidenceAngle", incidence)) return std::string();
   if (!(incidence > 0.0 && incidence <= 90.0)) {
     NVLR_UTILITY_TracePrint("ENVI header: incidence angle %s out of range, no pixel size\n",
                             number(incidence).c_str());

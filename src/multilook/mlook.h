@@ -1,0 +1,151 @@
+// The wide-swath multilook processor: turns the five single-look complex
+// sub-swaths of a wide-swath import into one detected image of the whole
+// swath, in slant or ground range, with its metadata header.
+//
+// Per sub-swath the range spectrum is split into looks whose bandwidth gives
+// the requested ground resolution, the lines of every burst are weighted in
+// azimuth so that the bursts covering a time add up to a constant, and the
+// look powers are summed into a temporary power file "<output>SS<k>".  The
+// five power files are then recomposed side by side on one range grid.
+//
+// Lifecycle: readimages (or readimages_kestova), run, writepar, freeimages.
+// Functions return 0 or the processing libraries' codes (1 inconsistent
+// data, 4 read, 5 write, 7 memory, 9 open, 10 missing input).
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "multilook/mlook_io.h"
+#include "runtime/call_scope.h"
+#include "sar_container/general_sar.h"
+
+// What the processor needs of one sub-swath, taken from its header.
+namespace mlook_detail {
+class HelperThread;
+}
+
+struct mlook_swath_par {
+  int samples = 0;            // range samples per line
+  int lines = 0;              // raster lines
+  int bursts = 0;             // bursts in the raster
+  int linesPerBurst = 0;      // L
+  double firstRangeTime = 0;  // two-way range time of the first sample, s
+  double bandwidth = 0;       // range bandwidth X, Hz
+  double incidence = 0;       // incidence angle at mid swath, degrees
+  int polarisation = 0;       // 0 "H/H", 1 "V/V", 2 otherwise
+  double lineInterval = 0;    // s
+  double burstCycle = 0;      // s
+};
+
+class mlook {
+ public:
+  // More looks than this are refused.
+  static constexpr int kMaxLooks = 15;
+
+  mlook(mlook_conf* conf, mlook_input* input, mlook_output* output);
+  ~mlook();
+  mlook(const mlook&) = delete;
+  mlook& operator=(const mlook&) = delete;
+
+  // Read the five sub-swath headers of the root "Level1Filename": the
+  // library headers "<root>k.hdr" of the rasters "<root>k", or (kestova) the
+  // suite headers of the rasters "<root>k_slc".  They also check the burst
+  // range of the input block.
+  int readimages();
+  int readimages_kestova();
+  // Look count N, look bandwidths and look centre frequencies from the
+  // sub-swath parameters and the ground resolution.
+  int fclook();
+  // Multilooks every sub-swath into its temporary power file and recomposes
+  // them into the output image.
+  int run();
+  // Writes the output's metadata header "<output>.hdr".
+  int writepar();
+  // Releases the headers and buffers; removes the temporary files when
+  // DeleteTempFile is set.
+  int freeimages();
+
+  // Results of fclook (swath 0..4, look 0..looks()-1).
+  int looks() const { return looks_; }
+  double lookBandwidth(int swath) const { return lookBandwidth_[swath]; }
+  double lookFrequency(int look, int swath) const { return lookFrequency_[look][swath]; }
+  // Results of run.
+  int decimation() const { return decimation_; }
+  int outputSamples() const { return outputSamples_; }
+  int outputLines() const { return outputLines_; }
+  double outputStartTime() const { return outputStartTime_; }
+  double outputNearRangeTime() const { return rangeTime_[0]; }
+  // Lines of sub-swath k that went through the range transforms (lines
+  // whose azimuth weights are all 0 contribute nothing and are skipped).
+  int64_t transformedLines(int k) const { return transformedLines_[k]; }
+  int fftLength(int k) const { return fftLength_[k]; }
+  // Zero-Doppler azimuth time and two-way range time of an output pixel
+  // (column and row from 0, fractions allowed), and its latitude and
+  // longitude on the ellipsoid.  Valid after run and before freeimages.
+  int outputPixelTimes(double column, double row, double* azimuth, double* range);
+  int geolocate(double column, double row, double* lat, double* lon);
+  // First composite sample of each sub-swath, as a two-way range time.
+  double swathStartRangeTime(int k) const { return boundaryTime_[k]; }
+  int lookLength(int k) const { return lookLength_[k]; }
+
+  // Sub-swath parameters (filled by readimages; tests may set them before
+  // fclook) and the range sampling frequency of sub-swath 1.
+  mlook_swath_par swathPar[kMlookSwaths];
+  double fs = 0.0;
+
+ private:
+  struct SwathPlan;
+  struct Burst;
+
+  int readswath(int k, const char* header, bool kestova);
+  int checkbursts();
+  int setuprange();
+  int readbursttimes(int k, std::vector<double>* times);
+  int timing();
+  int processswath(int k);
+  int composeswaths();
+  int envi_beam_corr(int k, std::vector<float>* gain);
+  void release();
+
+  // Second thread of the burst and recomposition loops, during run().
+  mlook_detail::HelperThread* helper_ = nullptr;
+  mlook_conf* conf_;
+  mlook_input* input_;
+  mlook_output* output_;
+  std::unique_ptr<GeneralSAR> headers_[kMlookSwaths];
+
+  int looks_ = 0;
+  double lookBandwidth_[kMlookSwaths] = {};
+  double lookFrequency_[kMaxLooks][kMlookSwaths] = {};
+
+  // Range grid: decimation D, per swath the FFT length, look length, the
+  // samples dropped for alignment, the first output sample and the number
+  // of output samples that hold data.
+  int decimation_ = 0;
+  int fftLength_[kMlookSwaths] = {};
+  int lookLength_[kMlookSwaths] = {};
+  int skip_[kMlookSwaths] = {};
+  int offset_[kMlookSwaths] = {};
+  int valid_[kMlookSwaths] = {};
+  double rangeTime_[kMlookSwaths] = {};     // first range time after alignment
+  double boundaryTime_[kMlookSwaths] = {};  // where each swath starts in the composite
+  double powerScale_[kMlookSwaths] = {};
+
+  // Azimuth grid: bursts processed, their first-line times per swath, the
+  // output start time and line count.
+  int firstBurst_ = 0;
+  int burstCount_ = 0;
+  std::vector<double> burstTimes_[kMlookSwaths];
+  double outputStartTime_ = 0.0;
+  double lineInterval_ = 0.0;
+  int outputLines_ = 0;
+  int outputSamples_ = 0;
+  int compositeSamples_ = 0;
+  double outputFarRangeTime_ = 0.0;  // range time of the last output sample
+  int burstsDone_ = 0;
+  int percentShown_ = -1;
+  bool tempWritten_[kMlookSwaths] = {};
+  int64_t transformedLines_[kMlookSwaths] = {};
+};

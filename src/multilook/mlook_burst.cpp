@@ -1,0 +1,380 @@
+// Burst processing of one sub-swath: azimuth weighting, range looks and the
+// accumulation of look powers on the output's line grid.
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+#include <new>
+#include <vector>
+
+#include "metadata_sections/poly_selection.h"
+#include "multilook/mlook.h"
+#include "multilook/mlook_internal.h"
+#include "raster/cell_type.h"
+#include "raster/sample_convert.h"
+#include "runtime/call_scope.h"
+#include "runtime/error_codes.h"
+#include "runtime/file_utility.h"
+#include "runtime/progress.h"
+#include "signal/fft_lengths.h"
+#include "signal/fft_wrappers.h"
+
+namespace {
+
+constexpr const char* kModule = "mlook_v2";
+constexpr const char* kProgressTitle = "MULTILOOK PROCESSING";
+constexpr int kTaperEntries = 101;
+constexpr double kPi = 3.14159265358979323846;
+constexpr int kTempBufferBytes = 1 << 20;
+constexpr int kThreads = 2;
+
+struct CosineTable {
+  float value[kTaperEntries];
+  CosineTable() {
+    for (int k = 0; k < kTaperEntries; ++k)
+      value[k] = static_cast<float>(std::cos(k * kPi / (kTaperEntries - 1)));
+  }
+};
+
+const CosineTable& Cosines() {
+  static const CosineTable table;
+  return table;
+}
+
+// The data set that the plain evaluation of a family uses at azimuth az.
+template <class P>
+const P& PlainSet(const std::vector<P>& family, double az) {
+  return family[static_cast<size_t>(poly_select_set(family, az))];
+}
+
+// Samples between the exact weights of a partly weighted line; the weights
+// in between are interpolated (the Doppler term varies smoothly in range).
+constexpr int kWeightStride = 32;
+
+// Everything one burst line needs; shared read-only by the threads.
+struct LineJob {
+  const unsigned char* raw;  // first raw line read
+  int firstRawLine;          // burst line of raw
+  int64_t lineLength;        // bytes per raw line
+  int firstByte;             // prefix and skipped samples
+  int cellType;
+  bool swap;
+  int samples;  // samples used per line
+  int fftLength;
+  int lookLength;
+  int looks;
+  bool plain;
+  const float* gain;        // per used sample, or null
+  const double* shift;      // Doppler centroid over rate per used sample, s
+  double shiftLo, shiftHi;  // their range
+  double firstLineTime;     // grid time of the burst's first line
+  double lineInterval;
+  double centreTime;
+  double burstCycle;
+  double w1, w2;
+  const int* lookCentre;  // spectrum bin of each look centre
+  int halfWidth;
+  float scale;
+  const fft_plan_c* forward;
+  const fft_plan_c* inverse;
+  fcomplex* block;
+  fcomplex* lookBuffer[kThreads];
+  float* ring;
+  int ringLines;
+  int firstRingLine;
+};
+
+enum LineWeights { kAllZero, kAllOne, kPartly };
+
+// A raster opened for positioned reads from several threads.
+class RawFile {
+ public:
+  explicit RawFile(const char* name) : name_(name) {}
+  ~RawFile() {
+    if (fd_ >= 0) close(fd_);
+  }
+  RawFile(const RawFile&) = delete;
+  RawFile& operator=(const RawFile&) = delete;
+  bool open() {
+    fd_ = ::open(name_, O_RDONLY);
+    return fd_ >= 0;
+  }
+  // Reads exactly n bytes at `offset`.
+  bool read(unsigned char* to, int64_t n, int64_t offset) const {
+    while (n > 0) {
+      const ssize_t got = pread(fd_, to, static_cast<size_t>(n), static_cast<off_t>(offset));
+      if (got <= 0) return false;
+      to += got;
+      n -= got;
+      offset += got;
+    }
+    return true;
+  }
+
+ private:
+  const char* name_;
+  int fd_ = -1;
+};
+
+float Weight(const LineJob& job, double dt, double shift) {
+  return mlook_detail::AzimuthWeight(std::fabs(dt + shift) / job.burstCycle, job.w1, job.w2);
+}
+
+double LineOffset(const LineJob& job, int j) {
+  return job.firstLineTime + j * job.lineInterval - job.centreTime;
+}
+
+// The weight falls with the distance from the burst centre: its values on
+// a line lie between those at the nearest and the farthest distance.
+LineWeights Classify(const LineJob& job, int j) {
+  const double dt = LineOffset(job, j);
+  const double a = dt + job.shiftLo, b = dt + job.shiftHi;
+  const double nearest = a * b <= 0.0 ? 0.0 : std::min(std::fabs(a), std::fabs(b));
+  const double farthest = std::max(std::fabs(a), std::fabs(b));
+  const float wNear = Weight(job, nearest, 0.0), wFar = Weight(job, farthest, 0.0);
+  if (wNear == 0.0f && wFar == 0.0f) return kAllZero;
+  if (wNear == 1.0f && wFar == 1.0f) return kAllOne;
+  return kPartly;
+}
+
+void WeightLine(const LineJob& job, int j, fcomplex* row) {
+  const double dt = LineOffset(job, j);
+  const int n = job.samples;
+  for (int x0 = 0; x0 < n; x0 += kWeightStride) {
+    const int x1 = std::min(x0 + kWeightStride, n - 1);
+    const float w0 = Weight(job, dt, job.shift[x0]);
+    const float step = x1 > x0 ? (Weight(job, dt, job.shift[x1]) - w0) / (x1 - x0) : 0.0f;
+    const int end = std::min(x0 + kWeightStride, n);
+    for (int x = x0; x < end; ++x) row[x] *= w0 + step * (x - x0);
+  }
+}
+
+// Copies `count` elements of the periodic array `from` (period n) starting
+// at index `first` (any integer) into `to`.
+void CopyPeriodic(const fcomplex* from, int n, int first, int count, fcomplex* to) {
+  int at = first % n;
+  if (at < 0) at += n;
+  while (count > 0) {
+    const int run = std::min(count, n - at);
+    std::copy(from + at, from + at + run, to);
+    to += run;
+    count -= run;
+    at = 0;
+  }
+}
+
+// Processes line j of the burst; true when it went through the transforms.
+bool ProcessLine(const LineJob& job, int j, int thread) {
+  const LineWeights weights = Classify(job, j);
+  if (weights == kAllZero) return false;
+  fcomplex* row = job.block + static_cast<size_t>(j) * job.fftLength;
+  float* out =
+      job.ring + static_cast<size_t>((job.firstRingLine + j) % job.ringLines) * job.lookLength;
+  convert_samples(job.raw + (j - job.firstRawLine) * job.lineLength + job.firstByte, job.cellType,
+                  job.swap, row, CT_FLOAT_COMPLEX, static_cast<size_t>(job.samples));
+  std::fill(row + job.samples, row + job.fftLength, fcomplex(0.0f, 0.0f));
+  if (job.gain != nullptr)
+    for (int x = 0; x < job.samples; ++x) row[x] *= job.gain[x];
+  if (weights == kPartly) WeightLine(job, j, row);
+  if (job.plain) {
+    for (int x = 0; x < job.samples; ++x) out[x] += std::norm(row[x]);
+    return false;
+  }
+  pfft_c(job.forward, row, row);
+  fcomplex* look = job.lookBuffer[thread];
+  const int m = job.lookLength, h = job.halfWidth, n = job.fftLength;
+  for (int l = 0; l < job.looks; ++l) {
+    // The sub-band around the look centre, moved to zero frequency: the
+    // upper half to the start of the buffer, the lower half to its end.
+    const int c = job.lookCentre[l];
+    CopyPeriodic(row, n, c, h, look);
+    std::fill(look + h, look + m - h, fcomplex(0.0f, 0.0f));
+    CopyPeriodic(row, n, c - h, h, look + m - h);
+    pfft_c(job.inverse, look, look);
+    for (int x = 0; x < m; ++x) out[x] += std::norm(look[x]) * job.scale;
+  }
+  return true;
+}
+
+}  // namespace
+
+namespace mlook_detail {
+
+std::string TempName(const char* output, int k) {
+  return NVLR_UTILITY_Format("%sSS%d", output, k + 1);
+}
+
+float AzimuthWeight(double v, double w1, double w2) {
+  if (w1 < 0.0) return 0.0f;
+  if (v <= w1) return 1.0f;
+  const double u = (v - w1) / w2;
+  if (!(u > 0.0 && u <= 1.0)) return 0.0f;
+  // cos(pi u / 2) = cos(k pi / 100) at k = 50 u.
+  const double x = u * 0.5 * (kTaperEntries - 1);
+  const int i = std::min(static_cast<int>(x), kTaperEntries - 2);
+  const double f = x - i;
+  const CosineTable& t = Cosines();
+  return static_cast<float>((1.0 - f) * t.value[i] + f * t.value[i + 1]);
+}
+
+}  // namespace mlook_detail
+
+int mlook::processswath(int k) {
+  VLR_SCOPE("processswath", kModule);
+  GeneralSAR& gs = *headers_[k];
+  const mlook_swath_par& s = swathPar[k];
+  const int L = s.linesPerBurst;
+  const int nfft = fftLength_[k];
+  const int m = lookLength_[k];
+  const int n = s.samples - skip_[k];
+  const bool plain = looks_ == 1 && decimation_ == 1;
+  if (gs.polys.ndc < 1) VLR_FAIL("NO DC poly available", vlr::kLibMissing);
+  if (gs.polys.nfr < 1) VLR_FAIL("NO FR poly available", vlr::kLibMissing);
+
+  std::vector<float> gain;
+  if (conf_->RgAnt_flag != 0) VLR_CALL(envi_beam_corr(k, &gain));
+
+  fft_plan_c forward, inverse;
+  if (!plain) {
+    VLR_CALL(fft_makep_c(&forward, nfft, nfft, 1, 1, 1, 0, 1));
+    // Backward transform without its division by m: the division goes into
+    // the power scale.
+    VLR_CALL(fft_makep_c(&inverse, m, m, 1, 1, -2, 0, 1));
+  }
+  int lookCentre[kMaxLooks] = {};
+  // Spectrum bin of each look centre (negative frequencies count from the
+  // end of the spectrum).
+  for (int l = 0; l < looks_; ++l)
+    lookCentre[l] = static_cast<int>(std::lround(lookFrequency_[l][k] / fs * nfft));
+  const int halfWidth = static_cast<int>(std::lround(lookBandwidth_[k] / fs * nfft)) / 2;
+
+  const DataFile& in = gs.datafile.data;
+  const int64_t lineLength = in.line_length();
+  vlr::CkBuffer<unsigned char> raw;
+  vlr::CkBuffer<fcomplex> block, lookBuffer[kThreads];
+  vlr::CkBuffer<float> ring;
+  vlr::CkBuffer<double> shift;
+  bool allocated = raw.allocate(static_cast<size_t>(lineLength) * L) &&
+                   block.allocate(static_cast<size_t>(nfft) * L) &&
+                   ring.allocate(static_cast<size_t>(m) * L) && shift.allocate(n);
+  for (auto& b : lookBuffer) allocated = allocated && (plain || b.allocate(m));
+  if (!allocated) VLR_FAIL("Cannot allocate the burst buffers", vlr::kLibAlloc);
+
+  DataFile& temp = output_->swath[k];
+  temp.set_name(mlook_detail::TempName(output_->OutputFilename, k).c_str());
+  temp.pixels_per_line = m;
+  temp.lines_per_image = outputLines_;
+  temp.cell_type = CT_FLOAT32;
+  temp.byte_order = 0;
+  temp.row_prefix = 0;
+  temp.header_offset = 0;
+  temp.set_buffer_size(kTempBufferBytes);
+  VLR_CALL(temp.open(DataFile::kOpenCreate));
+  tempWritten_[k] = true;
+  // Both threads read the lines they process, with positioned reads on one
+  // descriptor.
+  RawFile raster(in.name().c_str());
+  if (!raster.open()) VLR_FAIL("File not opened!", vlr::kLibOpen);
+
+  const int64_t rowBytes = static_cast<int64_t>(m) * sizeof(float);
+  int written = 0;
+  // Writes the output lines before `upTo` and clears their ring lines.
+  auto flush = [&](int upTo) -> int {
+    for (; written < upTo; ++written) {
+      float* line = ring.data() + static_cast<size_t>(written % L) * m;
+      const int rc = temp.write(line, rowBytes);
+      if (rc != 0) return rc;
+      std::fill(line, line + m, 0.0f);
+    }
+    return 0;
+  };
+
+  LineJob job{};
+  job.raw = raw.data();
+  job.lineLength = lineLength;
+  job.firstByte = in.row_prefix + skip_[k] * in.element_sizeof();
+  job.cellType = in.cell_type;
+  job.swap = in.byte_order != 0;
+  job.samples = n;
+  job.fftLength = nfft;
+  job.lookLength = m;
+  job.looks = looks_;
+  job.plain = plain;
+  job.gain = gain.empty() ? nullptr : gain.data() + skip_[k];
+  job.shift = shift.data();
+  job.lineInterval = lineInterval_;
+  job.burstCycle = s.burstCycle;
+  job.w1 = conf_->W1;
+  job.w2 = conf_->W2;
+  job.lookCentre = lookCentre;
+  job.halfWidth = halfWidth;
+  job.scale = static_cast<float>(powerScale_[k] / (static_cast<double>(m) * m));
+  job.forward = &forward;
+  job.inverse = &inverse;
+  job.block = block.data();
+  for (int t = 0; t < kThreads; ++t) job.lookBuffer[t] = lookBuffer[t].data();
+  job.ring = ring.data();
+  job.ringLines = L;
+
+  transformedLines_[k] = 0;
+  const std::vector<double>& times = burstTimes_[k];
+  const double fsSwath = gs.sampling.frg_hz;
+  for (int b = firstBurst_; b < firstBurst_ + burstCount_; ++b) {
+    const int total = kMlookSwaths * burstCount_;
+    const int percent = static_cast<int>(100LL * burstsDone_ / total);
+    getAndSetPerc(percentShown_, percent, kProgressTitle);
+    percentShown_ = percent;
+    ++burstsDone_;
+    const int p = static_cast<int>(
+        std::nearbyint((times[static_cast<size_t>(b)] - outputStartTime_) / lineInterval_));
+    if (flush(p) != 0) {
+      VLR_FAIL("File writing failed!", vlr::kLibWrite);
+    }
+    // The burst centre from the burst cycle; the weight of a sample is
+    // evaluated where its Doppler centroid puts it in the burst.
+    job.centreTime = times[0] + b * s.burstCycle + 0.5 * (L - 1) * lineInterval_;
+    job.firstLineTime = outputStartTime_ + p * lineInterval_;
+    job.firstRingLine = p;
+    const poly& dc = PlainSet(gs.polys.dc, job.centreTime);
+    const poly& fr = PlainSet(gs.polys.fr, job.centreTime);
+    for (int x = 0; x < n; ++x) {
+      const double rt = rangeTime_[k] + x / fsSwath;
+      shift[x] = poly::Value(dc.pol, rt - dc.trg0_s, job.centreTime - dc.taz0_s) /
+                 poly::Value(fr.pol, rt - fr.trg0_s, job.centreTime - fr.taz0_s);
+      if (!std::isfinite(shift[x])) {
+        VLR_FAIL("Doppler centroid over Doppler rate is not a number", vlr::kLibInconsistent);
+      }
+    }
+    job.shiftLo = *std::min_element(shift.begin(), shift.end());
+    job.shiftHi = *std::max_element(shift.begin(), shift.end());
+    // Only the lines with a weight above 0 are read and processed.
+    int first = 0, last = L;
+    while (first < L && Classify(job, first) == kAllZero) ++first;
+    while (last > first && Classify(job, last - 1) == kAllZero) --last;
+    if (first == last) continue;
+    job.firstRawLine = first;
+    const int64_t offset = in.line_offset(static_cast<int64_t>(b) * L + first);
+    int transformed[kThreads] = {};
+    bool readFailed[kThreads] = {};
+    mlook_detail::ParallelRange(
+        helper_, last - first,
+        [&job, &transformed, &readFailed, &raster, first, offset, lineLength, &raw](int from,
+                                                                                    int to) {
+          const int thread = from == 0 ? 0 : 1;
+          if (!raster.read(raw.data() + from * lineLength, (to - from) * lineLength,
+                           offset + from * lineLength)) {
+            readFailed[thread] = true;
+            return;
+          }
+          for (int j = first + from; j < first + to; ++j)
+            transformed[thread] += ProcessLine(job, j, thread) ? 1 : 0;
+        });
+    if (readFailed[0] || readFailed[1]) VLR_FAIL("File reading failed!", vlr::kLibRead);
+    transformedLines_[k] += transformed[0] + transformed[1];
+  }
+  if (flush(outputLines_) != 0) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  VLR_CALL(temp.close());
+  return 0;
+}

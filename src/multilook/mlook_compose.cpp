@@ -1,0 +1,353 @@
+// Recomposition of the five sub-swath power files into one image: side by
+// side on the common range grid, range-spreading corrected amplitude, in
+// slant range or resampled to ground range.
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cmath>
+#include <string>
+#include <vector>
+
+#include "metadata_sections/poly_selection.h"
+#include "multilook/mlook.h"
+#include "multilook/mlook_internal.h"
+#include "raster/cell_type.h"
+#include "runtime/call_scope.h"
+#include "runtime/error_codes.h"
+#include "runtime/file_utility.h"
+#include "runtime/progress.h"
+#include "signal/glsf.h"
+#include "signal/polval.h"
+
+namespace {
+
+constexpr const char* kModule = "mlook_v2";
+constexpr const char* kProgressTitle = "MULTILOOK SWATHS RECOMPOSITION";
+constexpr int kProgressLines = 25;
+constexpr double kHalfSpeedOfLight = 149896229.0;
+constexpr double kDefaultReferenceRange = 800000.0;  // m
+constexpr int kBufferBytes = 1 << 20;
+// Interpolation kernels of the ground-range resampling.
+constexpr int kKernelHalf = 6;
+constexpr int kKernelTaps = 2 * kKernelHalf + 1;
+constexpr float kKernelStep = 0.01f;
+constexpr double kKernelBand = 0.8;
+constexpr double kKernelGuard = 0.15;
+// Newton iteration of the ground-to-slant mapping.
+constexpr double kNewtonTolerance = 0.05;  // in range samples
+constexpr int kNewtonSteps = 30;
+constexpr int kNodeStride = 8;
+
+// c0 + c1 r + ... + c4 r^4 in r = rt - trg0: a data set's range polynomial
+// with its azimuth terms taken at one azimuth time.
+struct RangePoly {
+  double c[5] = {};
+  double trg0 = 0.0;
+  void set(const poly& p, double az) {
+    const double a = az - p.taz0_s;
+    c[0] = p.pol[0] + p.pol[2] * a;
+    c[1] = p.pol[1] + p.pol[3] * a;
+    c[2] = p.pol[4];
+    c[3] = p.pol[5];
+    c[4] = p.pol[6];
+    trg0 = p.trg0_s;
+  }
+  double value(double rt) const { return polval(c, 4, rt - trg0); }
+  double slope(double rt) const {
+    const double d[4] = {c[1], 2.0 * c[2], 3.0 * c[3], 4.0 * c[4]};
+    return polval(d, 3, rt - trg0);
+  }
+};
+
+// A family at one azimuth time: the two data sets around it, linearly
+// weighted (the nearest one alone outside the family's span).
+struct FamilyAt {
+  RangePoly lo, hi;
+  double w = 0.0;
+  bool empty = true;
+  template <class P>
+  void set(const std::vector<P>& family, double az) {
+    empty = family.empty();
+    if (empty) return;
+    const int n = static_cast<int>(family.size());
+    const int i = poly_bracket_set(family, az);
+    const int j = std::min(i + 1, n - 1);
+    const double t0 = family[static_cast<size_t>(i)].taz0_s;
+    const double t1 = family[static_cast<size_t>(j)].taz0_s;
+    w = (j == i || !(t1 > t0)) ? 0.0 : std::min(1.0, std::max(0.0, (az - t0) / (t1 - t0)));
+    lo.set(family[static_cast<size_t>(i)], az);
+    hi.set(family[static_cast<size_t>(j)], az);
+  }
+  double value(double rt) const { return (1.0 - w) * lo.value(rt) + w * hi.value(rt); }
+  double slope(double rt) const { return (1.0 - w) * lo.slope(rt) + w * hi.slope(rt); }
+};
+
+// Ground range along one line, measured from the first composite sample:
+// each sub-swath's slant-to-ground polynomial holds on its own range span,
+// and the polynomials are chained at the composition boundaries so that the
+// ground range is continuous across the swath.
+struct GroundLine {
+  FamilyAt toGround[kMlookSwaths];
+  FamilyAt toSlant[kMlookSwaths];
+  double offset[kMlookSwaths] = {};  // added to a swath's own ground range
+  double start[kMlookSwaths] = {};   // ground range where a swath's span starts
+  double startTime[kMlookSwaths] = {};
+
+  void set(GeneralSAR* const* headers, const double* boundaryTime, double az) {
+    for (int i = 0; i < kMlookSwaths; ++i) {
+      toGround[i].set(headers[i]->polys.sl2gr, az);
+      toSlant[i].set(headers[i]->polys.gr2sl, az);
+    }
+    offset[0] = -toGround[0].value(boundaryTime[0]);
+    start[0] = 0.0;
+    startTime[0] = boundaryTime[0];
+    for (int i = 1; i < kMlookSwaths; ++i) {
+      const double g = toGround[i - 1].value(boundaryTime[i]) + offset[i - 1];
+      offset[i] = g - toGround[i].value(boundaryTime[i]);
+      start[i] = g;
+      startTime[i] = boundaryTime[i];
+    }
+  }
+  double ground(double rt) const {
+    int i = kMlookSwaths - 1;
+    while (i > 0 && rt < startTime[i]) --i;
+    return toGround[i].value(rt) + offset[i];
+  }
+  // Two-way range time of ground range g; `guess` is a start value or NaN.
+  double slant(double g, double guess, double tolerance) const {
+    int i = kMlookSwaths - 1;
+    while (i > 0 && g < start[i]) --i;
+    const FamilyAt& f = toGround[i];
+    double rt = guess;
+    if (!std::isfinite(rt)) {
+      rt = toSlant[i].empty ? startTime[i] : toSlant[i].value(g - offset[i]);
+      if (!std::isfinite(rt)) rt = startTime[i];
+    }
+    for (int step = 0; step < kNewtonSteps; ++step) {
+      const double slope = f.slope(rt);
+      if (!(slope != 0.0) || !std::isfinite(slope)) return NAN;
+      const double delta = (f.value(rt) + offset[i] - g) / slope;
+      rt -= delta;
+      if (std::fabs(delta) <= tolerance) return rt;
+    }
+    return NAN;
+  }
+};
+
+}  // namespace
+
+int mlook::composeswaths() {
+  VLR_SCOPE("composeswaths", kModule);
+  const int D = decimation_;
+  const double spacing = D / fs;  // composite sample spacing, s
+  // Extent of each swath in the composite; neighbours meet in the middle of
+  // their overlap.
+  int begin[kMlookSwaths], end[kMlookSwaths];
+  for (int i = 0; i < kMlookSwaths; ++i) {
+    begin[i] = offset_[i];
+    end[i] = offset_[i] + valid_[i];
+  }
+  for (int i = 1; i < kMlookSwaths; ++i) {
+    if (end[i - 1] > offset_[i]) {
+      begin[i] = offset_[i] + (end[i - 1] - offset_[i]) / 2;
+      end[i - 1] = begin[i];
+    }
+  }
+  int width = 0;
+  for (int i = 0; i < kMlookSwaths; ++i) width = std::max(width, end[i]);
+  compositeSamples_ = width;
+  double* boundaryTime = boundaryTime_;
+  for (int i = 0; i < kMlookSwaths; ++i) boundaryTime[i] = rangeTime_[0] + begin[i] * spacing;
+
+  // Range-spreading correction: amplitude sqrt(P r^3 / 3), r the range over
+  // the reference range.
+  double reference = headers_[0]->dataSetInfo.RO_REF;
+  if (!(reference > 0.0) || !std::isfinite(reference)) reference = kDefaultReferenceRange;
+  const double referenceTime = reference / kHalfSpeedOfLight;
+  // The composite line with kKernelHalf copies of its edge samples on
+  // either side, so that the kernels never leave it.
+  vlr::CkBuffer<float> spread, padded;
+  vlr::CkBuffer<float> lines[kMlookSwaths];
+  bool allocated = spread.allocate(width) && padded.allocate(width + 2 * kKernelHalf);
+  float* composite = padded.data() + kKernelHalf;
+  for (int i = 0; i < kMlookSwaths; ++i) allocated = allocated && lines[i].allocate(lookLength_[i]);
+  if (!allocated) VLR_FAIL("Cannot allocate the composition buffers", vlr::kLibAlloc);
+  for (int k = 0; k < width; ++k) {
+    const double r = (rangeTime_[0] + k * spacing) / referenceTime;
+    spread[k] = static_cast<float>(r * r * r / 3.0);
+  }
+
+  // Ground range: the axis at the middle of the output gives the width.
+  const bool ground = conf_->Sl2Gr != 0;
+  GroundLine axis;
+  GeneralSAR* headers[kMlookSwaths];
+  for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
+  std::vector<float> kernels;
+  // Range times of the ground samples on the previous and the current line.
+  std::vector<double> nodes[2];
+  if (ground) {
+    for (int k = 0; k < kMlookSwaths; ++k)
+      if (headers_[k]->polys.nsl2gr < 1) VLR_FAIL("NO SL2GR poly available", vlr::kLibMissing);
+    if (!(conf_->GrSamplingStep > 0))
+      VLR_FAIL("Ground sampling step not positive", vlr::kLibInconsistent);
+    axis.set(headers, boundaryTime, outputStartTime_ + 0.5 * (outputLines_ - 1) * lineInterval_);
+    const double far = axis.ground(rangeTime_[0] + (width - 1) * spacing);
+    const double count = std::floor(far / conf_->GrSamplingStep + 1.0);
+    if (!(count >= 1.0) || count > 16.0 * width)
+      VLR_FAIL("Slant-to-ground polynomials give no ground range across the swath",
+               vlr::kLibInconsistent);
+    outputSamples_ = static_cast<int>(count);
+    outputFarRangeTime_ =
+        axis.slant((outputSamples_ - 1) * conf_->GrSamplingStep, NAN, kNewtonTolerance / fs);
+    const int phases = static_cast<int>(1.0f + 1.0f / kKernelStep);
+    try {
+      kernels.assign(static_cast<size_t>(phases) * kKernelTaps, 0.0f);
+      for (auto& n : nodes) n.assign(static_cast<size_t>(outputSamples_), NAN);
+    } catch (const std::bad_alloc&) {
+      VLR_FAIL("Cannot allocate the interpolation kernels", vlr::kLibAlloc);
+    }
+    float shift = -0.5f;
+    for (int p = 0; p < phases; ++p, shift += kKernelStep)
+      VLR_CALL(glsF(&kernels[static_cast<size_t>(p) * kKernelTaps], kKernelTaps, shift, kKernelBand,
+                    kKernelGuard));
+  } else {
+    outputSamples_ = width;
+    outputFarRangeTime_ = rangeTime_[0] + (width - 1) * spacing;
+  }
+  vlr::CkBuffer<float> groundLine;
+  if (ground && !groundLine.allocate(outputSamples_))
+    VLR_FAIL("Cannot allocate the ground line", vlr::kLibAlloc);
+
+  for (int i = 0; i < kMlookSwaths; ++i) {
+    DataFile& f = output_->swath[i];
+    f.set_buffer_size(kBufferBytes);
+    VLR_CALL(f.open(DataFile::kOpenRead));
+  }
+  const std::string name = output_->OutputFilename;
+  if (NVLR_UTILITY_FileExists(name.c_str()) && unlink(name.c_str()) != 0)
+    VLR_REPORT("Cannot remove file", ARE_WARNING);
+  errno = 0;
+  DataFile& image = output_->image;
+  image.set_name(name.c_str());
+  image.pixels_per_line = outputSamples_;
+  image.lines_per_image = outputLines_;
+  image.cell_type = CT_FLOAT32;
+  image.byte_order = 0;
+  image.row_prefix = 0;
+  image.header_offset = 0;
+  image.set_buffer_size(kBufferBytes);
+  VLR_CALL(image.open(DataFile::kOpenCreate));
+
+  const double tolerance = kNewtonTolerance / fs;
+  const int phases = static_cast<int>(kernels.size() / kKernelTaps);
+  int percent = -1;
+  for (int line = 0; line < outputLines_; ++line) {
+    if (line % kProgressLines == 0) {
+      const int now = static_cast<int>(100LL * line / outputLines_);
+      getAndSetPerc(percent, now, kProgressTitle);
+      percent = now;
+    }
+    std::fill(composite, composite + width, 0.0f);
+    for (int i = 0; i < kMlookSwaths; ++i) {
+      if (output_->swath[i].read(lines[i].data(),
+                                 static_cast<int64_t>(lookLength_[i]) * sizeof(float)) != 0)
+        VLR_FAIL("File reading failed!", vlr::kLibRead);
+      for (int k = begin[i]; k < end[i]; ++k) composite[k] = lines[i][k - offset_[i]];
+    }
+    for (int k = 0; k < width; ++k)
+      composite[k] = std::sqrt(std::max(0.0f, composite[k]) * spread[k]);
+    if (!ground) {
+      if (image.write(composite, static_cast<int64_t>(width) * sizeof(float)) != 0)
+        VLR_FAIL("File writing failed!", vlr::kLibWrite);
+      continue;
+    }
+    axis.set(headers, boundaryTime, outputStartTime_ + line * lineInterval_);
+    std::fill(padded.begin(), composite, composite[0]);
+    std::fill(composite + width, padded.end(), composite[width - 1]);
+    const float* c = composite;
+    float* out = groundLine.data();
+    const double step = conf_->GrSamplingStep;
+    const double first = rangeTime_[0];
+    const float* table = kernels.data();
+    // Range times exactly at every kNodeStride-th sample and the last
+    // (Newton from the previous line's value), linear in between: the
+    // mapping's curvature over a stride is far below the iteration's
+    // tolerance.  Each thread solves the nodes of its part and, for itself
+    // only, the first node of the next part.
+    const int count = outputSamples_;
+    const int last = count - 1;
+    const double* previous = nodes[line % 2].data();
+    double* current = nodes[(line + 1) % 2].data();
+    auto part = [&](int lo, int hi) {
+      for (int j = lo; j < hi; j += kNodeStride)
+        current[j] = axis.slant(j * step, previous[j], tolerance);
+      if (hi == count && last % kNodeStride != 0)
+        current[last] = axis.slant(last * step, previous[last], tolerance);
+      const double after = hi < count ? axis.slant(hi * step, previous[hi], tolerance) : NAN;
+      for (int j = lo; j < hi; ++j) {
+        const int j0 = j / kNodeStride * kNodeStride;
+        const int j1 = std::min(j0 + kNodeStride, last);
+        const double t1 = j1 == hi ? after : current[j1];
+        const double tau = j == j0 || j1 == j0
+                               ? current[j0]
+                               : current[j0] + (t1 - current[j0]) * (j - j0) / (j1 - j0);
+        const double x = (tau - first) / spacing;
+        if (!(x >= -0.5 && x <= width - 0.5)) {
+          out[j] = 0.0f;
+          continue;
+        }
+        // x >= -0.5 here, so truncation rounds to nearest.
+        const int i0 = static_cast<int>(x + 0.5);
+        int phase = static_cast<int>((x - i0) / kKernelStep + 0.5 + phases / 2);
+        phase = std::min(std::max(phase, 0), phases - 1);
+        const float* kernel = table + static_cast<size_t>(phase) * kKernelTaps;
+        float sum = 0.0f;
+        const float* around = c + std::min(i0, width - 1) - kKernelHalf;
+        for (int t = 0; t < kKernelTaps; ++t) sum += kernel[t] * around[t];
+        // Kernel side lobes may undershoot next to dark samples; an
+        // amplitude is never negative.
+        out[j] = std::max(sum, 0.0f);
+      }
+    };
+    const int split = count / 2 / kNodeStride * kNodeStride;
+    if (split < kNodeStride || helper_ == nullptr) {
+      part(0, count);
+    } else {
+      helper_->run([&] { part(split, count); }, [&] { part(0, split); });
+    }
+    if (image.write(out, static_cast<int64_t>(outputSamples_) * sizeof(float)) != 0)
+      VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  }
+  for (int i = 0; i < kMlookSwaths; ++i) output_->swath[i].close();
+  VLR_CALL(image.close());
+  return 0;
+}
+
+int mlook::outputPixelTimes(double column, double row, double* azimuth, double* range) {
+  VLR_SCOPE("outputPixelTimes", kModule);
+  if (headers_[0] == nullptr || !(fs > 0.0) || decimation_ < 1 || outputLines_ < 1)
+    VLR_FAIL("The output geometry is not known", vlr::kLibInconsistent);
+  const double az = outputStartTime_ + row * lineInterval_;
+  double rt = rangeTime_[0] + column * decimation_ / fs;
+  if (conf_->Sl2Gr != 0) {
+    // The same chained ground axis as the resampling, at the pixel's line.
+    GroundLine axis;
+    GeneralSAR* headers[kMlookSwaths];
+    for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
+    axis.set(headers, boundaryTime_, az);
+    rt = axis.slant(column * conf_->GrSamplingStep, NAN, kNewtonTolerance / fs);
+    if (!std::isfinite(rt)) VLR_FAIL("No slant range for the ground range", vlr::kLibInconsistent);
+  }
+  *azimuth = az;
+  *range = rt;
+  return 0;
+}
+
+int mlook::geolocate(double column, double row, double* lat, double* lon) {
+  VLR_SCOPE("geolocate", kModule);
+  double az = 0.0, rt = 0.0;
+  VLR_CALL(outputPixelTimes(column, row, &az, &rt));
+  VLR_CALL(headers_[0]->orbit.SVGetLatLon(az, rt, lat, lon));
+  return 0;
+}

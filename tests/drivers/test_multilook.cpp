@@ -1,0 +1,672 @@
+// The multilook command end to end, run the way the host runs it: an
+// installation, an argument-list file, the working file with "_batch_ok",
+// then the tool's exit code, Process.log, the error file and the files it
+// wrote.  Sizes and positions are checked against the generator's truth and
+// its own orbit geometry; the headers are read back with python's XML
+// parser and the TIFF image with GDAL.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <functional>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "installation.h"
+#include "synth_geometry.h"
+#include "synth_run.h"
+
+using synth_test::SynthRun;
+using vlr_test::Exists;
+using vlr_test::ReadFile;
+using vlr_test::TempInstallation;
+using vlr_test::WriteFile;
+
+namespace {
+
+constexpr const char* kMultilook = "main_multilook_WSS#";
+constexpr const char* kNotOK = "NotOK";
+constexpr const char* kOK = "OK";
+constexpr size_t kArguments = 14;
+constexpr size_t kProduct = 0, kRoot = 1, kDoris = 2, kGroundRange = 6, kTiff = 12,
+                 kSaturation = 13;
+constexpr int kSubSwaths = 5;
+constexpr double kHalfSpeedOfLight = 149896229.0;
+// "GrSamplingStep" of the installation's parameter file, metres.
+constexpr double kGroundStep = 75.0;
+constexpr size_t kFloatBytes = 4;
+constexpr const char* kPython = "/usr/bin/python3";
+constexpr const char* kGdalInfo = "gdalinfo";
+
+// The first element of each wanted name in a ".sml" header, "name=value"
+// (vector elements joined by '|'), and "OtherInfo.KEY=value" per OtherInfo
+// row.  A file that is not well-formed XML ends the script with an error.
+constexpr const char* kSmlReader = R"(
+import sys, xml.etree.ElementTree as E
+def name(e): return e.tag.split('}')[-1]
+want = set(sys.argv[2].split(','))
+seen = set()
+for e in E.parse(sys.argv[1]).getroot().iter():
+    n = name(e)
+    if n == 'OtherInfo':
+        for row in e.iter():
+            if name(row) == 'MatrixRow':
+                cells = [c.text or '' for c in row if name(c) == 'StringValue']
+                print('OtherInfo.%s=%s' % (cells[0], cells[1]))
+    elif n in want and n not in seen:
+        seen.add(n)
+        values = [v.text or '' for v in e.iter() if name(v).endswith('Value')]
+        print('%s=%s' % (n, '|'.join(values) if values else (e.text or '').strip()))
+)";
+constexpr const char* kSmlFields =
+    "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection";
+
+using Fields = std::map<std::string, std::string>;
+
+Fields ReadSml(const std::string& sml) {
+  const vlr_test::RunResult r =
+      vlr_test::RunProgram({kPython, "-c", kSmlReader, sml, kSmlFields}, {}, true);
+  EXPECT_EQ(r.status, 0) << sml << ": " << r.err;
+  Fields fields;
+  std::istringstream lines(r.out);
+  for (std::string line; std::getline(lines, line);) {
+    const size_t eq = line.find('=');
+    if (eq != std::string::npos) fields[line.substr(0, eq)] = line.substr(eq + 1);
+  }
+  return fields;
+}
+std::string Field(const Fields& f, const std::string& name) {
+  const auto it = f.find(name);
+  return it == f.end() ? std::string() : it->second;
+}
+long Integer(const Fields& f, const std::string& name) {
+  return std::atol(Field(f, name).c_str());
+}
+
+std::string Truth(const SynthRun& run, const std::string& section, const std::string& key) {
+  const auto s = run.truth.find(section);
+  if (s == run.truth.end() || s->second.count(key) == 0) return "<missing " + key + ">";
+  return s->second.at(key);
+}
+double TruthNumber(const SynthRun& run, const std::string& section, const std::string& key) {
+  return synth_test::truth_number(run.truth, section, key);
+}
+std::string SubSwath(int k) {
+  return "SubSwath" + std::to_string(k);
+}
+
+long FileSize(const std::string& path) {
+  struct stat st {};
+  return stat(path.c_str(), &st) == 0 ? static_cast<long>(st.st_size) : -1;
+}
+
+bool HaveGdal() {
+  return synth_test::shell("command -v gdalinfo > /dev/null 2>&1") == 0;
+}
+
+// Earth-fixed position of a point of the WGS84 ellipsoid surface.
+synth::Vec3 Ecef(double latDeg, double lonDeg) {
+  constexpr double e2 = 1.0 - (synth::kWgsB * synth::kWgsB) / (synth::kWgsA * synth::kWgsA);
+  const double phi = latDeg * M_PI / 180.0, lambda = lonDeg * M_PI / 180.0;
+  const double n = synth::kWgsA / std::sqrt(1.0 - e2 * std::sin(phi) * std::sin(phi));
+  return {n * std::cos(phi) * std::cos(lambda), n * std::cos(phi) * std::sin(lambda),
+          n * (1.0 - e2) * std::sin(phi)};
+}
+
+// The generator's geometry of a ground-range image: the zero-Doppler ground
+// point at azimuth time t that lies `distance` metres along the ellipsoid
+// from the ground point of range time nearTau (negative: towards nadir).
+synth::Vec3 GroundRangePoint(const synth::Trajectory& orbit, double t, double nearTau,
+                             double distance) {
+  // Slant-range steps of 10 m: the ground between two steps is straight to
+  // well under a millimetre.
+  constexpr double kStep = 10.0 / kHalfSpeedOfLight;
+  const synth::State s = orbit.at(t);
+  const double step = distance >= 0.0 ? kStep : -kStep;
+  synth::GroundPoint a, b;
+  synth::zero_doppler_point(s, nearTau, &a);
+  double travelled = 0.0;
+  for (double tau = nearTau + step;; tau += step) {
+    if (!synth::zero_doppler_point(s, tau, &b)) return {};
+    const double piece = synth::norm(b.x - a.x);
+    if (travelled + piece >= std::fabs(distance)) {
+      const double f = (std::fabs(distance) - travelled) / piece;
+      return a.x + f * (b.x - a.x);
+    }
+    travelled += piece;
+    a = b;
+  }
+}
+
+// A ground control point as gdalinfo lists it.
+struct Gcp {
+  double pixel = 0, line = 0, lon = 0, lat = 0;
+};
+struct GdalView {
+  int status = -1;
+  std::string text;
+  int width = 0, height = 0;
+  std::vector<Gcp> gcps;
+};
+
+GdalView GdalInfo(const std::string& tif) {
+  GdalView v;
+  const vlr_test::RunResult r = vlr_test::RunProgram({"/usr/bin/env", kGdalInfo, tif}, {}, true);
+  v.status = r.status;
+  v.text = r.out + r.err;
+  std::istringstream lines(r.out);
+  for (std::string line; std::getline(lines, line);) {
+    Gcp g;
+    double height = 0;
+    if (std::sscanf(line.c_str(), "Size is %d, %d", &v.width, &v.height) == 2) continue;
+    // "          (0.5,0.5) -> (12.3,45.6,0)"
+    if (std::sscanf(line.c_str(), " (%lf,%lf) -> (%lf,%lf,%lf)", &g.pixel, &g.line, &g.lon, &g.lat,
+                    &height) == 5)
+      v.gcps.push_back(g);
+  }
+  return v;
+}
+
+// What one run of the tool left for the host.
+struct Outcome {
+  int status = -1;
+  std::string log;    // what the run added to Process.log
+  std::string error;  // the error file; empty when the run wrote none
+  bool workingFileLeft = false;
+};
+
+class MultilookCommand : public ::testing::Test {
+ protected:
+  static void SetUpTestSuite() {
+    inst_ = new TempInstallation();
+    char pattern[] = "/tmp/vlr_multilook_XXXXXX";
+    ASSERT_NE(mkdtemp(pattern), nullptr);
+    scratch_ = std::string(pattern) + "/";
+    // A descending scene on the real DOR_VOR orbit, and an ascending one on
+    // the real preliminary orbit (DOR_POR).
+    vor_ = new SynthRun(synth_test::run_synth("--size tiny --pass descending"));
+    por_ =
+        new SynthRun(synth_test::run_synth("--size tiny --pass ascending --polarisation VV "
+                                           "--seed 3 --orbit " +
+                                           vlr_test::kSamplePor));
+    ASSERT_EQ(vor_->exit_code, 0);
+    ASSERT_EQ(por_->exit_code, 0);
+    ASSERT_EQ(Truth(*vor_, "Scene", "OrbitFile").rfind("DOR_VOR_", 0), 0u);
+    ASSERT_EQ(Truth(*por_, "Scene", "OrbitFile").rfind("DOR_POR_", 0), 0u);
+
+    // Ground range asked for by the command while the parameter file says
+    // slant range, with the TIFF copy.
+    parameters({{"Sl2Gr", "0"}});
+    groundArgs_ = arguments(*vor_, folder("ground") + "R");
+    groundArgs_[kGroundRange] = kOK;
+    groundArgs_[kTiff] = kOK;
+    groundArgs_[kSaturation] = "2";
+    useAuxiliaryListOf(*vor_);
+    groundRun_ = runTool(groundArgs_);
+    // Slant range while the parameter file says ground range; "ok" is not
+    // "OK" for either switch.
+    parameters({{"Sl2Gr", "1"}});
+    slantArgs_ = arguments(*vor_, folder("slant") + "R");
+    slantArgs_[kGroundRange] = "ok";
+    slantArgs_[kTiff] = "ok";
+    slantRun_ = runTool(slantArgs_);
+    // The preliminary orbit, ground range and TIFF, installed parameters.
+    parameters({});
+    porArgs_ = arguments(*por_, folder("por") + "R");
+    porArgs_[kGroundRange] = kOK;
+    porArgs_[kTiff] = kOK;
+    useAuxiliaryListOf(*por_);
+    porRun_ = runTool(porArgs_);
+    ready_ = true;
+  }
+  static void TearDownTestSuite() {
+    for (SynthRun* r : {vor_, por_}) {
+      if (r != nullptr) synth_test::remove_run(*r);
+      delete r;
+    }
+    vor_ = por_ = nullptr;
+    std::error_code ec;
+    std::filesystem::remove_all(scratch_, ec);
+    delete inst_;
+    inst_ = nullptr;
+    ready_ = false;
+  }
+  void SetUp() override { ASSERT_TRUE(ready_) << "the generated products are missing"; }
+  void TearDown() override { parameters({}); }
+
+  // Exactly 14 arguments: product, output root and orbit, the rest "NotOK".
+  static std::vector<std::string> arguments(const SynthRun& run, const std::string& root) {
+    std::vector<std::string> a(kArguments, kNotOK);
+    a[kProduct] = run.product;
+    a[kRoot] = root;
+    a[kDoris] = run.dir + Truth(run, "Scene", "OrbitFile");
+    return a;
+  }
+  // A new empty folder under the scratch folder; ends with '/'.
+  static std::string folder(const std::string& name) {
+    const std::string path = scratch_ + name + "/";
+    std::filesystem::create_directories(path);
+    return path;
+  }
+  static std::string desFolder() { return inst_->root() + "/des/"; }
+
+  // The installation's multilook parameter file with the given keys set to
+  // new values; an empty value removes the key.
+  static void parameters(const std::map<std::string, std::string>& edits) {
+    std::istringstream in(
+        ReadFile(vlr_test::SourceDir() + "/data/install/parameters_multilook.hdr"));
+    std::string out;
+    for (std::string line; std::getline(in, line);) {
+      const std::string key = line.substr(0, line.find(' '));
+      const auto edit = edits.find(key);
+      if (edit == edits.end())
+        out += line + "\n";
+      else if (!edit->second.empty())
+        out += key + " = " + edit->second + "\n";
+    }
+    WriteFile(desFolder() + "parameters_multilook.hdr", out);
+  }
+
+  // Puts the generator's auxiliary list and files where the command looks.
+  static void useAuxiliaryListOf(const SynthRun& run) {
+    ASSERT_EQ(synth_test::shell("cp " + run.dir + "ASA_AUX_list.dat " + run.dir + "ASA_XCA_* " +
+                                run.dir + "ASA_INS_* " + desFolder()),
+              0);
+  }
+
+  // Runs the command as the host does and collects what it left.
+  // `withdrawn`: the host has already deleted "_batch_ok".
+  static Outcome runTool(const std::vector<std::string>& args, bool withdrawn = false) {
+    const std::string logPath = inst_->working() + "Process.log";
+    const std::string errorPath = inst_->workingFile() + "_error";
+    std::remove(errorPath.c_str());
+    const size_t logBefore = ReadFile(logPath).size();
+    inst_->hostFiles();
+    if (withdrawn) std::remove((inst_->workingFile() + "_batch_ok").c_str());
+    Outcome o;
+    const vlr_test::RunResult r = inst_->run(kMultilook + inst_->writeArguments(args));
+    o.status = r.status;
+    o.log = ReadFile(logPath).substr(logBefore);
+    o.error = ReadFile(errorPath);
+    o.workingFileLeft = Exists(inst_->workingFile());
+    return o;
+  }
+
+  static bool ready_;
+  static TempInstallation* inst_;
+  static std::string scratch_;
+  static SynthRun* vor_;
+  static SynthRun* por_;
+  static std::vector<std::string> groundArgs_, slantArgs_, porArgs_;
+  static Outcome groundRun_, slantRun_, porRun_;
+};
+
+bool MultilookCommand::ready_ = false;
+TempInstallation* MultilookCommand::inst_ = nullptr;
+std::string MultilookCommand::scratch_;
+SynthRun* MultilookCommand::vor_ = nullptr;
+SynthRun* MultilookCommand::por_ = nullptr;
+std::vector<std::string> MultilookCommand::groundArgs_, MultilookCommand::slantArgs_,
+    MultilookCommand::porArgs_;
+Outcome MultilookCommand::groundRun_, MultilookCommand::slantRun_, MultilookCommand::porRun_;
+
+std::string StartText(const std::vector<std::string>& args) {
+  return "\nINPUT ASA_RS : [ " + args[kProduct] + " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] +
+         " ]\nINPUT DORIS : [ " + args[kDoris] + " ]";
+}
+
+// A successful run: exit 0, the START record with the inputs, SUCCESSFUL and
+// the END record, no error anywhere, the working file deleted.
+void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
+  ASSERT_EQ(o.status, 0) << o.error << o.log;
+  const size_t start = o.log.find("\nSTART : Multilooking ASA WSS  [");
+  const size_t successful = o.log.find("\n\nSUCCESSFUL\n\n");
+  const size_t end = o.log.find("\nEND : ");
+  EXPECT_NE(start, std::string::npos) << o.log;
+  EXPECT_NE(o.log.find(StartText(args)), std::string::npos) << o.log;
+  EXPECT_NE(successful, std::string::npos) << o.log;
+  EXPECT_NE(end, std::string::npos) << o.log;
+  EXPECT_LT(start, successful);
+  EXPECT_LT(successful, end);
+  EXPECT_EQ(o.log.find("ERROR"), std::string::npos) << o.log;
+  EXPECT_EQ(o.error, "");
+  EXPECT_FALSE(o.workingFileLeft);
+}
+
+// A failed run: its code as exit status (255 for codes beyond a byte), the
+// error file naming the code and `extra`, the ERROR record with `logText`,
+// no SUCCESSFUL, the working file left for the host.
+void ExpectFailure(const Outcome& o, int code, const std::string& extra,
+                   const std::string& logText) {
+  EXPECT_EQ(o.status, code <= 255 ? code : 255) << o.error;
+  EXPECT_EQ(o.error.rfind("-1\n", 0), 0u) << o.error;
+  EXPECT_NE(o.error.find("[EC : " + std::to_string(code) + "]\n" + extra), std::string::npos)
+      << o.error;
+  EXPECT_NE(o.log.find("\nSTART : Multilooking ASA WSS  ["), std::string::npos) << o.log;
+  EXPECT_NE(o.log.find("[ERROR ID : " + std::to_string(code) + "]"), std::string::npos) << o.log;
+  EXPECT_NE(o.log.find(logText), std::string::npos) << o.log;
+  EXPECT_EQ(o.log.find("SUCCESSFUL"), std::string::npos) << o.log;
+  EXPECT_TRUE(o.workingFileLeft);
+}
+
+// The output of a successful run over `root` ("_gr" or "_pwr" appended) and
+// what lies beside it: the list file of the import, the raster as large as
+// its headers say, the ENVI header that replaced the processor header, the
+// suite header of the composed swath, and no temporary or other-geometry
+// files.
+Fields ExpectOutput(const SynthRun& run, const std::string& root, bool ground) {
+  std::string list;
+  for (int k = 1; k <= kSubSwaths; ++k) list += root + std::to_string(k) + "_slc\n";
+  EXPECT_EQ(ReadFile(root), list);
+  const std::string output = root + (ground ? "_gr" : "_pwr");
+  EXPECT_FALSE(Exists(root + (ground ? "_pwr" : "_gr")));
+  for (int k = 1; k <= kSubSwaths; ++k) EXPECT_FALSE(Exists(output + "SS" + std::to_string(k)));
+
+  const Fields f = ReadSml(output + ".sml");
+  const long lines = Integer(f, "NrOfLinesPerImage");
+  const long samples = Integer(f, "NrOfPixelsPerLine");
+  EXPECT_EQ(FileSize(output), lines * samples * static_cast<long>(kFloatBytes));
+  const std::string envi = ReadFile(output + ".hdr");
+  EXPECT_EQ(envi.rfind("ENVI\n", 0), 0u) << envi;
+  EXPECT_NE(envi.find("\nsamples = " + std::to_string(samples) + "\n"), std::string::npos) << envi;
+  EXPECT_NE(envi.find("\nlines = " + std::to_string(lines) + "\n"), std::string::npos) << envi;
+  EXPECT_NE(envi.find("\ndata type = 4\n"), std::string::npos) << envi;
+  // A ground-range image states its ground spacing as it is.
+  EXPECT_EQ(Field(f, "Projection"), ground ? "GROUND_RANGE" : "SLANT_RANGE");
+  if (ground) {
+    EXPECT_NE(envi.find("\npixel size = {75, "), std::string::npos) << envi;
+  }
+  EXPECT_EQ(Field(f, "CellType"), "FLOAT");
+
+  const std::string polarisation = Truth(run, "Scene", "Polarisation");
+  EXPECT_EQ(
+      Field(f, "OtherInfo.SCENE DATA").rfind("ENVISAT-1|ENVISAT_WSM|ALL|" + polarisation + "|", 0),
+      0u)
+      << Field(f, "OtherInfo.SCENE DATA");
+  EXPECT_EQ(Field(f, "OtherInfo.ORIGIN DATA"), ground ? "ENVISAT_WS_GR" : "ENVISAT_WS_SR");
+  // The fixed ENVISAT header of a composed product comes from the
+  // calibration file chosen from the auxiliary list.
+  std::string product = Field(f, "PRODUCT");
+  product.erase(product.find_last_not_of(' ') + 1);
+  EXPECT_EQ(product, Truth(run, "Scene", "XcaFile"));
+
+  // One output line per input line interval from the first line of the
+  // scene to its last.
+  const double span =
+      TruthNumber(run, "Scene", "SensingStop") - TruthNumber(run, "Scene", "SensingStart");
+  EXPECT_NEAR(lines, span / TruthNumber(run, "Scene", "LineTimeInterval") + 1.0, 1.0);
+  return f;
+}
+
+// Ground range from the near edge of sub-swath 1 to the far edge of
+// sub-swath 5 at the first line of the scene.
+double SwathWidthOnGround(const SynthRun& run) {
+  synth::DorisTrajectory orbit;
+  std::string error;
+  EXPECT_TRUE(orbit.load(run.dir + Truth(run, "Scene", "OrbitFile"), &error)) << error;
+  const synth::State s = orbit.at(TruthNumber(run, "Scene", "SensingStart"));
+  const double near = TruthNumber(run, SubSwath(1), "NearRangeTime");
+  const double far = TruthNumber(run, SubSwath(kSubSwaths), "FarRangeTime");
+  constexpr int kPieces = 1000;
+  double width = 0.0;
+  synth::GroundPoint a, b;
+  synth::zero_doppler_point(s, near, &a);
+  for (int i = 1; i <= kPieces; ++i) {
+    synth::zero_doppler_point(s, near + (far - near) * i / kPieces, &b);
+    width += synth::norm(b.x - a.x);
+    a = b;
+  }
+  return width;
+}
+
+// The TIFF copy of a ground-range output: GDAL opens it with the output's
+// size; its ground control points lie within one output pixel of the
+// generator's ground point of their image position, and those at the image
+// corners within one pixel of the scene's corners; its suite header is
+// well-formed XML describing the 8-bit image.
+void ExpectTiff(const SynthRun& run, const std::string& output) {
+  const Fields f = ReadSml(output + ".sml");
+  const long lines = Integer(f, "NrOfLinesPerImage");
+  const long samples = Integer(f, "NrOfPixelsPerLine");
+  const Fields tifHeader = ReadSml(output + ".tif.sml");
+  EXPECT_EQ(Field(tifHeader, "CellType"), "UNSIGNED_BYTE");
+  EXPECT_EQ(Integer(tifHeader, "NrOfLinesPerImage"), lines);
+  EXPECT_EQ(Integer(tifHeader, "NrOfPixelsPerLine"), samples);
+
+  const GdalView v = GdalInfo(output + ".tif");
+  ASSERT_EQ(v.status, 0) << v.text;
+  EXPECT_EQ(v.width, samples);
+  EXPECT_EQ(v.height, lines);
+  ASSERT_FALSE(v.gcps.empty()) << "no ground control points:\n" << v.text;
+  EXPECT_NE(v.text.find("GCP Projection = "), std::string::npos) << v.text;
+  EXPECT_NE(v.text.find("WGS 84"), std::string::npos) << v.text;
+
+  synth::DorisTrajectory orbit;
+  std::string error;
+  ASSERT_TRUE(orbit.load(run.dir + Truth(run, "Scene", "OrbitFile"), &error)) << error;
+  const double start = TruthNumber(run, "Scene", "SensingStart");
+  const double interval = TruthNumber(run, "Scene", "LineTimeInterval");
+  const double nearTau = TruthNumber(run, SubSwath(1), "NearRangeTime");
+  const double pixel = std::hypot(kGroundStep, TruthNumber(run, "Scene", "AzimuthSpacing"));
+  // GDAL places pixel i between i and i + 1: its centre is at i + 0.5.
+  for (const Gcp& g : v.gcps) {
+    const double t = start + (g.line - 0.5) * interval;
+    const synth::Vec3 truth = GroundRangePoint(orbit, t, nearTau, (g.pixel - 0.5) * kGroundStep);
+    EXPECT_LE(synth::norm(Ecef(g.lat, g.lon) - truth), pixel)
+        << "GCP (" << g.pixel << ", " << g.line << ") -> (" << g.lon << ", " << g.lat << ")";
+  }
+  const struct {
+    double pixel, line;
+    const char* truth;
+  } corners[] = {{0.5, 0.5, "SphFirstNear"},
+                 {samples - 0.5, 0.5, "SphFirstFar"},
+                 {0.5, lines - 0.5, "SphLastNear"},
+                 {samples - 0.5, lines - 0.5, "SphLastFar"}};
+  for (const auto& c : corners) {
+    SCOPED_TRACE(c.truth);
+    const auto closest =
+        std::min_element(v.gcps.begin(), v.gcps.end(), [&](const Gcp& a, const Gcp& b) {
+          return std::hypot(a.pixel - c.pixel, a.line - c.line) <
+                 std::hypot(b.pixel - c.pixel, b.line - c.line);
+        });
+    ASSERT_LE(std::hypot(closest->pixel - c.pixel, closest->line - c.line), 1.0)
+        << "no ground control point at this corner";
+    const synth::Vec3 truth = Ecef(TruthNumber(run, "Scene", std::string(c.truth) + "Lat"),
+                                   TruthNumber(run, "Scene", std::string(c.truth) + "Lon"));
+    EXPECT_LE(synth::norm(Ecef(closest->lat, closest->lon) - truth), pixel);
+  }
+}
+
+TEST_F(MultilookCommand, GroundRangeWhenAskedWhateverTheParameterFileSays) {
+  ExpectSuccess(groundRun_, groundArgs_);
+  const Fields f = ExpectOutput(*vor_, groundArgs_[kRoot], true);
+  // Samples every GrSamplingStep from the near edge of the first sub-swath
+  // up to the far edge of the last.
+  EXPECT_NEAR(Integer(f, "NrOfPixelsPerLine"), SwathWidthOnGround(*vor_) / kGroundStep + 1.0, 1.0);
+  EXPECT_TRUE(Exists(groundArgs_[kRoot] + "_gr.tif"));
+}
+
+TEST_F(MultilookCommand, SlantRangeWithoutTiffUnlessExactlyOK) {
+  ExpectSuccess(slantRun_, slantArgs_);
+  const Fields f = ExpectOutput(*vor_, slantArgs_[kRoot], false);
+  // The composed lines cover the slant range from the first sample of the
+  // first sub-swath to the last of the fifth; beyond it at most the padding
+  // of the fifth sub-swath's range transform, whose length is rounded up to
+  // one with small prime factors (a few percent).
+  const double near = TruthNumber(*vor_, SubSwath(1), "NearRangeTime");
+  const double lastNear = TruthNumber(*vor_, SubSwath(kSubSwaths), "NearRangeTime");
+  const double far = TruthNumber(*vor_, SubSwath(kSubSwaths), "FarRangeTime");
+  const double span = (far - near) * kHalfSpeedOfLight;
+  const double padding = 0.1 * (far - lastNear) * kHalfSpeedOfLight;
+  const double spacing = std::atof(Field(f, "PixelSpacingRg").c_str());
+  const double width = Integer(f, "NrOfPixelsPerLine") * spacing;
+  EXPECT_GE(width, span - spacing);
+  EXPECT_LE(width, span + padding + spacing);
+  const std::string output = slantArgs_[kRoot] + "_pwr";
+  EXPECT_FALSE(Exists(output + ".tif"));
+  EXPECT_FALSE(Exists(output + ".tif.sml"));
+  EXPECT_EQ(slantRun_.log.find("MAKE TIFF OF FILE"), std::string::npos) << slantRun_.log;
+}
+
+TEST_F(MultilookCommand, AntennaFlagInTheParameterFileChangesNothing) {
+  ASSERT_EQ(slantRun_.status, 0);
+  parameters({{"Sl2Gr", "1"}, {"RgAnt_flag", "1"}});
+  std::vector<std::string> args = slantArgs_;
+  args[kRoot] = folder("antenna") + "R";
+  useAuxiliaryListOf(*vor_);
+  ExpectSuccess(runTool(args), args);
+  const std::string flagged = ReadFile(args[kRoot] + "_pwr");
+  ASSERT_FALSE(flagged.empty());
+  EXPECT_TRUE(flagged == ReadFile(slantArgs_[kRoot] + "_pwr"))
+      << "the antenna correction changed the image";
+}
+
+TEST_F(MultilookCommand, PreliminaryOrbitIsAccepted) {
+  ExpectSuccess(porRun_, porArgs_);
+  ExpectOutput(*por_, porArgs_[kRoot], true);
+}
+
+TEST_F(MultilookCommand, TiffOpensInGdalWithControlPointsOnTheScene) {
+  if (!HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
+  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
+  ASSERT_EQ(porRun_.status, 0) << porRun_.error;
+  {
+    SCOPED_TRACE("descending scene, DOR_VOR");
+    ExpectTiff(*vor_, groundArgs_[kRoot] + "_gr");
+  }
+  {
+    SCOPED_TRACE("ascending scene, DOR_POR");
+    ExpectTiff(*por_, porArgs_[kRoot] + "_gr");
+  }
+  EXPECT_NE(groundRun_.log.find("MAKE TIFF OF FILE [" + groundArgs_[kRoot] + "_gr]"),
+            std::string::npos)
+      << groundRun_.log;
+}
+
+TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
+  const SynthRun& run = *vor_;
+  const std::string xca = run.dir + Truth(run, "Scene", "XcaFile");
+  const std::vector<uint8_t> productBytes = synth_test::read_file(run.product);
+  const std::string productName = Truth(run, "Scene", "Product");
+  const std::string mdsOffset = Truth(run, SubSwath(3), "MdsOffset");
+
+  struct Case {
+    const char* what;
+    int code;
+    std::string extra;    // text after "[EC : code]\n" in the error file
+    std::string logText;  // text in Process.log
+    // Prepares the case in its folder (ends with '/') and edits the arguments.
+    std::function<void(const std::string&, std::vector<std::string>&)> prepare;
+    bool listFileWritten = false;
+    bool withdrawn = false;
+  };
+  // A copy of the product, under its own name in `dir`, with `edit` applied.
+  auto productCopy = [&](const std::string& dir,
+                         const std::function<void(std::string&)>& edit) -> std::string {
+    std::string bytes(productBytes.begin(), productBytes.end());
+    edit(bytes);
+    WriteFile(dir + productName, bytes);
+    return dir + productName;
+  };
+  const Case cases[] = {
+      {"13 arguments", 456962, inst_->working() + "args.txt\n", " Parameter 12 (NotOK)\n",
+       [](const std::string&, std::vector<std::string>& a) { a.pop_back(); }},
+      {"no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]",
+       [](const std::string&, std::vector<std::string>& a) { a[kProduct] = kNotOK; }},
+      {"a calibration file as product", 456962, "WSS\n", "INVALID INPUT",
+       [&](const std::string&, std::vector<std::string>& a) { a[kProduct] = xca; }},
+      {"no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
+       [](const std::string&, std::vector<std::string>& a) { a[kRoot] = kNotOK; }},
+      {"no orbit", 456962, "DOR_VOR\n", "INPUT DORIS : [ NotOK ]",
+       [](const std::string&, std::vector<std::string>& a) { a[kDoris] = kNotOK; }},
+      {"a calibration file as orbit", 456962, "DOR_VOR\n", "INVALID INPUT",
+       [&](const std::string&, std::vector<std::string>& a) { a[kDoris] = xca; }},
+      {"no auxiliary file valid at the sensing start", 130560, "findaux()\n", "file : find_aux",
+       [&](const std::string&, std::vector<std::string>&) {
+         WriteFile(desFolder() + "ASA_AUX_list.dat",
+                   "[ASA_XCA_0]\nStartDate = 01-JAN-2000 00:00:00\nStopDate = 01-JAN-2001 "
+                   "00:00:00\nFileName = " +
+                       Truth(run, "Scene", "XcaFile") + "\n");
+       }},
+      {"a product cut inside its third sub-swath", 130560, "images run()\n", "file : images_v2",
+       [&](const std::string& dir, std::vector<std::string>& a) {
+         a[kProduct] = productCopy(dir, [&](std::string& b) { b.resize(std::stoul(mdsOffset)); });
+       }},
+      {"a polarisation the conversion does not know", 130560, "tessal2kestova()\n",
+       "Wrong Polarization Type",
+       [&](const std::string& dir, std::vector<std::string>& a) {
+         a[kProduct] = productCopy(dir, [](std::string& b) {
+           const std::string field = "MDS1_TX_RX_POLAR=\"";
+           const size_t at = b.find(field);
+           if (at != std::string::npos) b[at + field.size()] = 'X';
+         });
+       }},
+      {"a list file that cannot be created", 9, "", "File not opened!",
+       [](const std::string& dir, std::vector<std::string>&) {
+         std::filesystem::create_directories(dir + "R.list_tmp");
+       }},
+      {"a parameter file without W1", 130560, "mlook conf readpar()\n", "PROCESSING STEP FAILED",
+       [](const std::string&, std::vector<std::string>&) {
+         parameters({{"W1", ""}});
+       },
+       true},
+      {"a ground resolution out of range", 130560, "mlook conf checkpar()\n",
+       "PROCESSING STEP FAILED",
+       [](const std::string&, std::vector<std::string>&) {
+         parameters({{"GrResolution", "5000"}});
+       },
+       true},
+      {"more than 15 range looks", 130560, "mlook run()\n",
+       "Number of estimated range looks must be lower than 15",
+       [](const std::string&, std::vector<std::string>&) {
+         parameters({{"GrResolution", "1000"}});
+       },
+       true},
+      {"a processor header that cannot be written", 130560, "mlook writepar()\n",
+       "PROCESSING STEP FAILED",
+       [](const std::string& dir, std::vector<std::string>&) {
+         std::filesystem::create_directories(dir + "R_pwr.hdr");
+       },
+       true},
+      {"a suite header that cannot be written", 261124, "", "R_pwr.sml",
+       [](const std::string& dir, std::vector<std::string>&) {
+         std::filesystem::create_directories(dir + "R_pwr.sml");
+       },
+       true},
+      // The host deleted "_batch_ok" before the start: the first progress
+      // update, when the extraction starts copying lines, ends the run
+      // before any sub-swath is converted.
+      {"a run withdrawn by the host", 326400, inst_->workingFile() + "\n",
+       "END :  Extracting data...", [](const std::string&, std::vector<std::string>&) {}, false,
+       true},
+  };
+  int n = 0;
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    const std::string dir = folder("failure" + std::to_string(++n));
+    std::vector<std::string> args = arguments(run, dir + "R");
+    useAuxiliaryListOf(run);
+    c.prepare(dir, args);
+    const Outcome o = runTool(args, c.withdrawn);
+    ExpectFailure(o, c.code, c.extra, c.logText);
+    EXPECT_EQ(Exists(dir + "R"), c.listFileWritten);
+    // The multilook never starts without the list.
+    if (!c.listFileWritten) {
+      EXPECT_FALSE(Exists(dir + "R_pwr"));
+    }
+    if (c.withdrawn) {
+      EXPECT_FALSE(Exists(dir + "R1_slc"));
+    }
+    // A processor that ran leaves no temporary sub-swath power file.
+    for (int k = 1; k <= kSubSwaths; ++k) EXPECT_FALSE(Exists(dir + "R_pwrSS" + std::to_string(k)));
+    parameters({});
+  }
+}
+
+}  // namespace

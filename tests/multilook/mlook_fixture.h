@@ -1,0 +1,238 @@
+// Generator products imported once per test program (extraction and header
+// conversion), multilooked by each test in its own installation, and the
+// truth that the results are checked against.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "convert/imagesar_kestova.h"
+#include "extraction/images.h"
+#include "multilook/mlook.h"
+#include "raster/cell_type.h"
+#include "runtime/ckerr.h"
+#include "runtime/suite_state.h"
+#include "sar_container/general_sar.h"
+#include "suite_fixture.h"
+#include "synth_geometry.h"
+#include "synth_run.h"
+
+namespace mlook_test {
+
+constexpr double kHalfSpeedOfLight = 149896229.0;
+// Ground sampling step of the installed parameter file, m.
+constexpr double kGroundStep = 75.0;
+
+// A generated product with its five sub-swaths extracted and converted:
+// rasters "<root>k_slc" with their suite headers.
+struct Imported {
+  synth_test::SynthRun run;
+  std::string root;
+  double number(const std::string& section, const std::string& key) const {
+    return synth_test::truth_number(run.truth, section, key);
+  }
+  double swath(int k, const std::string& key) const {
+    return number("SubSwath" + std::to_string(k + 1), key);
+  }
+};
+
+// A float raster read whole: lines x samples.
+struct Image {
+  int samples = 0, lines = 0;
+  std::vector<float> v;
+  float at(int line, int sample) const { return v[static_cast<size_t>(line) * samples + sample]; }
+  double power(int line, int sample) const {
+    const double a = at(line, sample);
+    return a * a;
+  }
+};
+
+// Result of one multilook run.
+struct Output {
+  int code = -1;
+  std::string name;  // the output raster
+  Image image;
+  std::unique_ptr<GeneralSAR> header;  // "<name>.hdr"
+  int looks = 0, decimation = 0;
+};
+
+class MultilookTest : public vlr_test::SuiteTest {
+ protected:
+  void SetUp() override {
+    SuiteTest::SetUp();
+    init_ckerr_locking();
+    init_report(0, "ASAR FOCUSSING", 1);
+    inst_.hostFiles();
+    vlr_detail::suite().workingFile = inst_.workingFile();
+  }
+  static void TearDownTestSuite() {
+    for (auto& p : products()) synth_test::remove_run(p.second->run);
+    products().clear();
+  }
+
+  // The product of the generator arguments, generated and imported on
+  // first use.
+  const Imported& product(const std::string& args) {
+    auto& cache = products();
+    auto found = cache.find(args);
+    if (found != cache.end()) return *found->second;
+    auto p = std::make_unique<Imported>();
+    p->run = synth_test::run_synth(args);
+    EXPECT_EQ(p->run.exit_code, 0) << args;
+    images_conf conf;
+    images ex(conf);
+    std::snprintf(ex.input.ASA_level1_filename, kImagesNameSize, "%s", p->run.product.c_str());
+    std::snprintf(ex.input.ASA_dor_vor, kImagesNameSize, "%s%s", p->run.dir.c_str(),
+                  text(p->run, "Scene", "OrbitFile").c_str());
+    p->root = p->run.dir + "R";
+    std::snprintf(ex.output.OutputFile, kImagesNameSize, "%s", p->root.c_str());
+    EXPECT_EQ(ex.run(), 0);
+    EXPECT_EQ(tessal2kestova(p->root.c_str(), xca(*p).c_str()), 0);
+    return *(cache[args] = std::move(p));
+  }
+  static std::string text(const synth_test::SynthRun& run, const std::string& section,
+                          const std::string& key) {
+    const auto s = run.truth.find(section);
+    return s == run.truth.end() || s->second.count(key) == 0 ? "" : s->second.at(key);
+  }
+  static std::string xca(const Imported& p) { return p.run.dir + text(p.run, "Scene", "XcaFile"); }
+
+  // The configuration of the installation's parameter file.
+  static void installedConfiguration(mlook_conf* conf) {
+    const std::string file = SourceDir() + "/data/install/parameters_multilook.hdr";
+    ASSERT_EQ(conf->readpar(file.c_str()), 0);
+    ASSERT_EQ(conf->checkpar(), 0);
+  }
+  static std::string SourceDir() { return vlr_test::SourceDir(); }
+
+  // Multilooks `p` into "<working>name" as the driver does; `edit` may
+  // change the blocks first.
+  Output multilook(const Imported& p, const std::string& name, bool ground,
+                   const std::function<void(mlook_conf&, mlook_input&)>& edit = nullptr) {
+    Output out;
+    mlook_conf conf;
+    installedConfiguration(&conf);
+    conf.Sl2Gr = ground ? 1 : 0;
+    mlook_input input;
+    mlook_output output;
+    std::snprintf(input.Level1Filename, kMlookNameSize, "%s", p.root.c_str());
+    std::snprintf(input.ASA_XCA_Filename, kMlookNameSize, "%s", xca(p).c_str());
+    out.name = work(name);
+    std::snprintf(output.OutputFilename, kMlookNameSize, "%s", out.name.c_str());
+    if (edit) edit(conf, input);
+    const int blocks = ckerr_count();
+    {
+      mlook ml(&conf, &input, &output);
+      out.code = ml.readimages_kestova();
+      if (out.code == 0) out.code = ml.run();
+      if (out.code == 0) out.code = ml.writepar();
+      const int freed = ml.freeimages();
+      if (out.code == 0) out.code = freed;
+      out.looks = ml.looks();
+      out.decimation = ml.decimation();
+    }
+    // Every checked block of the run is released, on failure too.
+    EXPECT_EQ(ckerr_count(), blocks);
+    if (out.code != 0) return out;
+    out.header = std::make_unique<GeneralSAR>();
+    EXPECT_EQ(out.header->GSread((out.name + ".hdr").c_str()), 0);
+    out.image = readImage(out.name, out.header->datafile.data.pixels_per_line,
+                          out.header->datafile.data.lines_per_image);
+    return out;
+  }
+
+  static Image readImage(const std::string& name, int samples, int lines) {
+    Image im;
+    im.samples = samples;
+    im.lines = lines;
+    const std::vector<uint8_t> bytes = synth_test::read_file(name);
+    EXPECT_EQ(bytes.size(), static_cast<size_t>(samples) * lines * 4) << name;
+    im.v.resize(bytes.size() / 4);
+    std::memcpy(im.v.data(), bytes.data(), im.v.size() * 4);
+    return im;
+  }
+
+  // The generator's own trajectory of the product, for ground positions.
+  static std::unique_ptr<synth::DorisTrajectory> trajectory(const Imported& p) {
+    auto t = std::make_unique<synth::DorisTrajectory>();
+    std::string error;
+    EXPECT_TRUE(t->load(p.run.dir + text(p.run, "Scene", "OrbitFile"), &error)) << error;
+    return t;
+  }
+
+ private:
+  static std::map<std::string, std::unique_ptr<Imported>>& products() {
+    static std::map<std::string, std::unique_ptr<Imported>> cache;
+    return cache;
+  }
+};
+
+// Output pixel coordinates of scene times, from the output header's grid:
+// lines from its start time and line interval; columns from its first range
+// time and sampling in slant range, from the generator's ground range (at
+// the middle of the scene) in ground range.  daz: time from the scene
+// start; drg: range time from the near range of sub-swath 1.
+class Grid {
+ public:
+  Grid(const Output& o, const Imported& p, const synth::Trajectory* traj)
+      : t0_(p.number("Scene", "SensingStart")),
+        nearTau_(p.swath(0, "NearRangeTime")),
+        start_(o.header->roi.roi.SlowStartTime),
+        interval_(o.header->roi.roi.SlowTimeDelta),
+        firstTau_(o.header->roi.roi.FastStartTime),
+        rate_(o.header->sampling.frg_hz),
+        ground_(traj != nullptr) {
+    if (!ground_) return;
+    // Ground range along the middle line at fine range steps, summed from
+    // chords of the generator's ground points.
+    const double mid = 0.5 * (t0_ + p.number("Scene", "SensingStop"));
+    const synth::State s = traj->at(mid);
+    const double far = p.swath(4, "FarRangeTime") + 1e-6;
+    synth::GroundPoint previous;
+    synth::zero_doppler_point(s, nearTau_, &previous);
+    double sum = 0.0;
+    for (int i = 0; i <= kSteps; ++i) {
+      const double tau = nearTau_ + (far - nearTau_) * i / kSteps;
+      synth::GroundPoint g;
+      synth::zero_doppler_point(s, tau, &g);
+      sum += synth::norm(g.x - previous.x);
+      previous = g;
+      taus_.push_back(tau - nearTau_);
+      grounds_.push_back(sum);
+    }
+  }
+  double line(double daz) const { return (t0_ + daz - start_) / interval_; }
+  double time(int line) const { return start_ + line * interval_ - t0_; }
+  double column(double drg) const {
+    if (!ground_) return (nearTau_ + drg - firstTau_) * rate_;
+    return Interpolate(taus_, grounds_, drg) / kGroundStep;
+  }
+  double rangeTime(int column) const {
+    if (!ground_) return firstTau_ + column / rate_ - nearTau_;
+    return Interpolate(grounds_, taus_, column * kGroundStep);
+  }
+
+ private:
+  static constexpr int kSteps = 4000;
+  static double Interpolate(const std::vector<double>& x, const std::vector<double>& y, double at) {
+    const size_t i = static_cast<size_t>(std::min<std::ptrdiff_t>(
+        std::max<std::ptrdiff_t>(std::lower_bound(x.begin(), x.end(), at) - x.begin(), 1),
+        static_cast<std::ptrdiff_t>(x.size()) - 1));
+    return y[i - 1] + (y[i] - y[i - 1]) * (at - x[i - 1]) / (x[i] - x[i - 1]);
+  }
+  double t0_, nearTau_, start_, interval_, firstTau_, rate_;
+  bool ground_;
+  std::vector<double> taus_, grounds_;
+};
+
+}  // namespace mlook_test

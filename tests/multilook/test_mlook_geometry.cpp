@@ -1,0 +1,191 @@
+// Features of generated scenes must appear where the generator's geometry
+// puts them, in slant and in ground range, and the output header must
+// describe the image it comes with.
+#include <algorithm>
+#include <cmath>
+
+#include "mlook_fixture.h"
+
+namespace mlook_test {
+namespace {
+
+constexpr const char* kChecker = "--size small --pattern checkerboard --band-limit --seed 7";
+constexpr const char* kPoints = "--size small --pattern points --band-limit --seed 8";
+constexpr int kEdgeLines = 40;
+
+double Db(double x) {
+  return 10.0 * std::log10(x);
+}
+
+// Where a profile of powers crosses the power of the mean amplitude of its
+// levels on either side of the expected step at e (inner..outer samples
+// away): the middle of a band-limited step in amplitude.  NaN when it does
+// not cross within `inner` of e.
+double Crossing(const std::vector<double>& profile, double e, int inner, int outer) {
+  const int c = static_cast<int>(std::lround(e));
+  double left = 0.0, right = 0.0;
+  for (int i = inner; i <= outer; ++i) {
+    left += profile[static_cast<size_t>(c - i)];
+    right += profile[static_cast<size_t>(c + i)];
+  }
+  const double amplitude = 0.5 * (std::sqrt(left) + std::sqrt(right));
+  const double level = amplitude * amplitude / (outer - inner + 1);
+  double best = NAN;
+  for (int i = c - inner; i < c + inner; ++i) {
+    const double a = profile[static_cast<size_t>(i)] - level;
+    const double b = profile[static_cast<size_t>(i) + 1] - level;
+    if (a * b > 0.0 || a == b) continue;
+    const double x = i + a / (a - b);
+    if (std::isnan(best) || std::fabs(x - e) < std::fabs(best - e)) best = x;
+  }
+  return best;
+}
+
+class MultilookGeometry : public MultilookTest {
+ protected:
+  // The checkerboard's cell edges in range (per row of cells) and azimuth
+  // (per column of cells) are within one pixel of where the truth puts
+  // them, in every sub-swath, with the pattern's contrast.
+  void CheckCheckerboard(bool ground) {
+    const Imported& p = product(kChecker);
+    const Output o = multilook(p, ground ? "C_gr" : "C_pwr", ground);
+    ASSERT_EQ(o.code, 0);
+    const auto traj = trajectory(p);
+    const Grid grid(o, p, ground ? traj.get() : nullptr);
+    const Image& im = o.image;
+    const double azCell = p.number("Pattern", "AzCell");
+    const double rgCell = p.number("Pattern", "RgCell");
+    const double contrast = Db(p.number("Pattern", "High") / p.number("Pattern", "Low"));
+    const double span = p.number("Scene", "SensingStop") - p.number("Scene", "SensingStart");
+    const double width = p.swath(4, "FarRangeTime") - p.swath(0, "NearRangeTime");
+    int rangeEdges[kMlookSwaths] = {}, azimuthEdges = 0;
+    // Range edges, on the middle lines of each row of cells.
+    for (int a = 0; a * azCell < span; ++a) {
+      const int l0 = std::max(kEdgeLines, static_cast<int>(grid.line((a + 0.3) * azCell)));
+      const int l1 =
+          std::min(im.lines - kEdgeLines, static_cast<int>(grid.line((a + 0.7) * azCell)));
+      if (l1 - l0 < 10) continue;
+      std::vector<double> profile(static_cast<size_t>(im.samples), 0.0);
+      for (int l = l0; l < l1; ++l)
+        for (int k = 0; k < im.samples; ++k) profile[static_cast<size_t>(k)] += im.power(l, k);
+      for (int m = 1; m * rgCell < width; ++m) {
+        const double e = grid.column(m * rgCell);
+        if (e < 13 || e > im.samples - 14) continue;
+        const double x = Crossing(profile, e, 3, 10);
+        EXPECT_LE(std::fabs(x - e), 1.0) << "row " << a << " range edge " << m;
+        const double tau = p.swath(0, "NearRangeTime") + m * rgCell;
+        int swath = 0;
+        while (swath < 4 && tau > p.swath(swath + 1, "NearRangeTime")) ++swath;
+        ++rangeEdges[swath];
+      }
+    }
+    for (int k = 0; k < kMlookSwaths; ++k) EXPECT_GT(rangeEdges[k], 0) << "sub-swath " << k + 1;
+    // Azimuth edges, on the middle columns of each column of cells.
+    for (int r = 0; r * rgCell < width; ++r) {
+      const double mid = (grid.column((r + 0.3) * rgCell) + grid.column((r + 0.7) * rgCell)) / 2.0;
+      const double half = (grid.column((r + 0.7) * rgCell) - grid.column((r + 0.3) * rgCell)) / 2.0;
+      const int k0 = std::max(0, static_cast<int>(std::ceil(mid - half)));
+      const int k1 = std::min(im.samples, static_cast<int>(std::floor(mid + half)));
+      if (k1 - k0 < 3) continue;
+      std::vector<double> profile(static_cast<size_t>(im.lines), 0.0);
+      for (int l = 0; l < im.lines; ++l)
+        for (int k = k0; k < k1; ++k) profile[static_cast<size_t>(l)] += im.power(l, k);
+      for (int n = 1; n * azCell < span; ++n) {
+        const double e = grid.line(n * azCell);
+        if (e < kEdgeLines + 29 || e > im.lines - kEdgeLines - 29) continue;
+        const double x = Crossing(profile, e, 5, 23);
+        EXPECT_LE(std::fabs(x - e), 1.0) << "column " << r << " azimuth edge " << n;
+        ++azimuthEdges;
+      }
+    }
+    EXPECT_GT(azimuthEdges, 10);
+    // Contrast per sub-swath: mean power of the pixels of bright and of dark
+    // cells, away from cell edges and the partly covered first and last
+    // lines.
+    double bright[kMlookSwaths] = {}, dark[kMlookSwaths] = {};
+    int brightCount[kMlookSwaths] = {}, darkCount[kMlookSwaths] = {};
+    for (int l = kEdgeLines; l < im.lines - kEdgeLines; ++l) {
+      const double daz = grid.time(l);
+      const double a = daz / azCell;
+      if (a - std::floor(a) < 0.05 || a - std::floor(a) > 0.95) continue;
+      for (int k = 0; k < im.samples; ++k) {
+        const double drg = grid.rangeTime(k);
+        const double r = drg / rgCell;
+        if (drg < 0.0 || drg > width || r - std::floor(r) < 0.1 || r - std::floor(r) > 0.9)
+          continue;
+        int swath = 0;
+        while (swath < 4 && drg > p.swath(swath + 1, "NearRangeTime") - p.swath(0, "NearRangeTime"))
+          ++swath;
+        const bool high =
+            (static_cast<long>(std::floor(a)) + static_cast<long>(std::floor(r))) % 2 == 0;
+        (high ? bright : dark)[swath] += im.power(l, k);
+        ++(high ? brightCount : darkCount)[swath];
+      }
+    }
+    for (int k = 0; k < kMlookSwaths; ++k) {
+      ASSERT_GT(brightCount[k], 100) << "sub-swath " << k + 1;
+      ASSERT_GT(darkCount[k], 100) << "sub-swath " << k + 1;
+      EXPECT_NEAR(Db(bright[k] / brightCount[k] / (dark[k] / darkCount[k])), contrast, 0.5)
+          << "sub-swath " << k + 1;
+    }
+  }
+
+  // Every point target away from the image borders has its centre of power
+  // within one pixel of its true position.
+  void CheckPoints(bool ground) {
+    const Imported& p = product(kPoints);
+    const Output o = multilook(p, ground ? "P_gr" : "P_pwr", ground);
+    ASSERT_EQ(o.code, 0);
+    const auto traj = trajectory(p);
+    const Grid grid(o, p, ground ? traj.get() : nullptr);
+    const Image& im = o.image;
+    std::vector<double> all;
+    for (size_t i = 0; i < im.v.size(); i += 7)
+      all.push_back(static_cast<double>(im.v[i]) * im.v[i]);
+    std::nth_element(all.begin(), all.begin() + all.size() / 2, all.end());
+    const double background = all[all.size() / 2];
+    const int targets = static_cast<int>(p.number("Pattern", "Targets"));
+    int checked = 0;
+    for (int i = 0; i < targets; ++i) {
+      double daz = 0, drg = 0;
+      ASSERT_EQ(std::sscanf(text(p.run, "Pattern", "Target" + std::to_string(i)).c_str(), "%lf %lf",
+                            &daz, &drg),
+                2);
+      const double el = grid.line(daz), ek = grid.column(drg);
+      if (el < kEdgeLines || el > im.lines - kEdgeLines || ek < 4 || ek > im.samples - 5) continue;
+      double sum = 0.0, sl = 0.0, sk = 0.0, peak = 0.0;
+      for (int l = static_cast<int>(el) - 4; l <= static_cast<int>(el) + 5; ++l)
+        for (int k = static_cast<int>(ek) - 3; k <= static_cast<int>(ek) + 4; ++k) {
+          const double w = std::max(0.0, im.power(l, k) - background);
+          peak = std::max(peak, im.power(l, k));
+          sum += w;
+          sl += w * l;
+          sk += w * k;
+        }
+      ASSERT_GT(peak, 4.0 * background) << "target " << i;
+      EXPECT_LE(std::fabs(sl / sum - el), 1.0) << "target " << i << " line";
+      EXPECT_LE(std::fabs(sk / sum - ek), 1.0) << "target " << i << " column";
+      ++checked;
+    }
+    EXPECT_GE(checked, targets / 2);
+  }
+};
+
+TEST_F(MultilookGeometry, CheckerboardInSlantRange) {
+  CheckCheckerboard(false);
+}
+
+TEST_F(MultilookGeometry, CheckerboardInGroundRange) {
+  CheckCheckerboard(true);
+}
+
+TEST_F(MultilookGeometry, PointTargetsInSlantRange) {
+  CheckPoints(false);
+}
+
+TEST_F(MultilookGeometry, PointTargetsInGroundRange) {
+  CheckPoints(true);
+}
+
+}  // namespace
+}  // namespace mlook_test
