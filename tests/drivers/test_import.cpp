@@ -22,6 +22,7 @@
 #include <vector>
 
 #include "installation.h"
+#include "sml_fields.h"
 #include "synth_run.h"
 
 using synth_test::SynthRun;
@@ -42,55 +43,23 @@ constexpr double kHalfSpeedOfLight = 149896229.0;
 constexpr size_t kLinePrefix = 17;
 // Size of a complex float sample in the rasters.
 constexpr size_t kRasterSample = 8;
-constexpr const char* kPython = "/usr/bin/python3";
 // The product states its first slant-range time as a 32-bit float of
 // nanoseconds: half a nanosecond of range delay is 0.075 m.
 constexpr double kSlantRangeTolerance = 0.1;
 
-// The fields of a ".sml" header that the tests read: "name=value" per field
-// (vector elements joined by '|'), "OtherInfo.KEY=value" per OtherInfo row.
-// The first element of a name wins, as for the suite's own field paths.
-constexpr const char* kSmlReader = R"(
-import sys, xml.etree.ElementTree as E
-def name(e): return e.tag.split('}')[-1]
-want = set(sys.argv[2].split(','))
-seen = set()
-for e in E.parse(sys.argv[1]).getroot().iter():
-    n = name(e)
-    if n == 'OtherInfo':
-        for row in e.iter():
-            if name(row) == 'MatrixRow':
-                cells = [c.text or '' for c in row if name(c) == 'StringValue']
-                print('OtherInfo.%s=%s' % (cells[0], cells[1]))
-    elif n in want and n not in seen:
-        seen.add(n)
-        values = [v.text or '' for v in e.iter() if name(v).endswith('Value')]
-        print('%s=%s' % (n, '|'.join(values) if values else (e.text or '').strip()))
-)";
+// The fields of a ".sml" header that the tests read.
 constexpr const char* kSmlFields =
     "NrOfLinesPerImage,NrOfPixelsPerLine,AzimuthStartTime,AzimuthStopTime,SlantRange,"
     "PixelSpacingRg,PixelSpacingAz,Lines_per_burst,Bursts,Echoes_per_burst,Rank,PRFExtracted,"
     "nStateVectors,CellType,DataUnits,BytesOrder,RowPrefix,LatNorthing,LonEasting";
 
-using Fields = std::map<std::string, std::string>;
+using Fields = vlr_test::SmlFields;
+using vlr_test::Field;
 
 Fields ReadSml(const std::string& sml) {
-  const vlr_test::RunResult r =
-      vlr_test::RunProgram({kPython, "-c", kSmlReader, sml, kSmlFields}, {}, true);
-  EXPECT_EQ(r.status, 0) << sml << ": " << r.err;
-  Fields fields;
-  std::istringstream lines(r.out);
-  for (std::string line; std::getline(lines, line);) {
-    const size_t eq = line.find('=');
-    if (eq != std::string::npos) fields[line.substr(0, eq)] = line.substr(eq + 1);
-  }
-  return fields;
+  return vlr_test::ReadSml(sml, kSmlFields);
 }
 
-std::string Field(const Fields& f, const std::string& name) {
-  const auto it = f.find(name);
-  return it == f.end() ? std::string() : it->second;
-}
 double Number(const Fields& f, const std::string& name, size_t element = 0) {
   std::string text = Field(f, name);
   for (size_t i = 0; i < element; ++i)

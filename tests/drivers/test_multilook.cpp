@@ -19,6 +19,7 @@
 #include <vector>
 
 #include "installation.h"
+#include "sml_fields.h"
 #include "synth_geometry.h"
 #include "synth_run.h"
 
@@ -41,50 +42,19 @@ constexpr double kHalfSpeedOfLight = 149896229.0;
 // "GrSamplingStep" of the installation's parameter file, metres.
 constexpr double kGroundStep = 75.0;
 constexpr size_t kFloatBytes = 4;
-constexpr const char* kPython = "/usr/bin/python3";
 constexpr const char* kGdalInfo = "gdalinfo";
 
-// The first element of each wanted name in a ".sml" header, "name=value"
-// (vector elements joined by '|'), and "OtherInfo.KEY=value" per OtherInfo
-// row.  A file that is not well-formed XML ends the script with an error.
-constexpr const char* kSmlReader = R"(
-import sys, xml.etree.ElementTree as E
-def name(e): return e.tag.split('}')[-1]
-want = set(sys.argv[2].split(','))
-seen = set()
-for e in E.parse(sys.argv[1]).getroot().iter():
-    n = name(e)
-    if n == 'OtherInfo':
-        for row in e.iter():
-            if name(row) == 'MatrixRow':
-                cells = [c.text or '' for c in row if name(c) == 'StringValue']
-                print('OtherInfo.%s=%s' % (cells[0], cells[1]))
-    elif n in want and n not in seen:
-        seen.add(n)
-        values = [v.text or '' for v in e.iter() if name(v).endswith('Value')]
-        print('%s=%s' % (n, '|'.join(values) if values else (e.text or '').strip()))
-)";
+// The fields of a ".sml" header that the tests read.
 constexpr const char* kSmlFields =
     "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection";
 
-using Fields = std::map<std::string, std::string>;
+using Fields = vlr_test::SmlFields;
+using vlr_test::Field;
 
 Fields ReadSml(const std::string& sml) {
-  const vlr_test::RunResult r =
-      vlr_test::RunProgram({kPython, "-c", kSmlReader, sml, kSmlFields}, {}, true);
-  EXPECT_EQ(r.status, 0) << sml << ": " << r.err;
-  Fields fields;
-  std::istringstream lines(r.out);
-  for (std::string line; std::getline(lines, line);) {
-    const size_t eq = line.find('=');
-    if (eq != std::string::npos) fields[line.substr(0, eq)] = line.substr(eq + 1);
-  }
-  return fields;
+  return vlr_test::ReadSml(sml, kSmlFields);
 }
-std::string Field(const Fields& f, const std::string& name) {
-  const auto it = f.find(name);
-  return it == f.end() ? std::string() : it->second;
-}
+
 long Integer(const Fields& f, const std::string& name) {
   return std::atol(Field(f, name).c_str());
 }
