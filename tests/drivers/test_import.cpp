@@ -21,8 +21,8 @@
 #include <string>
 #include <vector>
 
+#include "host_run.h"
 #include "installation.h"
-#include "sml_fields.h"
 #include "synth_run.h"
 
 using synth_test::SynthRun;
@@ -141,13 +141,7 @@ void WriteWithUnknownPolarisation(const std::string& product, const std::string&
   WriteFile(path, bytes);
 }
 
-// What one run of the tool left for the host.
-struct Outcome {
-  int status = -1;
-  std::string log;    // what the run added to Process.log
-  std::string error;  // the error file; empty when the run wrote none
-  bool workingFileLeft = false;
-};
+using vlr_test::Outcome;
 
 class Import : public ::testing::Test {
  protected:
@@ -220,17 +214,7 @@ class Import : public ::testing::Test {
 
   // Runs the import as the host does and collects what it left.
   static Outcome runTool(const std::vector<std::string>& args) {
-    const std::string logPath = inst_->working() + "Process.log";
-    const std::string errorPath = inst_->workingFile() + "_error";
-    std::remove(errorPath.c_str());
-    const size_t logBefore = ReadFile(logPath).size();
-    inst_->hostFiles();
-    Outcome o;
-    o.status = inst_->run(kImport + inst_->writeArguments(args)).status;
-    o.log = ReadFile(logPath).substr(logBefore);
-    o.error = ReadFile(errorPath);
-    o.workingFileLeft = Exists(inst_->workingFile());
-    return o;
+    return vlr_test::RunAsHost(*inst_, kImport, args);
   }
 
   static bool ready_;
@@ -253,22 +237,10 @@ Outcome Import::descendingRun_, Import::ascendingRun_;
 // A successful run: exit 0, the START record with the inputs, SUCCESSFUL and
 // the END record, no error anywhere, the working file deleted.
 void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
-  ASSERT_EQ(o.status, 0) << o.error << o.log;
-  const std::string inputs = "\nINPUT ASA : [ " + args[kProduct] + " ]\nINPUT DORIS : [ " +
-                             args[kDoris] + " ]\nINPUT ASA_XCA : [ " + args[kXca] +
-                             " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] + " ]";
-  const size_t start = o.log.find("\nSTART : Import ESA Products  [");
-  const size_t successful = o.log.find("\n\nSUCCESSFUL\n\n");
-  const size_t end = o.log.find("\nEND : ");
-  EXPECT_NE(start, std::string::npos) << o.log;
-  EXPECT_NE(o.log.find(inputs), std::string::npos) << o.log;
-  EXPECT_NE(successful, std::string::npos) << o.log;
-  EXPECT_NE(end, std::string::npos) << o.log;
-  EXPECT_LT(start, successful);
-  EXPECT_LT(successful, end);
-  EXPECT_EQ(o.log.find("ERROR"), std::string::npos) << o.log;
-  EXPECT_EQ(o.error, "");
-  EXPECT_FALSE(o.workingFileLeft);
+  vlr_test::ExpectSuccessRecords(o, "Import ESA Products",
+                                 "\nINPUT ASA : [ " + args[kProduct] + " ]\nINPUT DORIS : [ " +
+                                     args[kDoris] + " ]\nINPUT ASA_XCA : [ " + args[kXca] +
+                                     " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] + " ]");
 }
 
 // A failed run: its code as exit status (255 for codes beyond a byte), the
@@ -276,15 +248,7 @@ void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
 // and no list file at the output root.
 void ExpectFailure(const Outcome& o, int code, const std::string& extra, const std::string& logText,
                    const std::string& root) {
-  EXPECT_EQ(o.status, code <= 255 ? code : 255);
-  const std::string ec = "[EC : " + std::to_string(code) + "]\n";
-  EXPECT_EQ(o.error.rfind("-1\n", 0), 0u) << o.error;
-  EXPECT_NE(o.error.find(ec + extra), std::string::npos) << o.error;
-  EXPECT_NE(o.log.find("\nSTART : Import ESA Products  ["), std::string::npos) << o.log;
-  EXPECT_NE(o.log.find("[ERROR ID : " + std::to_string(code) + "]"), std::string::npos) << o.log;
-  EXPECT_NE(o.log.find(logText), std::string::npos) << o.log;
-  EXPECT_EQ(o.log.find("SUCCESSFUL"), std::string::npos) << o.log;
-  EXPECT_TRUE(o.workingFileLeft);
+  vlr_test::ExpectFailureRecords(o, code, extra, "Import ESA Products", logText);
   EXPECT_FALSE(Exists(root)) << root;
 }
 

@@ -18,8 +18,8 @@
 #include <string>
 #include <vector>
 
+#include "host_run.h"
 #include "installation.h"
-#include "sml_fields.h"
 #include "synth_geometry.h"
 #include "synth_run.h"
 
@@ -143,13 +143,7 @@ GdalView GdalInfo(const std::string& tif) {
   return v;
 }
 
-// What one run of the tool left for the host.
-struct Outcome {
-  int status = -1;
-  std::string log;    // what the run added to Process.log
-  std::string error;  // the error file; empty when the run wrote none
-  bool workingFileLeft = false;
-};
+using vlr_test::Outcome;
 
 class MultilookCommand : public ::testing::Test {
  protected:
@@ -253,19 +247,7 @@ class MultilookCommand : public ::testing::Test {
   // Runs the command as the host does and collects what it left.
   // `withdrawn`: the host has already deleted "_batch_ok".
   static Outcome runTool(const std::vector<std::string>& args, bool withdrawn = false) {
-    const std::string logPath = inst_->working() + "Process.log";
-    const std::string errorPath = inst_->workingFile() + "_error";
-    std::remove(errorPath.c_str());
-    const size_t logBefore = ReadFile(logPath).size();
-    inst_->hostFiles();
-    if (withdrawn) std::remove((inst_->workingFile() + "_batch_ok").c_str());
-    Outcome o;
-    const vlr_test::RunResult r = inst_->run(kMultilook + inst_->writeArguments(args));
-    o.status = r.status;
-    o.log = ReadFile(logPath).substr(logBefore);
-    o.error = ReadFile(errorPath);
-    o.workingFileLeft = Exists(inst_->workingFile());
-    return o;
+    return vlr_test::RunAsHost(*inst_, kMultilook, args, withdrawn);
   }
 
   static bool ready_;
@@ -294,19 +276,7 @@ std::string StartText(const std::vector<std::string>& args) {
 // A successful run: exit 0, the START record with the inputs, SUCCESSFUL and
 // the END record, no error anywhere, the working file deleted.
 void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
-  ASSERT_EQ(o.status, 0) << o.error << o.log;
-  const size_t start = o.log.find("\nSTART : Multilooking ASA WSS  [");
-  const size_t successful = o.log.find("\n\nSUCCESSFUL\n\n");
-  const size_t end = o.log.find("\nEND : ");
-  EXPECT_NE(start, std::string::npos) << o.log;
-  EXPECT_NE(o.log.find(StartText(args)), std::string::npos) << o.log;
-  EXPECT_NE(successful, std::string::npos) << o.log;
-  EXPECT_NE(end, std::string::npos) << o.log;
-  EXPECT_LT(start, successful);
-  EXPECT_LT(successful, end);
-  EXPECT_EQ(o.log.find("ERROR"), std::string::npos) << o.log;
-  EXPECT_EQ(o.error, "");
-  EXPECT_FALSE(o.workingFileLeft);
+  vlr_test::ExpectSuccessRecords(o, "Multilooking ASA WSS", StartText(args));
 }
 
 // A failed run: its code as exit status (255 for codes beyond a byte), the
@@ -314,15 +284,7 @@ void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
 // no SUCCESSFUL, the working file left for the host.
 void ExpectFailure(const Outcome& o, int code, const std::string& extra,
                    const std::string& logText) {
-  EXPECT_EQ(o.status, code <= 255 ? code : 255) << o.error;
-  EXPECT_EQ(o.error.rfind("-1\n", 0), 0u) << o.error;
-  EXPECT_NE(o.error.find("[EC : " + std::to_string(code) + "]\n" + extra), std::string::npos)
-      << o.error;
-  EXPECT_NE(o.log.find("\nSTART : Multilooking ASA WSS  ["), std::string::npos) << o.log;
-  EXPECT_NE(o.log.find("[ERROR ID : " + std::to_string(code) + "]"), std::string::npos) << o.log;
-  EXPECT_NE(o.log.find(logText), std::string::npos) << o.log;
-  EXPECT_EQ(o.log.find("SUCCESSFUL"), std::string::npos) << o.log;
-  EXPECT_TRUE(o.workingFileLeft);
+  vlr_test::ExpectFailureRecords(o, code, extra, "Multilooking ASA WSS", logText);
 }
 
 // The output of a successful run over `root` ("_gr" or "_pwr" appended) and
