@@ -78,6 +78,7 @@ void parse_values(EnvisatHeaders* h) {
   h->firstLineTime = EnvisatText(s, kSphBlockSize, kSphFirstLineTime);
   h->lastLineTime = EnvisatText(s, kSphBlockSize, kSphLastLineTime);
   h->swath = EnvisatToken(s, kSphBlockSize, kSphSwath);
+  h->pass = EnvisatToken(s, kSphBlockSize, kSphPass);
   h->sampleType = EnvisatToken(s, kSphBlockSize, kSphSampleType);
   h->mds1Polar = EnvisatToken(s, kSphBlockSize, kSphMds1Polar);
   h->mds2Polar = EnvisatToken(s, kSphBlockSize, kSphMds2Polar);

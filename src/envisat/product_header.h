@@ -39,6 +39,7 @@ constexpr EnvisatField kSphDescriptor{16, 28};
 constexpr EnvisatField kSphFirstLineTime{135, kUtcTextWidth};
 constexpr EnvisatField kSphLastLineTime{180, kUtcTextWidth};
 constexpr EnvisatField kSphSwath{688, 3};
+constexpr EnvisatField kSphPass{699, 10};
 constexpr EnvisatField kSphSampleType{724, 8};
 constexpr EnvisatField kSphMds1Polar{772, 3};
 constexpr EnvisatField kSphMds2Polar{795, 3};
@@ -123,6 +124,7 @@ struct EnvisatHeaders {
   std::string sphDescriptor;                // 28 characters as they stand
   std::string firstLineTime, lastLineTime;  // 27-character UTC texts
   std::string swath, sampleType, mds1Polar, mds2Polar, dataType;
+  std::string pass;  // "ASCENDING" or "DESCENDING" as the SPH states it
   double rangeSpacing = 0.0, azimuthSpacing = 0.0, lineTimeInterval = 0.0;
   bool spacingsValid = false;            // all three numbers were read
   const char* spacingProblem = nullptr;  // the first that was not, when not

@@ -360,6 +360,8 @@ int images::processImage(Run& r, int k) {
   SetText(info.ProcessingCenter, h.procCenter);
   SetText(info.ProcessingDate, h.procTime);
   SetText(info.ProcessingSoftware, h.softwareVer);
+  // The pass direction: the composed product's heading is chosen by it.
+  if (h.pass == "ASCENDING" || h.pass == "DESCENDING") SetText(info.OrbitConfiguration, h.pass);
   switch (kind.swath) {
     case SwathNaming::kSubSwath:
       SetText(info.Swath, NVLR_UTILITY_Format("SS%d", k + 1));

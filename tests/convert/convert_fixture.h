@@ -137,25 +137,6 @@ inline double Sec85(const std::string& text) {
   EXPECT_TRUE(parse_sec85(text.c_str(), &t)) << text;
   return t;
 }
-// The values of the first element named `field` in the ".sml" file, read by
-// python's own XML parser: the texts of its "...Value" elements, or its text.
-inline std::vector<std::string> XmlValues(const std::string& sml, const std::string& field) {
-  const std::string script =
-      "import sys, xml.etree.ElementTree as E\n"
-      "root = E.parse(sys.argv[1]).getroot()\n"
-      "node = next(e for e in root.iter() if e.tag.split('}')[-1] == sys.argv[2])\n"
-      "values = [v.text or '' for v in node.iter() if v.tag.endswith('Value')]\n"
-      "print('\\n'.join(values if values else [node.text or '']))\n";
-  const std::string out = sml + ".values";
-  EXPECT_EQ(synth_test::shell("python3 -c \"" + script + "\" '" + sml + "' '" + field + "' > '" +
-                              out + "'"),
-            0);
-  std::vector<std::string> values;
-  std::string text = synth_test::read_text(out), line;
-  for (size_t at = 0, nl; (nl = text.find('\n', at)) != std::string::npos; at = nl + 1)
-    values.push_back(text.substr(at, nl - at));
-  return values;
-}
 inline std::string DateText(double t) {
   char buffer[kSec85TextSize] = {};
   sec852ascii(t, buffer);

@@ -145,15 +145,6 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
   EXPECT_NEAR(std::stod(rows[14].second), value(s, "HeaderCentreLon"), 2e-5);
   EXPECT_NEAR(std::stod(rows[15].second), value(s, "HeaderCentreLat"), 2e-5);
   EXPECT_FALSE(isSet(F(h, "EnvisatFixHeader.PRODUCT")));
-
-  // The same file through python's XML parser.
-  const std::string sml = raster + "_slc.sml";
-  const std::vector<std::string> slant = XmlValues(sml, "SlantRange");
-  ASSERT_EQ(slant.size(), 3u);
-  for (int i = 0; i < 3; ++i) EXPECT_EQ(std::stod(slant[i]), D(h, "SlantRange", i));
-  const std::vector<std::string> other = XmlValues(sml, "OtherInfo");
-  ASSERT_EQ(other.size(), 2 * keys.size());
-  for (size_t i = 0; i < keys.size(); ++i) EXPECT_EQ(other[2 * i], keys[i]);
 }
 
 // Twelve state vectors from the orbit file, and scene centres on both sides

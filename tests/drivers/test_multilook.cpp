@@ -46,7 +46,8 @@ constexpr const char* kGdalInfo = "gdalinfo";
 
 // The fields of a ".sml" header that the tests read.
 constexpr const char* kSmlFields =
-    "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection";
+    "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection,"
+    "SceneHeading,OrbitConfiguration";
 
 using Fields = vlr_test::SmlFields;
 using vlr_test::Field;
@@ -315,6 +316,10 @@ Fields ExpectOutput(const SynthRun& run, const std::string& root, bool ground) {
     EXPECT_NE(envi.find("\npixel size = {75, "), std::string::npos) << envi;
   }
   EXPECT_EQ(Field(f, "CellType"), "FLOAT");
+  // The heading the composed product states follows the pass.
+  const bool descending = Truth(run, "Scene", "Pass") == "DESCENDING";
+  EXPECT_EQ(Field(f, "OrbitConfiguration"), Truth(run, "Scene", "Pass"));
+  EXPECT_EQ(Field(f, "SceneHeading"), descending ? "195" : "344");
 
   const std::string polarisation = Truth(run, "Scene", "Polarisation");
   EXPECT_EQ(

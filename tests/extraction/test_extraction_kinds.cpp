@@ -97,6 +97,7 @@ TEST_P(ImageModeProducts, RastersAndHeadersOfEveryImageMatchTheTruth) {
     EXPECT_STREQ(info.Polarization, kind.polarisations[k - 1]);
     EXPECT_STREQ(info.Polarization, Text(run, s, "Polarisation").c_str());
     EXPECT_STREQ(info.SceneID, Text(run, "Scene", "Product").c_str());
+    EXPECT_STREQ(info.OrbitConfiguration, Text(run, "Scene", "Pass").c_str());
     EXPECT_STREQ(info.SensorName, "ASAR");
     EXPECT_STREQ(info.AcquisitionMode, kind.mode);
     EXPECT_STREQ(info.UnitType, "VOLTcomplex");

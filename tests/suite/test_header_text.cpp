@@ -143,19 +143,6 @@ TEST_F(HeaderText, MalformedTextGivesAClearCode) {
   }
 }
 
-TEST_F(HeaderText, TheInstallationDescriptionFileReads) {
-  CDescriptionHeader h(std::vector<std::string>{"ENVI_HeaderDescriptionType"});
-  const std::string path = inst_.root() + "/des/ENVI_descriptions_default.des";
-  ASSERT_TRUE(readTextHeaderFile(h, path.c_str()));
-  EXPECT_EQ(getInteger(getField(h, "WIDTH_CHAR")), 80);
-  EXPECT_EQ(getString(getField(h, "HEADERBYTES_NAME")), "header offset");
-  CDescriptionField* types = getField(h, "DATATYPE_VALS");
-  ASSERT_EQ(types->columns(), 15);
-  EXPECT_EQ(getInteger(types, 7), 4);
-  EXPECT_EQ(getString(getField(h, "LAYOUT_VALS"), 2), "bip");
-  EXPECT_FALSE(readTextHeaderFile(h, (path + ".absent").c_str()));
-}
-
 TEST_F(HeaderText, UnsetMandatoryFieldsAreReported) {
   writeKeyFile("RasterInfo", "[RasterInfo]\nNrOfLinesPerImage = I\nCellType = S\nRowPrefix = I\n");
   WriteFile(inst_.root() + "/mandatory/vlr_raster_file.mandatory",

@@ -1,13 +1,11 @@
-// The installation's section key files, mandatory-field list and ENVI
-// description file.  The field table below is the contract between the key
-// files and the code that writes and reads product headers: a path without a
-// section name resolves to the first section of the catalogue that has the
-// field, so a field defined in the wrong section, or shadowed by an earlier
-// one, sends a value where no reader looks for it.
+// The installation's section key files and mandatory-field list.  The field table below is the
+// contract between the key files and the code that writes and reads product headers: a path without
+// a section name resolves to the first section of the catalogue that has the field, so a field
+// defined in the wrong section, or shadowed by an earlier one, sends a value where no reader looks
+// for it.
 #include <gtest/gtest.h>
 
 #include <fstream>
-#include <map>
 #include <memory>
 #include <set>
 #include <sstream>
@@ -222,19 +220,7 @@ std::set<std::string> productHeaderKeywords(const std::string& path) {
   return keys;
 }
 
-// Runs a shell command line; its standard output.
-RunResult shell(const std::string& commandLine) {
-  return RunProgram({"/bin/sh", "-c", commandLine}, {}, true);
-}
-
-bool haveGdal() {
-  return shell("command -v gdalinfo && command -v gdallocationinfo").status == 0;
-}
-
-class InstallationData : public SuiteTest {
- protected:
-  std::string desFile() const { return inst_.root() + "/des/ENVI_descriptions_default.des"; }
-};
+using InstallationData = SuiteTest;
 
 TEST_F(InstallationData, EverySectionKeyFileDefinesItsSectionAndItsStructures) {
   std::vector<std::string> sections = kCatalogue;
@@ -329,87 +315,6 @@ TEST_F(InstallationData, MandatoryListNamesRasterFieldsAndIsFoundByTheCheck) {
             std::string::npos)
       << log;
   EXPECT_EQ(log.find("Mandatory Field [CellType]"), std::string::npos) << log;
-}
-
-// The GDAL data type of each suite cell type that ENVI can store; complex
-// integers and bits have no ENVI data type.
-const std::map<std::string, std::string> kGdalTypeOfCell = {
-    {"BYTE", "Byte"},           {"UNSIGNED_BYTE", "Byte"},
-    {"SHORT", "Int16"},         {"UNSIGNED_SHORT", "UInt16"},
-    {"FLOAT", "Float32"},       {"FLOAT_COMPLEX", "CFloat32"},
-    {"DOUBLE", "Float64"},      {"DOUBLE_COMPLEX", "CFloat64"},
-    {"UNSIGNED_INT", "UInt32"}, {"INT", "Int32"}};
-
-class EnviDescription : public InstallationData {
- protected:
-  void SetUp() override {
-    InstallationData::SetUp();
-    ASSERT_EQ(RaisedCode([&] { des_.addSectionFromKeyFile(kEnviSection); }), 0);
-    ASSERT_TRUE(readTextHeaderFile(des_, desFile().c_str()));
-  }
-  std::string text(const char* name) {
-    return getString(getField(des_, (std::string(kEnviSection) + "." + name).c_str()));
-  }
-  CDescriptionField* field(const char* name) {
-    return getField(des_, (std::string(kEnviSection) + "." + name).c_str());
-  }
-  // An ENVI header of a one-band raster of two pixels per line, written with
-  // the description's keywords the way the product writer uses them.
-  std::string enviHeader(int dataType, int byteOrder, int headerBytes) {
-    std::ostringstream h;
-    h << "ENVI\n"
-      << text("NCOLS_NAME") << " = 2\n"
-      << text("NROWS_NAME") << " = 1\n"
-      << text("NBANDS_NAME") << " = 1\n"
-      << text("HEADERBYTES_NAME") << " = " << headerBytes << "\n"
-      << text("FILE_TYPE_NAME") << " = ENVI Standard\n"
-      << text("DATATYPE_NAME") << " = " << dataType << "\n"
-      << text("LAYOUT_NAME") << " = " << getString(field("LAYOUT_VALS"), 0) << "\n"
-      << text("BYTEORDER_NAME") << " = " << byteOrder << "\n";
-    return h.str();
-  }
-  CDescriptionHeader des_;
-};
-
-// GDAL's ENVI driver is an independent reader of ENVI headers: every cell
-// type with an ENVI code must open as the matching data type, and no cell
-// type that GDAL could read may lack one.
-TEST_F(EnviDescription, DataTypesAreThoseGdalReadsForEachCellType) {
-  if (!haveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
-  for (int code = 0; code < CVLR_NBR_CELL_TYPES; ++code) {
-    const std::string cell = NVLR_UTILITY_CellTypeName(code);
-    const int enviType = getInteger(field("DATATYPE_VALS"), code);
-    const auto expected = kGdalTypeOfCell.find(cell);
-    if (expected == kGdalTypeOfCell.end()) {
-      EXPECT_EQ(enviType, -1) << cell;
-      continue;
-    }
-    const std::string raster = work("cell_" + cell);
-    WriteFile(raster, std::string(4 + 2 * 16, '\0'));
-    WriteFile(raster + ".hdr", enviHeader(enviType, 0, 4));
-    const RunResult info = shell("gdalinfo '" + raster + "'");
-    ASSERT_EQ(info.status, 0) << cell << "\n" << info.err;
-    EXPECT_NE(info.out.find("Size is 2, 1"), std::string::npos) << cell << "\n" << info.out;
-    EXPECT_NE(info.out.find("Type=" + expected->second + ","), std::string::npos) << cell << "\n"
-                                                                                  << info.out;
-  }
-}
-
-TEST_F(EnviDescription, ByteOrderValuesFollowLsbfAndMsbf) {
-  if (!haveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
-  const int floatType = getInteger(field("DATATYPE_VALS"), CVLR_FLOAT);
-  // 1.5f and -2.25f, least and most significant byte first.
-  const std::string lsbf("\x00\x00\xc0\x3f\x00\x00\x10\xc0", 8);
-  const std::string msbf("\x3f\xc0\x00\x00\xc0\x10\x00\x00", 8);
-  const std::string orders[] = {lsbf, msbf};
-  for (int index = 0; index < 2; ++index) {
-    const std::string raster = work("order" + std::to_string(index));
-    WriteFile(raster, orders[index]);
-    WriteFile(raster + ".hdr",
-              enviHeader(floatType, getInteger(field("BYTEORDER_VALS"), index), 0));
-    const RunResult value = shell("gdallocationinfo -valonly '" + raster + "' 1 0");
-    EXPECT_EQ(value.out, "-2.25\n") << "BYTEORDER_VALS[" << index << "]\n" << value.err;
-  }
 }
 
 }  // namespace
