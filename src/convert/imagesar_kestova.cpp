@@ -20,32 +20,6 @@
 
 namespace kestova {
 
-const std::vector<std::string>& ProductSections() {
-  static const std::vector<std::string> kSections = {
-      "GCPRasterInfo",
-      "Baseline",
-      "OrbitCorrection",
-      "StateVectorCalc",
-      "StateVectorData",
-      "InitialGeometry",
-      "Processing",
-      "RasterInfo",
-      "PolarimetricCalibrationParameters",
-      "interferometric_processing",
-      "sar_processing",
-      "orbit_information",
-      "Sensor",
-      "ChannelInfo",
-      "DEMCoordinates",
-      "RegistrationCoordinates",
-      "CartographicSystem",
-      "user_defined_section",
-      kFixHeaderSection,
-      "EnvisatDescriptionRecord",
-  };
-  return kSections;
-}
-
 namespace {
 
 const struct {
@@ -202,7 +176,7 @@ int MoveRaster(const std::string& raster, const std::string& target) {
 
 int writehdr_kestova(const char* libraryHeader, const char* suiteHeader, const char* auxiliaryFile,
                      int /*spare*/) {
-  CDescriptionHeader header(ProductSections());
+  CDescriptionHeader header(NVLR_UTILITY_ProductHeaderSections());
   CDescriptionHeader fixed(std::vector<std::string>{kFixHeaderSection});
   VLR_SCOPE("writehdr_kestova", kModule);
   if (!UsableName(libraryHeader) || !UsableName(suiteHeader))

@@ -24,9 +24,6 @@ constexpr int kDopplerCentroidCoefficients = 5;
 constexpr int kDopplerRateCoefficients = 3;
 constexpr int kGeometryCoefficients = 7;
 
-// The product header catalogue, in header order.
-const std::vector<std::string>& ProductSections();
-
 // What the mapping needs besides the container: the swath kind, the image's
 // first and last line times (sec85) and the ground speed used for the
 // azimuth pixel spacing.

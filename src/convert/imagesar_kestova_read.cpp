@@ -381,7 +381,7 @@ int readpar_kestova(CDescriptionHeader& header, const char* rasterName, GeneralS
 }
 
 int readhdr_kestova(const char* suiteHeader, GeneralSAR* gs) {
-  CDescriptionHeader header(ProductSections());
+  CDescriptionHeader header(NVLR_UTILITY_ProductHeaderSections());
   VLR_SCOPE("readhdr_kestova", kModule);
   if (suiteHeader == nullptr || suiteHeader[0] == '\0' ||
       std::strlen(suiteHeader) > kKestovaMaxName) {

@@ -69,10 +69,6 @@ int controlPoints(mlook& processor, std::vector<CVlrGroundControlPoint>* points)
   return 0;
 }
 
-bool copyName(const std::string& name, char (&field)[kMlookNameSize]) {
-  return vlr::CopyDriverName(name, field);
-}
-
 }  // namespace
 
 int fvlr_main_multilook_wss(const char* argumentText) {
@@ -140,8 +136,9 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   const std::string output = root + (groundRange ? "_gr" : "_pwr");
   minput.BurstsToSkip = 0;
   minput.BurstsToProcess = 0;
-  if (!copyName(root, minput.Level1Filename) || !copyName(xcaPath, minput.ASA_XCA_Filename) ||
-      !copyName(output, moutput.OutputFilename)) {
+  if (!vlr::CopyDriverName(root, minput.Level1Filename) ||
+      !vlr::CopyDriverName(xcaPath, minput.ASA_XCA_Filename) ||
+      !vlr::CopyDriverName(output, moutput.OutputFilename)) {
     stepFailed(__LINE__, "mlook readimages()");
   }
   const bool tiff = DriverArgument(args, kTiff) == vlr::kOK;

@@ -7,6 +7,7 @@
 #include "runtime/error_codes.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "suite/description_io.h"
 #include "suite/number_text.h"
 
 namespace {
@@ -28,18 +29,11 @@ const char* shapeWord(CVLR_FieldShape shape) {
   return "WRONG";
 }
 
+// The dump's type word: the element word of the type, spelled out for the
+// structures of a Multiple field.
 const char* typeWord(CVLR_FieldType type) {
-  switch (type) {
-    case CVLR_FieldType::Integer:
-      return "Integer";
-    case CVLR_FieldType::Double:
-      return "Double";
-    case CVLR_FieldType::String:
-      return "String";
-    case CVLR_FieldType::FieldOfSection:
-      return "Field Of Section pointer";
-  }
-  return "WRONG";
+  return type == CVLR_FieldType::FieldOfSection ? "Field Of Section pointer"
+                                                : vlr_header_io::ElementTypeWord(type);
 }
 
 [[noreturn]] void fieldError(const char* label, int line) {

@@ -62,6 +62,30 @@ std::string CDescriptionHeader::dumpText() const {
   return text;
 }
 
+const std::vector<std::string>& NVLR_UTILITY_ProductHeaderSections() {
+  static const std::vector<std::string> kSections = {"GCPRasterInfo",
+                                                     "Baseline",
+                                                     "OrbitCorrection",
+                                                     "StateVectorCalc",
+                                                     "StateVectorData",
+                                                     "InitialGeometry",
+                                                     "Processing",
+                                                     "RasterInfo",
+                                                     "PolarimetricCalibrationParameters",
+                                                     "interferometric_processing",
+                                                     "sar_processing",
+                                                     "orbit_information",
+                                                     "Sensor",
+                                                     "ChannelInfo",
+                                                     "DEMCoordinates",
+                                                     "RegistrationCoordinates",
+                                                     "CartographicSystem",
+                                                     "user_defined_section",
+                                                     "EnvisatFixHeader",
+                                                     "EnvisatDescriptionRecord"};
+  return kSections;
+}
+
 CDescriptionSection* findSection(CDescriptionHeader& header, const char* name) {
   if (name == nullptr) return nullptr;
   for (int i = 0; i < header.sectionCount(); ++i)

@@ -14,6 +14,9 @@ constexpr const char* CVLR_HEADER_INFO = "HEADER_INFO";
 // Namespace of the suite's header schema, declared on every "HEADER_INFO" root.
 constexpr const char* CVLR_HEADER_NAMESPACE = "urn:veloran:schemas:header";
 constexpr const char* CVLR_HEADER_SCHEMA_FILE = "VeloranHeaderSchema_version_1.0.xsd";
+// The sections of a product header, in header order.
+const std::vector<std::string>& NVLR_UTILITY_ProductHeaderSections();
+
 // Most sections one header may hold ("All pools are busy" beyond).
 constexpr int CVLR_DH_MAX_NBR_SECTIONS = 256;
 

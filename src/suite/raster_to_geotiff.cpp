@@ -35,27 +35,6 @@ constexpr const char* kTiffSuffix = ".tif";
 constexpr const char* kDescriptionKey = "DESCRIPTION";
 constexpr const char* kNoDataText = "0";
 
-const char* const kProductSections[] = {"GCPRasterInfo",
-                                        "Baseline",
-                                        "OrbitCorrection",
-                                        "StateVectorCalc",
-                                        "StateVectorData",
-                                        "InitialGeometry",
-                                        "Processing",
-                                        "RasterInfo",
-                                        "PolarimetricCalibrationParameters",
-                                        "interferometric_processing",
-                                        "sar_processing",
-                                        "orbit_information",
-                                        "Sensor",
-                                        "ChannelInfo",
-                                        "DEMCoordinates",
-                                        "RegistrationCoordinates",
-                                        "CartographicSystem",
-                                        "user_defined_section",
-                                        "EnvisatFixHeader",
-                                        "EnvisatDescriptionRecord"};
-
 // Grey levels: 0 for null pixels, 1 (black) to 255 (white) for data, 128 for
 // every pixel of a constant image.
 constexpr int kNullByte = 0;
@@ -440,8 +419,7 @@ void NVLR_UTILITY_RasterToGeoTiff(const char* productName, const char* outputNam
   const std::string tifPath = base + kTiffSuffix;
   saturation = usableSaturation(saturation);
 
-  std::vector<std::string> sections(std::begin(kProductSections), std::end(kProductSections));
-  CDescriptionHeader header(sections);
+  CDescriptionHeader header(NVLR_UTILITY_ProductHeaderSections());
   if (!readHeader(header, product.c_str())) {
     NVLR_UTILITY_RaiseError(vlr::kCodeFileNotFound, kModule, __LINE__, product.c_str());
   }

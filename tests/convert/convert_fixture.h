@@ -96,7 +96,7 @@ class Conversion : public vlr_test::SuiteTest {
   }
   // The suite header written under `name`, read back.
   static std::unique_ptr<CDescriptionHeader> suiteHeader(const std::string& name) {
-    auto h = std::make_unique<CDescriptionHeader>(kestova::ProductSections());
+    auto h = std::make_unique<CDescriptionHeader>(NVLR_UTILITY_ProductHeaderSections());
     EXPECT_TRUE(readHeader(*h, name.c_str()));
     return h;
   }

@@ -16,10 +16,12 @@
 #include <vector>
 
 #include "extraction/images.h"
+#include "metadata_sections/poly_sar.h"
 #include "metadata_sections/sampling_constants.h"
 #include "metadata_sections/sar_pulse.h"
 #include "metadata_sections/spectral_windows.h"
 #include "orbit/earth_constants.h"
+#include "orbit/general_sar_orbit.h"
 #include "orbit/geodetic.h"
 #include "runtime/suite_state.h"
 #include "synth_run.h"
@@ -154,6 +156,25 @@ inline void ExpectSamplingWindowsAndPulse(const SynthRun& run, const std::string
   SARPulse_Obj pulse;
   ASSERT_EQ(pulse.readhdr(hdr.c_str()), 0);
   EXPECT_NEAR(pulse.PulseLength, Value(run, s, "PulseLength"), 1e-12);
+}
+
+// The azimuth FM-rate polynomial of an image against the truth section `s`,
+// and state vectors in its header that span its lines first..last.
+inline void ExpectFmRateAndOrbitSpan(const SynthRun& run, const std::string& s,
+                                     const polySAR& polys, const std::string& hdr, double first,
+                                     double last) {
+  ASSERT_EQ(polys.nfr, 1);
+  EXPECT_NEAR(polys.fr[0].pol[0], Value(run, s, "FmRateC0"), 1e-3);
+  EXPECT_NEAR(polys.fr[0].pol[1], Value(run, s, "FmRateC1"),
+              std::fabs(Value(run, s, "FmRateC1")) * 1e-6);
+  EXPECT_NEAR(polys.fr[0].pol[4], Value(run, s, "FmRateC2"),
+              std::fabs(Value(run, s, "FmRateC2")) * 1e-6);
+  EXPECT_NEAR(polys.fr[0].trg0_s, Value(run, s, "FmRateRangeTime"), 1e-12);
+  GeneralSAROrbit orbit;
+  ASSERT_EQ(orbit.readhdr(hdr.c_str()), 0);
+  ASSERT_GE(orbit.n(), 5);
+  EXPECT_LE(orbit.t0(), first);
+  EXPECT_GE(orbit.t0() + (orbit.n() - 1) * orbit.dt(), last);
 }
 
 // One object for the whole program (an inline variable is initialised once).
