@@ -14,6 +14,7 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/run_outputs.h"
 #include "sar_container/general_sar.h"
 #include "suite/description_header.h"
 #include "time/date_text.h"
@@ -169,6 +170,7 @@ int MoveRaster(const std::string& raster, const std::string& target) {
         NVLR_UTILITY_Format("Cannot rename file %s to %s", raster.c_str(), target.c_str()).c_str(),
         code);
   }
+  VlrRunOutputMoved(raster.c_str(), target.c_str());
   return 0;
 }
 

@@ -27,6 +27,7 @@
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 #include "suite/description_header.h"
 
 namespace {
@@ -74,6 +75,7 @@ class TemporaryFiles {
   ~TemporaryFiles() {
     const int saved = errno;
     for (const std::string& n : names_) std::remove(n.c_str());
+    for (const std::string& n : names_) VlrRunOutputRemoved(n.c_str());
     errno = saved;
   }
   TemporaryFiles(const TemporaryFiles&) = delete;
@@ -123,6 +125,7 @@ int WriteTemporaryHeader(const std::string& name, const std::vector<char>& mph,
     errno = 0;
     VLR_FAIL("File not opened!", vlr::kLibOpen);
   }
+  VlrRunOutputBegun(name.c_str());
   const size_t sectionLength = sizeof kSectionLine - 1;
   const bool written = std::fwrite(kSectionLine, 1, sectionLength, out.get()) == sectionLength &&
                        std::fwrite(mph.data(), 1, mph.size(), out.get()) == mph.size() &&

@@ -30,6 +30,13 @@ bool CopyDriverName(const std::string& name, char (&field)[N]) {
   return true;
 }
 
+// Checks that the orbit file the host named can be read; a name that does
+// not open, or names something that cannot be read (a folder), is reported
+// with the name and gives 9 ("File not opened!") or 4 ("File reading
+// failed!").  Without this a missing orbit would give an import without
+// geolocation that still looks successful.
+int CheckOrbitFile(const std::string& path);
+
 // Writes the list file of an import over root: one line "<root>k_slc" per
 // sub-swath, through a temporary file renamed over the target so that the
 // host never reads a partial list.  0, 9 ("File not opened!") or 5.

@@ -82,6 +82,7 @@ int fvlr_main_import_esa(const char* argumentText) {
 
   std::string orbit = DriverArgument(args, kDoris);
   if (orbit == vlr::kNotOK) orbit.clear();
+  if (!orbit.empty()) VLR_CALL(vlr::CheckOrbitFile(orbit));
 
   std::string type;
   VLR_CALL(readProductType(product.c_str(), type));

@@ -98,7 +98,7 @@ int fvlr_main_multilook_wss(const char* argumentText) {
     stepFailed(__LINE__, "findaux()");
   }
   const std::string& orbit = DriverArgument(args, kDoris);
-  if (orbit == vlr::kNotOK ||
+  if (orbit == vlr::kNotOK || vlr::CheckOrbitFile(orbit) != 0 ||
       (!EnvisatTypes::is_dorvor(orbit.c_str()) && !EnvisatTypes::is_dorpor(orbit.c_str()))) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBadArgument, kModule, __LINE__, "DOR_VOR");
   }

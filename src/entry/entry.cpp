@@ -13,6 +13,7 @@
 #include "runtime/error_codes.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 
 namespace vlr {
 
@@ -29,6 +30,7 @@ int run(std::vector<char>& command, const EntryDrivers& drivers) {
   errno = 0;
   init_ckerr_locking();
   init_report(0, "ASAR FOCUSSING", 1);
+  VlrRunOutputsTrack();
 
   const char* argumentText = nullptr;
   int code = 0;
@@ -48,6 +50,7 @@ int run(std::vector<char>& command, const EntryDrivers& drivers) {
   if (code == 0) {
     exit_report();
     exit_ckerr();
+    VlrRunOutputsCommit();
     return 0;
   }
   NVLR_UTILITY_RaiseError(code, kModule, __LINE__, nullptr);

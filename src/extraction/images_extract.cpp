@@ -19,6 +19,7 @@
 #include "runtime/ckerr.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/run_outputs.h"
 #include "time/date_text.h"
 #include "time/mjd_time.h"
 
@@ -145,6 +146,7 @@ int images::copyImage(int k) {
   VLR_CALL(in.open(DataFile::kOpenRead));
   asar::ScopedFd raster(open(rasterNames_[k], O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644));
   if (!raster.valid()) VLR_FAIL("File not opened!", vlr::kLibOpen);
+  VlrRunOutputBegun(rasterNames_[k]);
 
   BufferIO reader(&in);
   reader.num_samples = d.samples;

@@ -14,6 +14,7 @@
 
 #include "runtime/call_scope.h"
 #include "runtime/ckerr.h"
+#include "runtime/run_outputs.h"
 
 namespace {
 
@@ -271,6 +272,7 @@ int tessalxml::write() {
   xmlSetGenericErrorFunc(context, handler);
   errno = saved;
   if (written < 0) VLR_FAIL("File writing failed!", 5);
+  VlrRunOutputBegun(fileName_.c_str());
   return 0;
 }
 

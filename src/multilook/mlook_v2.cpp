@@ -14,6 +14,7 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/run_outputs.h"
 #include "time/mjd_time.h"
 
 namespace {
@@ -251,6 +252,7 @@ int mlook::freeimages() {
       const std::string name = mlook_detail::TempName(output_->OutputFilename, k);
       if (unlink(name.c_str()) != 0 && errno != ENOENT)
         VLR_REPORT("Cannot remove file", ARE_WARNING);
+      VlrRunOutputRemoved(name.c_str());
       errno = 0;
       tempWritten_[k] = false;
     }

@@ -10,6 +10,7 @@
 
 #include "raster/file_messages.h"
 #include "runtime/error_codes.h"
+#include "runtime/run_outputs.h"
 
 namespace {
 
@@ -123,6 +124,7 @@ int DataFile::open(int mode) {
     errno = 0;
     VLR_FAIL(kNotOpened, vlr::kLibOpen);
   }
+  if (mode == kOpenCreate) VlrRunOutputBegun(name_.c_str());
   if (buffer_size_ > 0 && !buffer_.allocate(static_cast<size_t>(buffer_size_))) {
     ::close(fd);
     buffer_size_ = 0;

@@ -6,6 +6,7 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <string>
 
 #include "runtime/environment.h"
@@ -28,6 +29,21 @@ void traceStreamState(FILE* f, int attempt) {
     words += "| A possibly recoverable formatting or conversion error ";
   if (f == nullptr) words += "| A severe I/O error or unknown state";
   NVLR_UTILITY_TracePrint("%s attempt open : %d\n", words.c_str(), attempt);
+}
+
+// Withdrawal at a chosen point, for tests of what a withdrawn run leaves:
+// with VELORAN_TEST_WITHDRAW_AT set to "<phase>@<percent>", the run does what
+// the host does when the working file shows that phase (its message line, or
+// the process label) at that percent or beyond: it deletes "_batch_ok", and
+// the next progress update ends the run as withdrawn.
+void withdrawWhenAsked(const std::string& working, int percent, const std::string& message) {
+  const char* request = std::getenv("VELORAN_TEST_WITHDRAW_AT");
+  const char* at = request != nullptr ? std::strrchr(request, '@') : nullptr;
+  if (at == nullptr) return;
+  const std::string phase(request, at);
+  if (percent < std::atoi(at + 1)) return;
+  if (phase != message && " " + phase != NVLR_UTILITY_ProcessLabel()) return;
+  std::remove((working + "_batch_ok").c_str());
 }
 
 }  // namespace
@@ -66,10 +82,12 @@ int getAndSetPerc(int previous, int current, const char* message) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
   }
   std::rewind(f);
-  std::fprintf(f, "%i\n%s\n", current, message ? message : second.c_str());
+  const std::string shown = message ? message : second;
+  std::fprintf(f, "%i\n%s\n", current, shown.c_str());
   std::fflush(f);
   if (ftruncate(fileno(f), std::ftell(f)) != 0) {
   }
   std::fclose(f);
+  withdrawWhenAsked(working, current, shown);
   return 1;
 }

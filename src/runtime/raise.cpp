@@ -14,6 +14,7 @@
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
+#include "runtime/run_outputs.h"
 #include "runtime/suite_state.h"
 #include "runtime/working_file.h"
 
@@ -132,6 +133,8 @@ std::string NVLR_UTILITY_RecordError(int code, const char* extra1, const char* e
 }
 
 void VlrTerminate(int code) {
+  // A run that ends with a code leaves none of the files it began.
+  if (code != 0) VlrRunOutputsDiscard();
   std::fflush(nullptr);
   std::_Exit(vlr::ExitStatusFor(code));
 }
@@ -148,6 +151,8 @@ void NVLR_UTILITY_RaiseError(int code, const char* file, int line, const char* e
   if (s.raising) VlrTerminate(s.raisingCode);
   s.raising = true;
   s.raisingCode = code;
+  // The partial outputs go before the host is told of the failure.
+  VlrRunOutputsDiscard();
   if (!s.tableReady) VlrTerminate(code);
   const int savedErrno = errno;
   std::string title, text;

@@ -23,6 +23,7 @@
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 #include "suite/description_header.h"
 #include "suite/description_io.h"
 #include "suite/envi_header.h"
@@ -180,6 +181,7 @@ class TemporaryFile {
     const int fd = mkstemp(name.data());
     if (fd < 0) throw WriteFailure{std::string(), std::strerror(errno)};
     mPath = name.data();
+    VlrRunOutputBegun(mPath.c_str());
     fchmod(fd, targetMode());
     mFile = fdopen(fd, "wb");
     if (mFile == nullptr) {
@@ -201,6 +203,7 @@ class TemporaryFile {
     if (!written || !closed) throw WriteFailure{std::string(), "write failure"};
     if (std::rename(mPath.c_str(), mTarget.c_str()) != 0)
       throw WriteFailure{std::string(), std::strerror(errno)};
+    VlrRunOutputMoved(mPath.c_str(), mTarget.c_str());
     mPath.clear();
   }
 
@@ -208,6 +211,7 @@ class TemporaryFile {
     if (mFile != nullptr) std::fclose(mFile);
     mFile = nullptr;
     if (!mPath.empty()) std::remove(mPath.c_str());
+    if (!mPath.empty()) VlrRunOutputRemoved(mPath.c_str());
     mPath.clear();
   }
 

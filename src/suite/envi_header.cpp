@@ -16,6 +16,7 @@
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 #include "suite/cell_types.h"
 #include "suite/description_header.h"
 #include "suite/description_io.h"
@@ -479,6 +480,7 @@ void writeWhole(const std::string& path, const std::string& content) {
     NVLR_UTILITY_TracePrint("Error: cannot write the file %s\n", path.c_str());
     NVLR_UTILITY_RaiseError(vlr::kCodeFileWrite, kModule, __LINE__, path.c_str());
   }
+  VlrRunOutputBegun(path.c_str());
 }
 
 // A virtual raster left from an earlier layout of the product would show it

@@ -23,6 +23,7 @@
 #include "runtime/process_log.h"
 #include "runtime/progress.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 #include "suite/cell_types.h"
 #include "suite/description_header.h"
 #include "suite/map_utility.h"
@@ -259,6 +260,7 @@ class TiffOutput {
     mTemporary = finalPath + ".part";
     const uint64_t bytes = static_cast<uint64_t>(lines) * static_cast<uint64_t>(pixels);
     mTif = XTIFFOpen(mTemporary.c_str(), bytes < kClassicTiffLimit ? "w" : "w8");
+    if (mTif != nullptr) VlrRunOutputBegun(mTemporary.c_str());
     if (mTif == nullptr || !declareNoDataTag()) fail();
     const uint32_t rowsPerStrip =
         std::max<uint32_t>(1, kStripBytes / static_cast<uint32_t>(pixels));
@@ -289,6 +291,7 @@ class TiffOutput {
     XTIFFClose(mTif);
     mTif = nullptr;
     if (!flushed || std::rename(mTemporary.c_str(), mFinal.c_str()) != 0) fail();
+    VlrRunOutputMoved(mTemporary.c_str(), mFinal.c_str());
     mDone = true;
   }
 
@@ -306,6 +309,7 @@ class TiffOutput {
     if (mTif != nullptr) XTIFFClose(mTif);
     mTif = nullptr;
     if (!mDone) unlink(mTemporary.c_str());
+    if (!mDone) VlrRunOutputRemoved(mTemporary.c_str());
   }
 
   // The raise ends a real run without unwinding, so the file goes first.

@@ -16,6 +16,7 @@
 #include "runtime/error_codes.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
+#include "runtime/run_outputs.h"
 #include "suite/number_text.h"
 
 namespace {
@@ -261,6 +262,7 @@ void NVLR_UTILITY_WriteKmlOverlay(const CVlrMapReference& r, const std::string& 
   kml += "</kml>\n";
 
   FILE* f = std::fopen(kmlPath.c_str(), "wb");
+  if (f != nullptr) VlrRunOutputBegun(kmlPath.c_str());
   bool ok = f != nullptr && std::fwrite(kml.data(), 1, kml.size(), f) == kml.size();
   if (f != nullptr) ok = std::fclose(f) == 0 && ok;
   if (!ok) NVLR_UTILITY_RaiseError(vlr::kCodeFileWrite, kModule, __LINE__, kmlPath.c_str());

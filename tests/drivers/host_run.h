@@ -9,7 +9,9 @@
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <map>
+#include <set>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -71,9 +73,10 @@ struct Outcome {
 };
 
 // Runs command word + argument-list file as the host does.  `withdrawn`: the
-// host has already deleted "_batch_ok".
+// host has already deleted "_batch_ok"; `env`: further variables for the tool.
 inline Outcome RunAsHost(const TempInstallation& inst, const std::string& word,
-                         const std::vector<std::string>& args, bool withdrawn = false) {
+                         const std::vector<std::string>& args, bool withdrawn = false,
+                         const std::map<std::string, std::string>& env = {}) {
   const std::string logPath = inst.working() + "Process.log";
   const std::string errorPath = inst.workingFile() + "_error";
   std::remove(errorPath.c_str());
@@ -81,7 +84,7 @@ inline Outcome RunAsHost(const TempInstallation& inst, const std::string& word,
   inst.hostFiles();
   if (withdrawn) std::remove((inst.workingFile() + "_batch_ok").c_str());
   Outcome o;
-  o.status = inst.run(word + inst.writeArguments(args)).status;
+  o.status = inst.run(word + inst.writeArguments(args), env).status;
   o.log = ReadFile(logPath).substr(logBefore);
   o.error = ReadFile(errorPath);
   o.workingFileLeft = Exists(inst.workingFile());
@@ -123,6 +126,15 @@ inline void ExpectFailureRecords(const Outcome& o, int code, const std::string& 
   EXPECT_NE(o.log.find(logText), std::string::npos) << o.log;
   EXPECT_EQ(o.log.find("SUCCESSFUL"), std::string::npos) << o.log;
   EXPECT_TRUE(o.workingFileLeft);
+}
+
+// The names in a folder (not recursive).
+inline std::set<std::string> FolderNames(const std::string& dir) {
+  std::set<std::string> names;
+  std::error_code ec;
+  for (const auto& e : std::filesystem::directory_iterator(dir, ec))
+    names.insert(e.path().filename().string());
+  return names;
 }
 
 }  // namespace vlr_test
