@@ -242,6 +242,45 @@ TEST_F(DriverChecks, MultilookChecksProductOutputAndOrbit) {
   EXPECT_NE(errorFile().find("[EC : 130560]\nfindaux()\n"), std::string::npos);
 }
 
+// A named orbit file that is missing or cannot be read fails both commands,
+// naming the file, before any output is written.
+TEST_F(DriverChecks, AnOrbitFileThatCannotBeReadFailsTheRun) {
+  const std::string folder = run_.dir + "orbit_folder";
+  ASSERT_EQ(mkdir(folder.c_str(), 0755), 0);
+  const std::string root = run_.dir + "R";
+  std::vector<std::string> importArgs(14, "NotOK");
+  importArgs[0] = run_.product;
+  importArgs[3] = root;
+  const struct {
+    const char* word;
+    const char* orbit;
+    int status;
+    const char* error;
+  } cases[] = {
+      {"main_import_ESA#", "missing", 9, "[EC : 9]\n"},
+      {"main_import_ESA#", "folder", 4, "[EC : 4]\n"},
+      {"main_multilook_WSS#", "missing", 255, "[EC : 456962]\nDOR_VOR\n"},
+      {"main_multilook_WSS#", "folder", 255, "[EC : 456962]\nDOR_VOR\n"},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(std::string(c.word) + " " + c.orbit);
+    const std::string orbit =
+        std::string(c.orbit) == "folder" ? folder : run_.dir + "DOR_VOR_AXVF-P_missing";
+    const bool import = std::string(c.word) == "main_import_ESA#";
+    std::vector<std::string> a = import ? importArgs : multilookArgs();
+    a[import ? 1 : 2] = orbit;
+    const std::string logPath = inst_.working() + "Process.log";
+    const size_t logBefore = ReadFile(logPath).size();
+    EXPECT_EQ(run(c.word, a).status, c.status);
+    EXPECT_NE(errorFile().find(c.error), std::string::npos) << errorFile();
+    const std::string log = ReadFile(logPath).substr(logBefore);
+    EXPECT_NE(log.find("PROCESSING ERROR: Orbit file " + orbit + ": "), std::string::npos) << log;
+    EXPECT_FALSE(vlr_test::Exists(root));
+    EXPECT_FALSE(vlr_test::Exists(root + "1"));
+    EXPECT_FALSE(vlr_test::Exists(root + "1.hdr"));
+  }
+}
+
 TEST_F(DriverChecks, ImportRefusesOtherProductTypes) {
   synth_test::SynthRun ims = synth_test::run_synth("--wrong-type ASA_IMS_1P");
   std::vector<std::string> a(14, "NotOK");

@@ -245,11 +245,16 @@ void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
 
 // A failed run: its code as exit status (255 for codes beyond a byte), the
 // error file naming the code and `extra`, the ERROR record, no SUCCESSFUL,
-// and no list file at the output root.
+// and no list file at the output root.  Over a `fresh` root (no earlier
+// run's outputs) nothing named after the root is left at all.
 void ExpectFailure(const Outcome& o, int code, const std::string& extra, const std::string& logText,
-                   const std::string& root) {
+                   const std::string& root, bool fresh = true) {
   vlr_test::ExpectFailureRecords(o, code, extra, "Import ESA Products", logText);
   EXPECT_FALSE(Exists(root)) << root;
+  if (!fresh) return;
+  const std::filesystem::path r(root);
+  for (const std::string& name : vlr_test::FolderNames(r.parent_path().string()))
+    EXPECT_NE(name.rfind(r.filename().string(), 0), 0u) << name << " left beside " << root;
 }
 
 // The list file and the five sub-swaths of an import over `root` against
@@ -562,7 +567,7 @@ TEST_F(Import, ASecondImportOverTheSameRootReplacesEverything) {
   std::vector<std::string> failing = args;
   failing[kProduct] = scratch_ + "twice_bad.N1";
   WriteWithUnknownPolarisation(second.product, failing[kProduct]);
-  ExpectFailure(runTool(failing), 1, "", "Wrong Polarization Type", root);
+  ExpectFailure(runTool(failing), 1, "", "Wrong Polarization Type", root, false);
 }
 
 TEST_F(Import, AnOutputFolderThatCannotBeWrittenFailsWithoutAList) {

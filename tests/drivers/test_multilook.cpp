@@ -14,6 +14,7 @@
 #include <filesystem>
 #include <functional>
 #include <map>
+#include <set>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -486,6 +487,55 @@ TEST_F(MultilookCommand, TiffOpensInGdalWithControlPointsOnTheScene) {
       << groundRun_.log;
 }
 
+// The host withdraws the run (deletes "_batch_ok") while it shows a given
+// phase: the run ends with 326400 and leaves none of the files it began,
+// while the outputs of an earlier successful run under another root stay as
+// they were.
+TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
+  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
+  const std::string earlierDir = scratch_ + "ground/";
+  auto state = [](const std::string& dir) {
+    std::map<std::string, std::string> files;
+    for (const std::string& name : vlr_test::FolderNames(dir)) files[name] = ReadFile(dir + name);
+    return files;
+  };
+  const std::map<std::string, std::string> earlier = state(earlierDir);
+  ASSERT_GT(earlier.size(), 20u);
+
+  const struct {
+    const char* what;
+    const char* word;
+    const char* phase;  // the working file's message or the process label
+  } cases[] = {
+      {"the import's extraction", "main_import_ESA#", "Extracting data..."},
+      {"the multilook processing", kMultilook, "MULTILOOK PROCESSING"},
+      {"the recomposition", kMultilook, "MULTILOOK SWATHS RECOMPOSITION"},
+      {"the TIFF export", kMultilook, "Tiff generation ..."},
+  };
+  int n = 0;
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    const std::string dir = folder("withdrawn" + std::to_string(++n));
+    const bool import = std::string(c.word) != kMultilook;
+    std::vector<std::string> args = arguments(*vor_, dir + "R");
+    args[kGroundRange] = args[kTiff] = kOK;
+    if (import) {
+      // The import's positions: orbit 1, output root 3.
+      args[1] = args[kDoris];
+      args[2] = kNotOK;
+      args[3] = dir + "R";
+    }
+    useAuxiliaryListOf(*vor_);
+    const Outcome o = vlr_test::RunAsHost(
+        *inst_, c.word, args, false, {{"VELORAN_TEST_WITHDRAW_AT", std::string(c.phase) + "@50"}});
+    vlr_test::ExpectFailureRecords(o, 326400, inst_->workingFile() + "\n",
+                                   import ? "Import ESA Products" : "Multilooking ASA WSS",
+                                   "[ERROR ID : 326400]");
+    EXPECT_EQ(vlr_test::FolderNames(dir), std::set<std::string>());
+  }
+  EXPECT_TRUE(state(earlierDir) == earlier) << "an earlier run's outputs changed";
+}
+
 TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
   const SynthRun& run = *vor_;
   const std::string xca = run.dir + Truth(run, "Scene", "XcaFile");
@@ -500,7 +550,6 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
     std::string logText;  // text in Process.log
     // Prepares the case in its folder (ends with '/') and edits the arguments.
     std::function<void(const std::string&, std::vector<std::string>&)> prepare;
-    bool listFileWritten = false;
     bool withdrawn = false;
   };
   // A copy of the product, under its own name in `dir`, with `edit` applied.
@@ -551,37 +600,31 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
       {"a parameter file without W1", 130560, "mlook conf readpar()\n", "PROCESSING STEP FAILED",
        [](const std::string&, std::vector<std::string>&) {
          parameters({{"W1", ""}});
-       },
-       true},
+       }},
       {"a ground resolution out of range", 130560, "mlook conf checkpar()\n",
        "PROCESSING STEP FAILED",
        [](const std::string&, std::vector<std::string>&) {
          parameters({{"GrResolution", "5000"}});
-       },
-       true},
+       }},
       {"more than 15 range looks", 130560, "mlook run()\n",
        "Number of estimated range looks must be lower than 15",
        [](const std::string&, std::vector<std::string>&) {
          parameters({{"GrResolution", "1000"}});
-       },
-       true},
+       }},
       {"a processor header that cannot be written", 130560, "mlook writepar()\n",
        "PROCESSING STEP FAILED",
        [](const std::string& dir, std::vector<std::string>&) {
          std::filesystem::create_directories(dir + "R_pwr.hdr");
-       },
-       true},
+       }},
       {"a suite header that cannot be written", 261124, "", "R_pwr.sml",
        [](const std::string& dir, std::vector<std::string>&) {
          std::filesystem::create_directories(dir + "R_pwr.sml");
-       },
-       true},
+       }},
       // The host deleted "_batch_ok" before the start: the first progress
       // update, when the extraction starts copying lines, ends the run
       // before any sub-swath is converted.
       {"a run withdrawn by the host", 326400, inst_->workingFile() + "\n",
-       "END :  Extracting data...", [](const std::string&, std::vector<std::string>&) {}, false,
-       true},
+       "END :  Extracting data...", [](const std::string&, std::vector<std::string>&) {}, true},
   };
   int n = 0;
   for (const Case& c : cases) {
@@ -590,18 +633,12 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
     std::vector<std::string> args = arguments(run, dir + "R");
     useAuxiliaryListOf(run);
     c.prepare(dir, args);
+    const std::set<std::string> prepared = vlr_test::FolderNames(dir);
     const Outcome o = runTool(args, c.withdrawn);
     ExpectFailure(o, c.code, c.extra, c.logText);
-    EXPECT_EQ(Exists(dir + "R"), c.listFileWritten);
-    // The multilook never starts without the list.
-    if (!c.listFileWritten) {
-      EXPECT_FALSE(Exists(dir + "R_pwr"));
-    }
-    if (c.withdrawn) {
-      EXPECT_FALSE(Exists(dir + "R1_slc"));
-    }
-    // A processor that ran leaves no temporary sub-swath power file.
-    for (int k = 1; k <= kSubSwaths; ++k) EXPECT_FALSE(Exists(dir + "R_pwrSS" + std::to_string(k)));
+    // Nothing the run began is left: no list file, sub-swath, temporary or
+    // partial output.
+    EXPECT_EQ(vlr_test::FolderNames(dir), prepared);
     parameters({});
   }
 }
