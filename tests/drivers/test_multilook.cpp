@@ -534,6 +534,7 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
     EXPECT_EQ(vlr_test::FolderNames(dir), std::set<std::string>());
   }
   EXPECT_TRUE(state(earlierDir) == earlier) << "an earlier run's outputs changed";
+  EXPECT_TRUE(Exists(vor_->product));
 }
 
 TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
