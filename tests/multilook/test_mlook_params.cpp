@@ -103,6 +103,9 @@ TEST_F(MultilookLookPlan, CountFollowsTheWidestSwathAndCentresSpanEachBand) {
   EXPECT_NE(processLog().find("Number of estimated range looks must be lower than 15, try "
                               "changing Ground Resolution"),
             std::string::npos);
+  conf_.GrResolution = 0;  // no resolution asked for is not one look
+  EXPECT_EQ(looks(narrow, &ml), 1);
+  conf_.GrResolution = 100;
   const double five[] = {4.5, 3.5, 2.5, 1.7, 0.9};  // m = 5: 5 looks
   ASSERT_EQ(looks(five, &ml), 0);
   ASSERT_EQ(ml.looks(), 5);
