@@ -26,10 +26,11 @@ constexpr const char* kGroundRangeGeometry = "GROUND_RANGE";
 constexpr const char* kIncreasingTime = "INCREASE TIME DIRECTION";
 constexpr const char* kSoftware = "Zorvek v1.0";
 constexpr const char* kSlantRangeProjection = "SLANT RANGE";
-// Azimuth looks of every product: the multilook keeps the line spacing of
-// its input and blends the bursts covering a line with weights whose squares
-// add up to one, so its lines are single looks in azimuth like those of a
-// sub-swath.
+// Azimuth looks of every product.  The multilook keeps the line spacing of
+// its input and averages no lines: each output line is the weighted sum of
+// the bursts covering its time, which with the usual weights (W1 + W2 / 2 =
+// 1/2) hand over from one burst to the next.  Its lines are single looks in
+// azimuth, like those of a sub-swath.
 constexpr int kAzimuthLooks = 1;
 // Degrees of longitude per UTM zone and the last zone.
 constexpr double kUtmZoneWidth = 6.0;
