@@ -26,9 +26,12 @@ constexpr const char* kGroundRangeGeometry = "GROUND_RANGE";
 constexpr const char* kIncreasingTime = "INCREASE TIME DIRECTION";
 constexpr const char* kSoftware = "Zorvek v1.0";
 constexpr const char* kSlantRangeProjection = "SLANT RANGE";
-// Looks of a composed product and of a single-look sub-swath.
-constexpr int kComposedAzimuthLooks = 3;
-constexpr int kComposedRangeLooks = 5;
+// Azimuth looks of every product.  The multilook keeps the line spacing of
+// its input and averages no lines: each output line is the weighted sum of
+// the bursts covering its time, which with the usual weights (W1 + W2 / 2 =
+// 1/2) hand over from one burst to the next.  Its lines are single looks in
+// azimuth, like those of a sub-swath.
+constexpr int kAzimuthLooks = 1;
 // Degrees of longitude per UTM zone and the last zone.
 constexpr double kUtmZoneWidth = 6.0;
 constexpr int kLastUtmZone = 60;
@@ -138,6 +141,15 @@ int UtmZone(double longitude) {
   if (lon < -180.0) lon += 360.0;
   const int zone = 1 + static_cast<int>(std::trunc((lon + 180.0) / kUtmZoneWidth));
   return zone > kLastUtmZone ? kLastUtmZone : zone;
+}
+
+// The image geometry: a composed product resampled to ground range is not
+// in slant range, its spacings are ground distances that viewers must not
+// project again; everything else is in slant range.
+const char* Geometry(const GeneralSAR& gs, const ImageTiming& timing) {
+  const bool groundRange =
+      timing.composed && std::strcmp(gs.dataSetInfo.Projection, kSlantRangeProjection) != 0;
+  return groundRange ? kGroundRangeGeometry : kSlantRangeGeometry;
 }
 
 std::string Degrees(double value) {
@@ -289,7 +301,7 @@ std::vector<std::pair<std::string, std::string>> OtherInfo(const GeneralSAR& gs,
       "SCENE DATA",
       NVLR_UTILITY_Format("%s|%s|%s|%s|%s|%s", kSensorName,
                           timing.composed ? "ENVISAT_WSM" : "ENVISAT_WSS", info.Swath,
-                          info.Polarization, info.OrbitConfiguration, kSlantRangeGeometry));
+                          info.Polarization, info.OrbitConfiguration, Geometry(gs, timing)));
   rows.emplace_back("SOFTWARE", kSoftware);
   if (geographic) {
     // Corners numbered clockwise around the footprint from the south-east;
@@ -325,19 +337,16 @@ int WriteMappedFields(GeneralSAR& gs, const ImageTiming& timing, CDescriptionHea
   w.text("StateVectorReference", "ECR");
   VLR_CALL(WriteStateVectors(gs, w));
 
-  // A composed product resampled to ground range is not in slant range: its
-  // spacings are ground distances, which viewers must not project again.
-  const bool groundRange =
-      timing.composed && std::strcmp(info.Projection, kSlantRangeProjection) != 0;
-  w.text("InitialGeometry.Projection", groundRange ? kGroundRangeGeometry : kSlantRangeGeometry);
+  w.text("InitialGeometry.Projection", Geometry(gs, timing));
   w.real("InitialGeometry.SceneHeading", info.SceneHeading);
   w.text("InitialGeometry.TimeDirectionPixel", kIncreasingTime);
   w.text("InitialGeometry.TimeDirectionLines", kIncreasingTime);
   w.text("InitialGeometry.OrbitConfiguration", info.OrbitConfiguration);
   w.real("InitialGeometry.ReferenceHeight", 0.0);
 
-  w.integer("NAzimuthLooks", timing.composed ? kComposedAzimuthLooks : 1);
-  w.integer("NRangeLooks", timing.composed ? kComposedRangeLooks : 1);
+  // A composed product states the range look count its multilook used.
+  w.integer("NAzimuthLooks", kAzimuthLooks);
+  w.integer("NRangeLooks", timing.composed ? info.RangeLooks : 1);
   const double nearTime = roi.FastStartTime;
   const double farTime = roi.FastStartTime + roi.FastTimeLength;
   std::vector<double> slantRange;

@@ -3,6 +3,7 @@
 #include "profile/profile.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
+#include "runtime/file_utility.h"
 
 namespace {
 
@@ -49,9 +50,27 @@ int mlook_conf::writepar(const char*) {
 }
 
 int mlook_conf::checkpar() {
-  if (Outside(Sl2Gr, 0, 1) || Outside(GrSamplingStep, 0, kMaxLength) ||
-      Outside(GrResolution, 0, kMaxLength) || Outside(RgWinLen, 0, kMaxLength)) {
-    return vlr::kLibInconsistent;
+  VLR_SCOPE("mlook_conf::checkpar", kModule);
+  // A ground resolution of 0 m would ask for an infinite bandwidth and
+  // silently give one look: it has to be a positive length.
+  const struct {
+    const char* key;
+    int value;
+    int low;
+    int high;
+  } ranges[] = {{"Sl2Gr", Sl2Gr, 0, 1},
+                {"GrSamplingStep", GrSamplingStep, 0, kMaxLength},
+                {"GrResolution", GrResolution, 1, kMaxLength},
+                {"RgWinLen", RgWinLen, 0, kMaxLength}};
+  for (const auto& r : ranges) {
+    if (r.value == kMlookUndefinedInt) {
+      VLR_FAIL(NVLR_UTILITY_Format("%s is not set", r.key).c_str(), vlr::kLibInconsistent);
+    }
+    if (Outside(r.value, r.low, r.high)) {
+      VLR_FAIL(
+          NVLR_UTILITY_Format("%s = %d is outside %d to %d", r.key, r.value, r.low, r.high).c_str(),
+          vlr::kLibInconsistent);
+    }
   }
   return 0;
 }

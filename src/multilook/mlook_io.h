@@ -20,8 +20,9 @@ class mlook_conf {
   // and "DeleteTempFile" are optional and keep their values when absent).
   int readpar(const char* headername);
   int writepar(const char* headername);  // no effect: 0
-  // 1 when Sl2Gr, GrSamplingStep, GrResolution or RgWinLen is undefined or
-  // out of range (Sl2Gr 0..1, the others 0..1000), else 0.
+  // 1, with a report naming the key, when Sl2Gr, GrSamplingStep,
+  // GrResolution or RgWinLen is undefined or out of range (Sl2Gr 0..1,
+  // GrResolution 1..1000, the others 0..1000), else 0.
   int checkpar();
 
   int Sl2Gr = 1;            // 1: ground-range output, 0: slant range

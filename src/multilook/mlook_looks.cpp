@@ -26,7 +26,8 @@ constexpr double kWholeSampleTolerance = 1e-6;
 
 int mlook::fclook() {
   VLR_SCOPE("fclook", kModule);
-  if (conf_->GrResolution < 0) VLR_FAIL("Ground resolution is negative", vlr::kLibInconsistent);
+  if (conf_->GrResolution <= 0)
+    VLR_FAIL("Ground resolution is not positive", vlr::kLibInconsistent);
   int looksPerSwath[kMlookSwaths] = {};
   looks_ = 0;
   for (int i = 0; i < kMlookSwaths; ++i) {

@@ -1,6 +1,9 @@
-// The ENVI header written beside every suite product, so that viewers can
-// display the raster, and the GDAL virtual raster written beside a product
-// whose lines carry a prefix or suffix, which an ENVI header cannot describe.
+// The ENVI header written beside a suite product, so that viewers can
+// display the raster, and the GDAL virtual raster written instead beside a
+// product whose lines carry a prefix or suffix.  An ENVI header knows only
+// one offset before the first line: over such a product it would make every
+// reader that opens the raster by its own name show a wrong image, so the
+// product gets none and is read through its virtual raster.
 #include "suite/envi_header.h"
 
 #include <strings.h>
@@ -8,6 +11,7 @@
 
 #include <cmath>
 #include <cstdio>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -30,6 +34,8 @@ constexpr const char* kKeywordSection = "ENVI_HeaderDescriptionType";
 constexpr const char* kSoftwareLine = "   File generated with Veloran 4.2.000 }\n";
 constexpr const char* kNoTimesDescription = "ENVI\ndescription = {\n   File Imported into ENVI.}\n";
 constexpr double kPi = 3.14159265358979323846;
+// Largest header offset, line prefix or suffix taken as a byte count.
+constexpr double kMaxOffset = 9.0e15;
 
 // Ellipsoid semi-axes (metres) of the datums written in "projection info".
 constexpr double kWgs84A = 6378137.0;
@@ -382,7 +388,6 @@ Layout rasterLayout(CDescriptionHeader& header) {
     layout.cellType = NVLR_UTILITY_CellTypeCode(cellType.c_str());
   }
   layout.mostSignificantFirst = text(header, "RasterInfo.BytesOrder", order) && order == "MSBF";
-  constexpr double kMaxOffset = 9.0e15;
   layout.complete =
       wholeNumber(header, "RasterInfo.NrOfLinesPerImage", 1, CVLR_RF_MAX_DIMENSION, layout.lines) &&
       wholeNumber(header, "RasterInfo.NrOfPixelsPerLine", 1, CVLR_RF_MAX_DIMENSION,
@@ -491,6 +496,35 @@ void removeStaleVrt(const std::string& path) {
   }
 }
 
+// Likewise an ENVI header of an earlier layout.  Only a file that is an ENVI
+// header goes: another header under that name (the processing libraries'
+// one) is left alone.
+void removeStaleEnviHeader(const std::string& path) {
+  FILE* file = std::fopen(path.c_str(), "rb");
+  if (file == nullptr) return;
+  char start[5] = {};
+  const bool envi = std::fread(start, 1, sizeof start, file) == sizeof start &&
+                    std::memcmp(start, "ENVI\n", sizeof start) == 0;
+  std::fclose(file);
+  if (envi && std::remove(path.c_str()) != 0) {
+    NVLR_UTILITY_TracePrint("Warning: cannot remove the old ENVI header %s\n", path.c_str());
+  }
+}
+
+// Whether each line of the raster is its pixels alone, so that the lines
+// follow one another from the header offset on, the one layout an ENVI
+// header can state.  A prefix or suffix that is not a usable byte count
+// counts as one.
+bool plainLines(CDescriptionHeader& header) {
+  long long prefix = -1, suffix = 0;
+  if (!wholeNumber(header, "RasterInfo.RowPrefix", 0, kMaxOffset, prefix)) return false;
+  if (setField(header, "RasterInfo.RowSuffix") != nullptr &&
+      !wholeNumber(header, "RasterInfo.RowSuffix", 0, kMaxOffset, suffix)) {
+    return false;
+  }
+  return prefix == 0 && suffix == 0;
+}
+
 void writeVrt(CDescriptionHeader& header, const std::string& product) {
   const std::string path = product + ".vrt";
   const Layout layout = rasterLayout(header);
@@ -574,6 +608,13 @@ void NVLR_UTILITY_WriteEnviHeader(CDescriptionHeader& header, const char* header
   if (setField(header, "RasterInfo.RowPrefix") == nullptr) {
     NVLR_UTILITY_TracePrint("NOT FOUND : %s\n", "RowPrefix");
     noEnviHeader(name);
+    return;
+  }
+  if (!plainLines(header)) {
+    NVLR_UTILITY_TracePrint("No ENVI header for %s: its lines carry a prefix or suffix\n",
+                            product.c_str());
+    removeStaleEnviHeader(product + ".hdr");
+    writeVrt(header, product);
     return;
   }
   const std::string keywordFile = NVLR_UTILITY_EnvValue("VELORAN_CEOS_DES_FILES_DIR") +

@@ -162,7 +162,9 @@ TEST_F(Conversion, Tessal2kestovaConvertsAndMovesEverySubSwath) {
     EXPECT_EQ(vlr_test::ReadFile(n + "_slc"),
               vlr_test::ReadFile(run_->dir + "R" + std::to_string(k)));
     EXPECT_TRUE(vlr_test::Exists(n + "_slc.sml"));
-    EXPECT_TRUE(vlr_test::Exists(n + "_slc.hdr"));
+    // Lines with a prefix: a virtual raster, no ENVI header.
+    EXPECT_TRUE(vlr_test::Exists(n + "_slc.vrt"));
+    EXPECT_FALSE(vlr_test::Exists(n + "_slc.hdr"));
     const auto h = suiteHeader(n + "_slc_hdr");
     EXPECT_EQ(OtherInfoValue(*h, "SCENE DATA").substr(0, 26),
               "ENVISAT-1|ENVISAT_WSS|SS" + std::to_string(k) + "|");
@@ -190,6 +192,7 @@ TEST_F(Conversion, ComposedProductCarriesTheAuxiliaryFileHeaders) {
   editHeader(hdr, [](GeneralSAR& gs) {
     std::snprintf(gs.dataSetInfo.Swath, kParStringSize, "ALL");
     gs.attitude.Eq_speed = 0.0;
+    gs.dataSetInfo.RangeLooks = 7;
   });
   // Not "O_hdr": its ENVI header "O.hdr" would replace the library header.
   const std::string name = work("M_hdr");
@@ -198,10 +201,13 @@ TEST_F(Conversion, ComposedProductCarriesTheAuxiliaryFileHeaders) {
   for (const char* temporary : {"_tmp1_hdr", "_tmp2_hdr"})
     EXPECT_FALSE(vlr_test::Exists(name + temporary)) << temporary;
   auto h = suiteHeader(name);
-  EXPECT_EQ(I(*h, "NAzimuthLooks"), 3);
-  EXPECT_EQ(I(*h, "NRangeLooks"), 5);
+  // The range looks the multilook states; its lines keep the input spacing.
+  EXPECT_EQ(I(*h, "NAzimuthLooks"), 1);
+  EXPECT_EQ(I(*h, "NRangeLooks"), 7);
   EXPECT_EQ(OtherInfoValue(*h, "ORIGIN DATA"), "ENVISAT_WS_SR");
-  EXPECT_EQ(OtherInfoValue(*h, "SCENE DATA").substr(0, 26), "ENVISAT-1|ENVISAT_WSM|ALL|");
+  const std::string scene = OtherInfoValue(*h, "SCENE DATA");
+  EXPECT_EQ(scene.substr(0, 26), "ENVISAT-1|ENVISAT_WSM|ALL|");
+  EXPECT_EQ(scene.substr(scene.rfind('|') + 1), "SLANT_RANGE");
   const double speed = value("Scene", "AzimuthSpacing") / value("Scene", "LineTimeInterval");
   EXPECT_NEAR(D(*h, "ProcessingVelocity"), speed, 0.005 * speed);
   // The calibration file's own keywords, as its headers write them.
@@ -215,6 +221,8 @@ TEST_F(Conversion, ComposedProductCarriesTheAuxiliaryFileHeaders) {
   ASSERT_EQ(writehdr_kestova(hdr.c_str(), name.c_str(), vlr_test::kSampleXca.c_str()), 0);
   h = suiteHeader(name);
   EXPECT_EQ(OtherInfoValue(*h, "ORIGIN DATA"), "ENVISAT_WS_GR");
+  EXPECT_EQ(S(*h, "InitialGeometry.Projection"), "GROUND_RANGE");
+  EXPECT_EQ(OtherInfoValue(*h, "SCENE DATA").substr(scene.rfind('|')), "|GROUND_RANGE");
 
   // Auxiliary files that cannot give their headers.
   const std::string xca = vlr_test::ReadFile(vlr_test::kSampleXca);

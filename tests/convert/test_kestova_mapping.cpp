@@ -24,7 +24,7 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
             0);
   EXPECT_FALSE(vlr_test::Exists(name + "_orb.sml"));
   EXPECT_TRUE(vlr_test::Exists(raster + "_slc.sml"));
-  EXPECT_TRUE(vlr_test::Exists(raster + "_slc.hdr"));
+  EXPECT_TRUE(vlr_test::Exists(raster + "_slc.vrt"));
   EXPECT_EQ(ckerr_count(), 0);
   const auto lib = library(raster + ".hdr");
   const auto hp = suiteHeader(name);

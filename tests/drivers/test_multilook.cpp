@@ -9,8 +9,10 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <functional>
 #include <map>
@@ -42,13 +44,17 @@ constexpr int kSubSwaths = 5;
 constexpr double kHalfSpeedOfLight = 149896229.0;
 // "GrSamplingStep" of the installation's parameter file, metres.
 constexpr double kGroundStep = 75.0;
+// "GrResolution" of the installation's parameter file and of the two slant
+// range runs, metres: on the generated scene they ask for 3, 5 and 9 range
+// looks.
+constexpr int kInstalledResolution = 120, kSlantResolution = 150, kCoarseResolution = 275;
 constexpr size_t kFloatBytes = 4;
 constexpr const char* kGdalInfo = "gdalinfo";
 
 // The fields of a ".sml" header that the tests read.
 constexpr const char* kSmlFields =
     "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection,"
-    "SceneHeading,OrbitConfiguration";
+    "SceneHeading,OrbitConfiguration,NRangeLooks,NAzimuthLooks";
 
 using Fields = vlr_test::SmlFields;
 using vlr_test::Field;
@@ -177,11 +183,15 @@ class MultilookCommand : public ::testing::Test {
     groundRun_ = runTool(groundArgs_);
     // Slant range while the parameter file says ground range; "ok" is not
     // "OK" for either switch.
-    parameters({{"Sl2Gr", "1"}});
+    parameters({{"Sl2Gr", "1"}, {"GrResolution", std::to_string(kSlantResolution)}});
     slantArgs_ = arguments(*vor_, folder("slant") + "R");
     slantArgs_[kGroundRange] = "ok";
     slantArgs_[kTiff] = "ok";
     slantRun_ = runTool(slantArgs_);
+    // Slant range again, with a resolution that asks for more looks.
+    parameters({{"GrResolution", std::to_string(kCoarseResolution)}});
+    coarseArgs_ = arguments(*vor_, folder("coarse") + "R");
+    coarseRun_ = runTool(coarseArgs_);
     // The preliminary orbit, ground range and TIFF, installed parameters.
     parameters({});
     porArgs_ = arguments(*por_, folder("por") + "R");
@@ -257,8 +267,8 @@ class MultilookCommand : public ::testing::Test {
   static std::string scratch_;
   static SynthRun* vor_;
   static SynthRun* por_;
-  static std::vector<std::string> groundArgs_, slantArgs_, porArgs_;
-  static Outcome groundRun_, slantRun_, porRun_;
+  static std::vector<std::string> groundArgs_, slantArgs_, coarseArgs_, porArgs_;
+  static Outcome groundRun_, slantRun_, coarseRun_, porRun_;
 };
 
 bool MultilookCommand::ready_ = false;
@@ -267,8 +277,9 @@ std::string MultilookCommand::scratch_;
 SynthRun* MultilookCommand::vor_ = nullptr;
 SynthRun* MultilookCommand::por_ = nullptr;
 std::vector<std::string> MultilookCommand::groundArgs_, MultilookCommand::slantArgs_,
-    MultilookCommand::porArgs_;
-Outcome MultilookCommand::groundRun_, MultilookCommand::slantRun_, MultilookCommand::porRun_;
+    MultilookCommand::coarseArgs_, MultilookCommand::porArgs_;
+Outcome MultilookCommand::groundRun_, MultilookCommand::slantRun_, MultilookCommand::coarseRun_,
+    MultilookCommand::porRun_;
 
 std::string StartText(const std::vector<std::string>& args) {
   return "\nINPUT ASA_RS : [ " + args[kProduct] + " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] +
@@ -322,11 +333,10 @@ Fields ExpectOutput(const SynthRun& run, const std::string& root, bool ground) {
   EXPECT_EQ(Field(f, "OrbitConfiguration"), Truth(run, "Scene", "Pass"));
   EXPECT_EQ(Field(f, "SceneHeading"), descending ? "195" : "344");
 
-  const std::string polarisation = Truth(run, "Scene", "Polarisation");
-  EXPECT_EQ(
-      Field(f, "OtherInfo.SCENE DATA").rfind("ENVISAT-1|ENVISAT_WSM|ALL|" + polarisation + "|", 0),
-      0u)
-      << Field(f, "OtherInfo.SCENE DATA");
+  // The scene text names the geometry of the image, as the projection does.
+  EXPECT_EQ(Field(f, "OtherInfo.SCENE DATA"),
+            "ENVISAT-1|ENVISAT_WSM|ALL|" + Truth(run, "Scene", "Polarisation") + "|" +
+                Truth(run, "Scene", "Pass") + (ground ? "|GROUND_RANGE" : "|SLANT_RANGE"));
   EXPECT_EQ(Field(f, "OtherInfo.ORIGIN DATA"), ground ? "ENVISAT_WS_GR" : "ENVISAT_WS_SR");
   // The fixed ENVISAT header of a composed product comes from the
   // calibration file chosen from the auxiliary list.
@@ -361,6 +371,44 @@ double SwathWidthOnGround(const SynthRun& run) {
     a = b;
   }
   return width;
+}
+
+// The range look count that a ground resolution asks for on the generated
+// scene: per sub-swath the processed band, 0.8 of the pulse bandwidth, over
+// the band that gives the resolution at the centre incidence, times 1.3,
+// rounded up and then down to an odd count (one look when the processed band
+// is the narrower); the largest over the five sub-swaths.
+int RangeLooks(const SynthRun& run, int resolution) {
+  int looks = 1;
+  for (int k = 1; k <= kSubSwaths; ++k) {
+    const double processed = 0.8 * TruthNumber(run, SubSwath(k), "PulseBandwidth");
+    const double incidence = TruthNumber(run, SubSwath(k), "CentreIncidence") * M_PI / 180.0;
+    const double band = kHalfSpeedOfLight / (std::sin(incidence) * resolution);
+    if (processed < band) continue;
+    const double ratio = 1.3 * processed / band;
+    // Far enough from a whole number that the mid-swath incidence the
+    // processor evaluates cannot round it the other way.
+    EXPECT_GT(std::fabs(ratio - std::round(ratio)), 0.01) << "sub-swath " << k;
+    const int m = static_cast<int>(std::ceil(ratio));
+    looks = std::max(looks, m % 2 == 1 ? m : m - 1);
+  }
+  return looks;
+}
+
+// The floats of a raster file in host order.
+std::vector<float> Floats(const std::string& path) {
+  const std::vector<uint8_t> bytes = synth_test::read_file(path);
+  std::vector<float> values(bytes.size() / sizeof(float));
+  if (!values.empty()) std::memcpy(values.data(), bytes.data(), values.size() * sizeof(float));
+  return values;
+}
+
+// What GDAL reads from `source` opened by that name, as a headerless copy;
+// empty when it refuses the file.
+std::vector<uint8_t> GdalCopy(const std::string& source, const std::string& copy) {
+  if (synth_test::shell("gdal_translate -q -of ENVI '" + source + "' '" + copy + "'") != 0)
+    return {};
+  return synth_test::read_file(copy);
 }
 
 // The TIFF copy of a ground-range output: GDAL opens it with the output's
@@ -454,7 +502,8 @@ TEST_F(MultilookCommand, SlantRangeWithoutTiffUnlessExactlyOK) {
 
 TEST_F(MultilookCommand, AntennaFlagInTheParameterFileChangesNothing) {
   ASSERT_EQ(slantRun_.status, 0);
-  parameters({{"Sl2Gr", "1"}, {"RgAnt_flag", "1"}});
+  parameters(
+      {{"Sl2Gr", "1"}, {"RgAnt_flag", "1"}, {"GrResolution", std::to_string(kSlantResolution)}});
   std::vector<std::string> args = slantArgs_;
   args[kRoot] = folder("antenna") + "R";
   useAuxiliaryListOf(*vor_);
@@ -535,6 +584,74 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
   }
   EXPECT_TRUE(state(earlierDir) == earlier) << "an earlier run's outputs changed";
   EXPECT_TRUE(Exists(vor_->product));
+}
+
+// The composed header states the range look count of the resolution asked
+// for, and one azimuth look: one output line per input line interval.
+TEST_F(MultilookCommand, HeaderStatesTheLooksTheProcessorUsed) {
+  const struct {
+    const char* what;
+    const Outcome& outcome;
+    const SynthRun* run;
+    std::string output;
+    int resolution;
+  } cases[] = {
+      {"ground range", groundRun_, vor_, groundArgs_[kRoot] + "_gr", kInstalledResolution},
+      {"slant range", slantRun_, vor_, slantArgs_[kRoot] + "_pwr", kSlantResolution},
+      {"slant range, coarser", coarseRun_, vor_, coarseArgs_[kRoot] + "_pwr", kCoarseResolution},
+  };
+  std::set<int> counts;
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    ASSERT_EQ(c.outcome.status, 0) << c.outcome.error;
+    const Fields f = ReadSml(c.output + ".sml");
+    const int looks = RangeLooks(*c.run, c.resolution);
+    counts.insert(looks);
+    EXPECT_EQ(Integer(f, "NRangeLooks"), looks);
+    const double inputLines = (TruthNumber(*c.run, "Scene", "SensingStop") -
+                               TruthNumber(*c.run, "Scene", "SensingStart")) /
+                                  TruthNumber(*c.run, "Scene", "LineTimeInterval") +
+                              1.0;
+    EXPECT_EQ(Integer(f, "NAzimuthLooks"),
+              std::lround(inputLines / Integer(f, "NrOfLinesPerImage")));
+  }
+  EXPECT_EQ(counts, (std::set<int>{3, 5, 9}));
+}
+
+// Opened by its own name, every output reads in GDAL as what it holds: the
+// power images as the little-endian floats their headers state, the TIFF
+// with 0 exactly at the null pixels of the image and its grey levels in the
+// order of the image's amplitudes.
+TEST_F(MultilookCommand, EveryOutputOpensInGdalByItsOwnName) {
+  if (!HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
+  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
+  ASSERT_EQ(slantRun_.status, 0) << slantRun_.error;
+  const std::string copy = folder("gdal") + "copy";
+  for (const std::string& output : {groundArgs_[kRoot] + "_gr", slantArgs_[kRoot] + "_pwr"}) {
+    SCOPED_TRACE(output);
+    const Fields f = ReadSml(output + ".sml");
+    ASSERT_EQ(Field(f, "CellType"), "FLOAT");
+    EXPECT_TRUE(GdalCopy(output, copy) == synth_test::read_file(output))
+        << "GDAL does not read the image's own floats";
+  }
+
+  const std::string image = groundArgs_[kRoot] + "_gr";
+  const std::vector<float> values = Floats(image);
+  const std::vector<uint8_t> grey = GdalCopy(image + ".tif", copy);
+  ASSERT_EQ(grey.size(), values.size());
+  std::vector<size_t> order;
+  size_t nullMismatches = 0;
+  for (size_t i = 0; i < values.size(); ++i) {
+    if ((grey[i] == 0) != (values[i] == 0.0f)) ++nullMismatches;
+    if (values[i] != 0.0f) order.push_back(i);
+  }
+  EXPECT_EQ(nullMismatches, 0u);
+  ASSERT_GT(order.size(), values.size() / 2);
+  std::sort(order.begin(), order.end(), [&](size_t a, size_t b) { return values[a] < values[b]; });
+  size_t inversions = 0;
+  for (size_t j = 1; j < order.size(); ++j)
+    if (grey[order[j]] < grey[order[j - 1]]) ++inversions;
+  EXPECT_EQ(inversions, 0u);
 }
 
 TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {

@@ -12,6 +12,11 @@ constexpr double kDegToRad = M_PI / 180.0;
 
 class MultilookParameters : public vlr_test::SuiteTest {
  protected:
+  void SetUp() override {
+    SuiteTest::SetUp();
+    init_ckerr_locking();
+    init_report(0, "ASAR FOCUSSING", 1);
+  }
   std::string write(const std::string& name, const std::string& content) {
     const std::string path = work(name);
     vlr_test::WriteFile(path, content);
@@ -37,6 +42,15 @@ TEST_F(MultilookParameters, MissingKeysAndRanges) {
       c.*field = bad;
       EXPECT_EQ(c.checkpar(), 1) << bad;
     }
+  }
+  // No ground resolution is no resolution at all, not one look.
+  for (int bad : {0, -120}) {
+    mlook_conf c;
+    c.GrResolution = bad;
+    EXPECT_EQ(c.checkpar(), 1) << bad;
+    EXPECT_NE(processLog().find("GrResolution = " + std::to_string(bad) + " is outside 1 to 1000"),
+              std::string::npos)
+        << processLog();
   }
   mlook_input input;
   EXPECT_EQ(input.readpar(write("in.hdr", "[mlookInput]\nLevel1Filename = R\n").c_str()), 1);
@@ -89,6 +103,9 @@ TEST_F(MultilookLookPlan, CountFollowsTheWidestSwathAndCentresSpanEachBand) {
   EXPECT_NE(processLog().find("Number of estimated range looks must be lower than 15, try "
                               "changing Ground Resolution"),
             std::string::npos);
+  conf_.GrResolution = 0;  // no resolution asked for is not one look
+  EXPECT_EQ(looks(narrow, &ml), 1);
+  conf_.GrResolution = 100;
   const double five[] = {4.5, 3.5, 2.5, 1.7, 0.9};  // m = 5: 5 looks
   ASSERT_EQ(looks(five, &ml), 0);
   ASSERT_EQ(ml.looks(), 5);
@@ -113,7 +130,7 @@ class MultilookInputs : public MultilookTest {
       const std::string from = p.root + std::to_string(k) + "_slc";
       const std::string to = work(root) + std::to_string(k) + "_slc";
       EXPECT_EQ(synth_test::shell("cp '" + from + "' '" + to + "' && cp '" + from + ".sml' '" + to +
-                                  ".sml' && cp '" + from + ".hdr' '" + to + ".hdr'"),
+                                  ".sml'"),
                 0);
     }
     return work(root);

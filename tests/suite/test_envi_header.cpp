@@ -71,7 +71,7 @@ class EnviHeaderTest : public vlr_test::SuiteTest {
 };
 
 TEST_F(EnviHeaderTest, ExactTextOfASlantRangeProduct) {
-  CDescriptionHeader h = raster(4, 3, "FLOAT_COMPLEX", 17, 0, "MSBF");
+  CDescriptionHeader h = raster(4, 3, "FLOAT_COMPLEX", 0, 0, "MSBF");
   CDescriptionField* info = getField(h, "RasterInfo.OtherInfo");
   resize(info, 1, 2);
   setStringAt(info, 0, 0, "ACQUISITION TIME");
@@ -94,8 +94,11 @@ TEST_F(EnviHeaderTest, ExactTextOfASlantRangeProduct) {
             "Data Ignore Value = 0\ncomplex function = Magnitude\n");
 }
 
-TEST_F(EnviHeaderTest, GdalReadsEverySampleThroughTheVirtualRasterAndTheEnviHeader) {
-  // Complex floats, most significant byte first, 17 bytes of prefix per line.
+TEST_F(EnviHeaderTest, GdalReadsEveryProductRightOrNotAtAll) {
+  // Complex floats, most significant byte first, 17 bytes of prefix per line:
+  // the virtual raster reads them; the product opened by its own name finds
+  // no ENVI header (one of an earlier run is removed) and is refused, not
+  // shown shifted by the prefixes.
   std::string bytes, want;
   for (int line = 0; line < 4; ++line) {
     bytes.append(17, '\xEE');
@@ -106,12 +109,21 @@ TEST_F(EnviHeaderTest, GdalReadsEverySampleThroughTheVirtualRasterAndTheEnviHead
       }
   }
   vlr_test::WriteFile(work("slc"), bytes);
+  vlr_test::WriteFile(work("slc.hdr"),
+                      "ENVI\nsamples = 3\nlines = 4\nbands = 1\n"
+                      "header offset = 0\ndata type = 6\nbyte order = 1\n");
   CDescriptionHeader slc = raster(4, 3, "FLOAT_COMPLEX", 17, 0, "MSBF");
   NVLR_UTILITY_WriteEnviHeader(slc, work("slc_hdr").c_str());
   const std::string info = gdal({"/usr/bin/gdalinfo", work("slc.vrt")});
   EXPECT_NE(info.find("Size is 3, 4"), std::string::npos) << info;
   EXPECT_NE(info.find("Type=CFloat32"), std::string::npos) << info;
   EXPECT_EQ(gdalSamples(work("slc.vrt")), want);
+  EXPECT_FALSE(vlr_test::Exists(work("slc.hdr")));
+  EXPECT_NE(vlr_test::RunProgram({"/usr/bin/gdalinfo", work("slc")}, {}, true).status, 0);
+  // A header of that name that is not an ENVI header is another program's.
+  vlr_test::WriteFile(work("slc.hdr"), "<?xml version=\"1.0\"?>\n");
+  NVLR_UTILITY_WriteEnviHeader(slc, work("slc.sml").c_str());
+  EXPECT_EQ(ReadFile(work("slc.hdr")), "<?xml version=\"1.0\"?>\n");
 
   // Floats behind an 8-byte header, no prefix: the ENVI header alone is right,
   // and a virtual raster of an earlier layout goes.
@@ -214,11 +226,12 @@ TEST_F(EnviHeaderTest, WhenNothingIsWrittenAndWhenWritingFails) {
   NVLR_UTILITY_WriteEnviHeader(noPrefix, work("plain_hdr").c_str());
   EXPECT_FALSE(vlr_test::Exists(work("plain.hdr")));
 
-  // Packed bits have no GDAL type: the ENVI header only, no virtual raster.
+  // Packed bits have no GDAL type: with a prefix neither header describes
+  // them.
   CDescriptionHeader bits = raster(2, 9, "BIT", 4, 0, "LSBF");
   vlr_test::WriteFile(work("bits.vrt"), "stale");
   NVLR_UTILITY_WriteEnviHeader(bits, work("bits_hdr").c_str());
-  EXPECT_TRUE(vlr_test::Exists(work("bits.hdr")));
+  EXPECT_FALSE(vlr_test::Exists(work("bits.hdr")));
   EXPECT_FALSE(vlr_test::Exists(work("bits.vrt")));
 
   EXPECT_EQ(RaisedCode([&] { NVLR_UTILITY_WriteEnviHeader(h, work("no/such_hdr").c_str()); }),
