@@ -147,6 +147,26 @@ int AntennaPattern_Obj::getPatternArray(float* out) {
   return 0;
 }
 
+int AntennaPattern_Obj::setPattern(double startAngle, double deltaAngle, const float* gains,
+                                   int count) {
+  VLR_SCOPE("AntennaPattern_Obj::setPattern", kModule);
+  if (gains == nullptr || count < 1 || count > kMaxPatternSamples || !std::isfinite(startAngle) ||
+      !std::isfinite(deltaAngle))
+    VLR_FAIL("Invalid antenna pattern!", vlr::kLibInconsistent);
+  for (int i = 0; i < count; ++i) {
+    // A zero first gain would read as "not loaded" (getPatternArray).
+    if (!std::isfinite(gains[i]) || !(gains[i] > 0.0f))
+      VLR_FAIL("Invalid antenna pattern gain!", vlr::kLibInconsistent);
+  }
+  PatternSamples = count;
+  VLR_CALL(createBuffers());
+  std::memcpy(pattern_.data(), gains, static_cast<size_t>(count) * sizeof(float));
+  StartAngle = startAngle;
+  DeltaAngle = deltaAngle;
+  describeRaster();
+  return 0;
+}
+
 int AntennaPattern_Obj::getPatternENVI(const char* file, int polarisation, int swath) {
   VLR_SCOPE("AntennaPattern_Obj::getPatternENVI", kModule);
   if (polarisation < 0 || polarisation >= kXcaPolarisations || swath < 0 ||

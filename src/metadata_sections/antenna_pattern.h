@@ -54,6 +54,11 @@ class AntennaPattern_Obj : public GeneralSAR_Base {
   // ranges, or the code of the failing open (9), read (4), seek or close.
   int getPatternENVI(const char* file, int polarisation, int swath);
 
+  // Holds `count` gains from `startAngle` in steps of `deltaAngle` (degrees).
+  // 0, 1 for a count outside 1..kMaxPatternSamples, a gain that is not finite
+  // and positive, or angles that are not finite, 7.
+  int setPattern(double startAngle, double deltaAngle, const float* gains, int count);
+
   // The gains in memory (PatternSamples of them, or none).
   const float* pattern() const { return pattern_.data(); }
   int patternSize() const { return static_cast<int>(pattern_.size()); }

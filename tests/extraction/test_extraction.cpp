@@ -127,11 +127,19 @@ TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
           1.0)
           << c.truth;
     }
-    // The centre lies at the middle sample and half the bursts' cycles after
-    // the first line.
-    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, Value(run, s, "HeaderCentreLat"),
-                       Value(run, s, "HeaderCentreLon")),
+    // The centre at the middle of the image, with the angles seen there and
+    // the heading of the ground track.
+    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, Value(run, s, "CentreLat"),
+                       Value(run, s, "CentreLon")),
               1.0);
+    // The stated incidence is taken from the geocentric direction of the
+    // ground point, the generator's from the ellipsoid normal: they differ
+    // by up to the difference of geocentric and geodetic latitude (0.19°).
+    EXPECT_NEAR(gc.Center.incidence, Value(run, s, "CentreIncidence"), 0.2);
+    EXPECT_NEAR(gc.Center.lookAngle, Value(run, s, "CentreLookAngle"), 1e-3);
+    DataSetInfo_Obj info;
+    ASSERT_EQ(info.readhdr(hdr.c_str()), 0);
+    EXPECT_NEAR(info.SceneHeading, Value(run, s, "CentreHeading"), 0.1);
   }
   synth_test::remove_run(run);
 }
