@@ -92,7 +92,16 @@ int AntennaPattern_Obj::readhdr(const char* file) {
 
 int AntennaPattern_Obj::writehdr(const char* file) {
   VLR_SCOPE("AntennaPattern_Obj::writehdr", kModule);
-  data.set_name(patternFileName(file).c_str());
+  const std::string raster = patternFileName(file);
+  // A pattern read with its header stays in its raster until it is asked
+  // for: a header written under another name takes it along, or the new
+  // header would name a raster that nobody wrote.
+  if (!pattern_.empty() && pattern_[0] == 0.0f && !data.name().empty() && data.name() != raster) {
+    vlr::CkBuffer<float> held;
+    if (!held.allocate(pattern_.size())) VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+    VLR_CALL(getPatternArray(held.data()));
+  }
+  data.set_name(raster.c_str());
   describeRaster();
   VLR_CALL(writeAuxiliaryFile(file, kChannel, kSection));
   if (!pattern_.empty() && pattern_[0] != 0.0f) VLR_CALL(WritePatternArray());

@@ -33,7 +33,9 @@ class AntennaPattern_Obj : public GeneralSAR_Base {
   int readhdr(const char* file) override;
   // Names the pattern raster after `file`, stores the sample count in its
   // description, writes the block and, when a pattern is held in memory,
-  // the pattern raster.  0 or the first failing writer's code.
+  // the pattern raster.  A pattern not yet loaded from the raster of another
+  // name is loaded first and written to the new one.  0, the code of that
+  // load, or the first failing writer's code.
   int writehdr(const char* file) override;
   using GeneralSAR_Base::writehdr;
   // Copies the angles, the pattern and the raster's name and description.
