@@ -17,8 +17,10 @@ constexpr int kPoints = asar::antenna::kPoints;
 // largest plausible two-way gain magnitude (dB).
 constexpr double kMaxSpan = 90.0;
 constexpr double kMaxGainDb = 200.0;
-// Guards the grid against angles that lie a rounding error inside the span.
-constexpr double kGridSlack = 1e-9;
+// Grid steps by which the outermost grid angles may pass the record's span:
+// the record's single-precision angles (a few 1e-6 degrees apart at 20
+// degrees) must not cost the grid a step at either end.
+constexpr double kGridSlack = 1e-3;
 
 // The parabola through (x[0], y[0]), (x[1], y[1]), (x[2], y[2]) at u.
 double Parabola(const double* x, const double* y, double u) {
