@@ -6,9 +6,9 @@
 // metadata header "<raster>.hdr" of every image (data-set information,
 // swath and burst information, sampling constants, spectral windows, raster
 // description, state vectors and corners, region, polynomials, attitude,
-// antenna elevation pattern and pulse) and then copies the image lines into the rasters.  A failing
-// run removes the rasters and headers it had begun, so that no partial output is left looking
-// complete.
+// antenna elevation pattern and pulse) and then copies the image lines into
+// the rasters.  A failing run removes the rasters and headers it had begun,
+// so that no partial output is left looking complete.
 #pragma once
 
 #include <cstdint>
