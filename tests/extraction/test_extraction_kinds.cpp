@@ -185,6 +185,14 @@ TEST_P(ImageModeProducts, RastersAndHeadersOfEveryImageMatchTheTruth) {
                        Value(run, s, "CentreLon")),
               1.0);
     EXPECT_NEAR(info.SceneHeading, Value(run, s, "CentreHeading"), 0.1);
+
+    // The product's one antenna pattern table is that of the first image.
+    if (k == 1) {
+      ExpectElevationPattern(run, s, hdr, "ReferenceAngle" + Text(run, s, "Swath"));
+    } else {
+      AntennaPattern_Obj none;
+      EXPECT_NE(none.readhdr(hdr.c_str()), 0);
+    }
   }
   synth_test::remove_run(run);
 }
