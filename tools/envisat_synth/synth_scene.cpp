@@ -215,7 +215,7 @@ double mean_power(const Pattern& p, const SubSwath& w) {
   return 2.0 * (p.scale * p.scale * taper + 1.0 / 12.0);
 }
 
-// Time and range of the centre an importer states in its header.
+// Time and range of the centre by the approximate rule (see SubSwath).
 double header_centre_time(const Scene& s, const SubSwath& w) {
   if (s.wide_swath && w.lines_per_burst > 0) {
     const double bursts = std::round(static_cast<double>(w.records) / w.lines_per_burst);

@@ -71,9 +71,9 @@ struct SubSwath {
   double first_time = 0, last_time = 0;
   float time_diff = 0;
   Corner first_near, first_far, last_near, last_far, centre;
-  // The centre an importer states in its header: the middle sample
-  // (half the samples, rounded up) and, for bursts, half the bursts' cycles
-  // after the first line (else the middle line).
+  // A centre by the approximate rule: the middle sample (half the samples,
+  // rounded up) and, for bursts, half the bursts' cycles after the first
+  // line (else the middle line).  The image's own middle is `centre`.
   Corner header_centre;
   double chirp_power = 0;
   int dop_delta = 0;

@@ -67,10 +67,11 @@
 //                               north (0..360)
 //   FirstNear/FirstFar/LastNear/LastFar/Centre Lat and Lon
 //   HeaderCentreTime, HeaderCentreRangeTime, HeaderCentreLat/Lon
-//                               the centre an importer states in its header:
-//                               the middle sample (half the samples rounded
-//                               up), and half the bursts' cycles after the
-//                               first line (image products: the middle line)
+//                               a centre by the approximate rule: the middle
+//                               sample (half the samples rounded up), and
+//                               half the bursts' cycles after the first line
+//                               (image products: the middle line); the
+//                               image's own middle is Centre*
 //   MdsOffset, RecordSize
 //   RangeWindowType, RangeWindowCoefficient, AzimuthWindowType,
 //   AzimuthWindowCoefficient, AzimuthLookBandwidth
