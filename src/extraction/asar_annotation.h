@@ -82,10 +82,17 @@ constexpr size_t kChirpPower = 35;             // float
 constexpr size_t kElevationChirpPowerDb = 44;  // float, dB
 }  // namespace chirp
 
-// Antenna elevation patterns.
+// Antenna elevation patterns: per beam the two-way gain at 11 elevation
+// angles spread over the beam's slant ranges.
 namespace antenna {
 constexpr size_t kMinRecordSize = 162;
-}
+constexpr size_t kBeamId = 13;           // "SS1".."SS5", or the image swath
+constexpr size_t kSlantRangeTimes = 16;  // float[11], ns
+constexpr size_t kElevationAngles = 60;  // float[11], degrees
+constexpr size_t kPatternDb = 104;       // float[11], two-way dB
+constexpr int kPoints = 11;
+constexpr size_t kBeamIdWidth = 3;
+}  // namespace antenna
 
 // Measurement data set records: a 17-byte line header (MJD zero-Doppler
 // time, int8 quality flag with -1 for a blank line, uint32 line number),

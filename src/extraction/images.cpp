@@ -11,9 +11,11 @@
 
 #include "envisat/product_header.h"
 #include "extraction/asar_annotation.h"
+#include "extraction/elevation_pattern.h"
 #include "extraction/geolocation_polys.h"
 #include "extraction/product_file.h"
 #include "extraction/product_kind.h"
+#include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/geo_coords.h"
 #include "metadata_sections/gs_roi.h"
@@ -24,6 +26,7 @@
 #include "metadata_sections/spectral_windows.h"
 #include "metadata_sections/swath_info.h"
 #include "orbit/general_sar_orbit.h"
+#include "orbit/scene_heading.h"
 #include "raster/byte_order.h"
 #include "raster/cell_type.h"
 #include "raster/data_file.h"
@@ -90,7 +93,10 @@ int images::run() {
 void images::removeOutputs() {
   for (int k = 0; k < kMaxImages; ++k) {
     if (conf.ExtractData != 0 && rasterNames_[k][0] != '\0') std::remove(rasterNames_[k]);
-    if (headerNames_[k][0] != '\0') std::remove(headerNames_[k]);
+    if (headerNames_[k][0] != '\0') {
+      std::remove(headerNames_[k]);
+      std::remove(AntennaPattern_Obj::patternFileName(headerNames_[k]).c_str());
+    }
   }
 }
 
@@ -324,7 +330,6 @@ int images::processImage(Run& r, int k) {
     }
   }
   if (lineTimes < 1) VLR_FAIL("Image without lines", vlr::kLibInconsistent);
-  const double azimuthEnd = (lineTimes - 1.0) * interval;
 
   // File names.
   const bool numbered = wss || nImages_ > 1;
@@ -340,6 +345,10 @@ int images::processImage(Run& r, int k) {
   if (conf.ExtractData != 0 && stat(raster.c_str(), &st) == 0 && std::remove(raster.c_str()) != 0)
     VLR_REPORT("Cannot remove file", ARE_WARNING);
   if (stat(header.c_str(), &st) == 0 && std::remove(header.c_str()) != 0)
+    VLR_REPORT("Cannot remove file", ARE_WARNING);
+  // The antenna pattern raster of an earlier header of the same name.
+  const std::string patternRaster = AntennaPattern_Obj::patternFileName(header.c_str());
+  if (stat(patternRaster.c_str(), &st) == 0 && std::remove(patternRaster.c_str()) != 0)
     VLR_REPORT("Cannot remove file", ARE_WARNING);
   // A raster or header that is not there yet leaves ENOENT behind.
   errno = 0;
@@ -492,18 +501,13 @@ int images::processImage(Run& r, int k) {
     extent.roi.SlowStartTime = first;
     extent.roi.SlowTimeLength = last - first;
     geoCoords_Obj corners;
+    // The corners, and the centre at the middle of the zero-Doppler span and
+    // of the range span: the image's own middle, whatever blank records or
+    // overlapping bursts the data set holds.
     VLR_CALL(orbit.SVGetGeoCoords(&corners, &extent));
-    // The centre: the middle sample, and for bursts half the bursts' cycles
-    // after the first line.
-    const double centreRange = nearTime + std::ceil(samples / 2.0) * rangeInterval;
-    const double centreTime =
-        wss ? first + std::round(static_cast<double>(records) / linesPerBurst) * r.burstCycle / 2.0
-            : first + azimuthEnd / 2.0;
-    double lat = 0.0, lon = 0.0, incidence = 0.0, look = 0.0;
-    VLR_CALL(orbit.SVGetLatLon(centreTime, centreRange, &lat, &lon));
-    VLR_CALL(orbit.SVGetAngles(centreTime, centreRange, &incidence, &look));
-    corners.Center.set(lat, lon, 0.0, incidence, look);
     VLR_CALL(corners.writehdr(hdr));
+    VLR_CALL(scene_heading(orbit, first + 0.5 * (last - first),
+                           nearTime + 0.5 * (farTime - nearTime), &info.SceneHeading));
   } else if (conf.Verbose != 0) {
     VLR_REPORT("No DOR_VOR file provided. Skipping state vectors informations", ARE_WARNING);
   }
@@ -539,10 +543,38 @@ int images::processImage(Run& r, int k) {
     VLR_CALL(attitude.getDroopGain(input.ASA_INS_Filename, kind.droopMode));
   }
   VLR_CALL(attitude.writehdr(hdr));
+  VLR_CALL(writeElevationPattern(r, k, hdr));
   SARPulse_Obj pulse;
   pulse.PulseLength = m.f32(asar::mpp::kPulseLength);
   pulse.Bandwidth = m.f32(asar::mpp::kRangeBandwidth);
   pulse.PulseSamplingRate = m.f32(asar::mpp::kRangeSamplingRate);
   VLR_CALL(pulse.writehdr(hdr));
+  return 0;
+}
+
+int images::writeElevationPattern(const Run& r, int k, const char* hdr) {
+  VLR_SCOPE("images::writeElevationPattern", kModule);
+  // One record per sub-swath in sub-swath order; of the other products the
+  // table read is that of the first image.
+  const bool wss = r.kind->wideSwath;
+  if (!(wss || k == 0) || k >= r.antenna.count()) return 0;
+  const asar::Record a = r.antenna.record(k);
+  const std::string beam = a.token(asar::antenna::kBeamId, asar::antenna::kBeamIdWidth);
+  std::string problem;
+  AntennaPattern_Obj pattern;
+  if (wss && !beam.empty() && beam != NVLR_UTILITY_Format("SS%d", k + 1)) {
+    problem = "the record is that of beam " + beam;
+  } else {
+    const int rc = ElevationPatternOfRecord(a, &pattern, &problem);
+    if (rc != 0 && problem.empty()) VLR_CALL(rc);
+  }
+  if (!problem.empty()) {
+    VLR_REPORT(NVLR_UTILITY_Format("Image %d: antenna elevation pattern left out: %s", k + 1,
+                                   problem.c_str())
+                   .c_str(),
+               ARE_WARNING);
+    return 0;
+  }
+  VLR_CALL(pattern.writehdr(hdr));
   return 0;
 }

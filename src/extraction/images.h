@@ -5,10 +5,10 @@
 // run() reads the product's headers and annotation data sets, writes the
 // metadata header "<raster>.hdr" of every image (data-set information,
 // swath and burst information, sampling constants, spectral windows, raster
-// description, state vectors and corners, region, polynomials, attitude and
-// pulse) and then copies the image lines into the rasters.  A failing run
-// removes the rasters and headers it had begun, so that no partial output is
-// left looking complete.
+// description, state vectors and corners, region, polynomials, attitude,
+// antenna elevation pattern and pulse) and then copies the image lines into
+// the rasters.  A failing run removes the rasters and headers it had begun,
+// so that no partial output is left looking complete.
 #pragma once
 
 #include <cstdint>
@@ -73,6 +73,10 @@ class images {
   struct Run;
   int runSteps(Run& r);
   int processImage(Run& r, int k);
+  // The antenna elevation pattern of image k into its header `hdr`, when the
+  // product has one for it; a record that cannot make a pattern is warned
+  // about and left out.  0 or the code of the failing write.
+  int writeElevationPattern(const Run& r, int k, const char* hdr);
   int copyImage(int k);
   void removeOutputs();
 

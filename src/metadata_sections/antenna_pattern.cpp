@@ -92,7 +92,16 @@ int AntennaPattern_Obj::readhdr(const char* file) {
 
 int AntennaPattern_Obj::writehdr(const char* file) {
   VLR_SCOPE("AntennaPattern_Obj::writehdr", kModule);
-  data.set_name(patternFileName(file).c_str());
+  const std::string raster = patternFileName(file);
+  // A pattern read with its header stays in its raster until it is asked
+  // for: a header written under another name takes it along, or the new
+  // header would name a raster that nobody wrote.
+  if (!pattern_.empty() && pattern_[0] == 0.0f && !data.name().empty() && data.name() != raster) {
+    vlr::CkBuffer<float> held;
+    if (!held.allocate(pattern_.size())) VLR_FAIL("Memory allocation failed!", vlr::kLibAlloc);
+    VLR_CALL(getPatternArray(held.data()));
+  }
+  data.set_name(raster.c_str());
   describeRaster();
   VLR_CALL(writeAuxiliaryFile(file, kChannel, kSection));
   if (!pattern_.empty() && pattern_[0] != 0.0f) VLR_CALL(WritePatternArray());
@@ -144,6 +153,26 @@ int AntennaPattern_Obj::getPatternArray(float* out) {
     return 0;
   }
   std::memcpy(out, pattern_.data(), bytes);
+  return 0;
+}
+
+int AntennaPattern_Obj::setPattern(double startAngle, double deltaAngle, const float* gains,
+                                   int count) {
+  VLR_SCOPE("AntennaPattern_Obj::setPattern", kModule);
+  if (gains == nullptr || count < 1 || count > kMaxPatternSamples || !std::isfinite(startAngle) ||
+      !std::isfinite(deltaAngle))
+    VLR_FAIL("Invalid antenna pattern!", vlr::kLibInconsistent);
+  for (int i = 0; i < count; ++i) {
+    // A zero first gain would read as "not loaded" (getPatternArray).
+    if (!std::isfinite(gains[i]) || !(gains[i] > 0.0f))
+      VLR_FAIL("Invalid antenna pattern gain!", vlr::kLibInconsistent);
+  }
+  PatternSamples = count;
+  VLR_CALL(createBuffers());
+  std::memcpy(pattern_.data(), gains, static_cast<size_t>(count) * sizeof(float));
+  StartAngle = startAngle;
+  DeltaAngle = deltaAngle;
+  describeRaster();
   return 0;
 }
 

@@ -33,7 +33,9 @@ class AntennaPattern_Obj : public GeneralSAR_Base {
   int readhdr(const char* file) override;
   // Names the pattern raster after `file`, stores the sample count in its
   // description, writes the block and, when a pattern is held in memory,
-  // the pattern raster.  0 or the first failing writer's code.
+  // the pattern raster.  A pattern not yet loaded from the raster of another
+  // name is loaded first and written to the new one.  0, the code of that
+  // load, or the first failing writer's code.
   int writehdr(const char* file) override;
   using GeneralSAR_Base::writehdr;
   // Copies the angles, the pattern and the raster's name and description.
@@ -53,6 +55,11 @@ class AntennaPattern_Obj : public GeneralSAR_Base {
   // swath's reference elevation angle.  0, 1 for an index outside those
   // ranges, or the code of the failing open (9), read (4), seek or close.
   int getPatternENVI(const char* file, int polarisation, int swath);
+
+  // Holds `count` gains from `startAngle` in steps of `deltaAngle` (degrees).
+  // 0, 1 for a count outside 1..kMaxPatternSamples, a gain that is not finite
+  // and positive, or angles that are not finite, 7.
+  int setPattern(double startAngle, double deltaAngle, const float* gains, int count);
 
   // The gains in memory (PatternSamples of them, or none).
   const float* pattern() const { return pattern_.data(); }

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "multilook/mlook.h"
+#include "orbit/scene_heading.h"
 #include "raster/cell_type.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
@@ -18,8 +19,8 @@ namespace {
 constexpr const char* kModule = "mlook_v2";
 constexpr double kHalfSpeedOfLight = 149896229.0;
 constexpr double kCalibrationFactor = 1.0176;
-constexpr double kHeadingDescending = 195.0;
-constexpr double kHeadingAscending = 344.0;
+// "SceneHeading" where no orbit gives one.
+constexpr double kUnsetHeading = -999.0;
 
 void CopyText(char* field, const char* text) {
   std::snprintf(field, kParStringSize, "%s", text);
@@ -54,8 +55,7 @@ int mlook::writepar() {
   CopyText(info.Description, "WideSwath MULTILOOKING IMAGE");
   CopyText(info.ProcessingCenter, DataSetInfo_Obj::kProcessingCentre);
   CopyText(info.ProcessingSoftware, "Quillan v1.1");
-  info.SceneHeading = std::strcmp(info.OrbitConfiguration, "DESCENDING") == 0 ? kHeadingDescending
-                                                                              : kHeadingAscending;
+  info.SceneHeading = kUnsetHeading;  // the orbit's, below
   CopyText(info.Swath, "ALL");
   info.SWST_MIN = -1.0;
   info.SWST_MAX = -1.0;
@@ -104,6 +104,9 @@ int mlook::writepar() {
 
   if (gs->GSexists(GeneralSAR::GS_ORBIT)) {
     VLR_CALL(gs->orbit.SVGetGeoCoords(&gs->geoCoords, &gs->roi));
+    // The heading of the track at the centre of the output.
+    VLR_CALL(scene_heading(gs->orbit, roi.SlowStartTime + 0.5 * roi.SlowTimeLength,
+                           roi.FastStartTime + 0.5 * roi.FastTimeLength, &info.SceneHeading));
     gs->GSenable(GeneralSAR::GS_GEOCOORDS);
   }
   gs->GSenable(GeneralSAR::GS_ATTITUDE);

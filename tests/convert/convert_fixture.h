@@ -72,13 +72,13 @@ class Conversion : public vlr_test::SuiteTest {
   }
   static std::string swath(int k) { return "SubSwath" + std::to_string(k); }
 
-  // Copies raster k and its library header to "<working>name"; returns the
-  // raster's path.
+  // Copies raster k, its library header and the header's antenna pattern
+  // raster to "<working>name"; returns the raster's path.
   std::string copySwath(int k, const std::string& name) const {
     const std::string from = run_->dir + "R" + std::to_string(k);
     const std::string to = work(name);
     EXPECT_EQ(synth_test::shell("cp '" + from + "' '" + to + "' && cp '" + from + ".hdr' '" + to +
-                                ".hdr'"),
+                                ".hdr' && cp '" + from + "_pattern' '" + to + "_pattern'"),
               0);
     return to;
   }

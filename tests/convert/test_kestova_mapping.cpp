@@ -109,8 +109,8 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
 
   // Scene centre and corners.
   const geoCoords_Obj& g = lib->geoCoords;
-  EXPECT_NEAR(D(h, "LatNorthing"), value(s, "HeaderCentreLat"), 2e-5);
-  EXPECT_NEAR(D(h, "LonEasting"), value(s, "HeaderCentreLon"), 2e-5);
+  EXPECT_NEAR(D(h, "LatNorthing"), value(s, "CentreLat"), 2e-5);
+  EXPECT_NEAR(D(h, "LonEasting"), value(s, "CentreLon"), 2e-5);
   EXPECT_EQ(D(h, "IncidenceAngle"), g.Center.incidence);
   EXPECT_EQ(D(h, "RangeLookAngle"), g.Center.lookAngle);
 
@@ -142,8 +142,8 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
     EXPECT_NEAR(std::stod(rows[c.row + 1].second), value(s, std::string(c.truthPoint) + "Lat"),
                 2e-5);
   }
-  EXPECT_NEAR(std::stod(rows[14].second), value(s, "HeaderCentreLon"), 2e-5);
-  EXPECT_NEAR(std::stod(rows[15].second), value(s, "HeaderCentreLat"), 2e-5);
+  EXPECT_NEAR(std::stod(rows[14].second), value(s, "CentreLon"), 2e-5);
+  EXPECT_NEAR(std::stod(rows[15].second), value(s, "CentreLat"), 2e-5);
   EXPECT_FALSE(isSet(F(h, "EnvisatFixHeader.PRODUCT")));
 }
 

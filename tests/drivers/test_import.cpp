@@ -51,7 +51,9 @@ constexpr double kSlantRangeTolerance = 0.1;
 constexpr const char* kSmlFields =
     "NrOfLinesPerImage,NrOfPixelsPerLine,AzimuthStartTime,AzimuthStopTime,SlantRange,"
     "PixelSpacingRg,PixelSpacingAz,Lines_per_burst,Bursts,Echoes_per_burst,Rank,PRFExtracted,"
-    "nStateVectors,CellType,DataUnits,BytesOrder,RowPrefix,LatNorthing,LonEasting";
+    "nStateVectors,CellType,DataUnits,BytesOrder,RowPrefix,LatNorthing,LonEasting,SceneHeading,"
+    "EnvisatTwoWayAntennaElevationPatternTableNbr,EnvisatReferenceElevationAngle,"
+    "EnvisatTwoWayAntennaElevationPatternTable";
 
 using Fields = vlr_test::SmlFields;
 using vlr_test::Field;
@@ -257,6 +259,29 @@ void ExpectFailure(const Outcome& o, int code, const std::string& extra, const s
     EXPECT_NE(name.rfind(r.filename().string(), 0), 0u) << name << " left beside " << root;
 }
 
+// The two-way elevation pattern of sub-swath section `s` in its suite
+// header: gains 10^(dB/20) at 0.05-degree steps about the reference angle,
+// against the parabola in dB that the generator wrote into the product's
+// pattern record, over the sub-swath's own span of look angles.
+void ExpectElevationPattern(const SynthRun& run, const std::string& s, const Fields& f) {
+  const long count = std::lround(Number(f, "EnvisatTwoWayAntennaElevationPatternTableNbr"));
+  ASSERT_GE(count, 3);
+  ASSERT_EQ(count % 2, 1);
+  const double reference = Number(f, "EnvisatReferenceElevationAngle");
+  EXPECT_NEAR(reference, TruthNumber(run, s, "CentreLookAngle"), 0.1);
+  const double slot = TruthNumber(run, s, "XcaSlot");
+  const double centre =
+      TruthNumber(run, "Calibration", "ReferenceAngleSS" + s.substr(s.size() - 1));
+  const std::string table = Field(f, "EnvisatTwoWayAntennaElevationPatternTable");
+  ASSERT_EQ(std::count(table.begin(), table.end(), '|'), count - 1);
+  for (long i = 0; i < count; ++i) {
+    const double offset = reference + (i - (count - 1) / 2) * 0.05 - centre;
+    const double db = -(0.75 + 0.05 * slot) * offset * offset;
+    const double gain = Number(f, "EnvisatTwoWayAntennaElevationPatternTable", i);
+    ASSERT_NEAR(gain, std::pow(10.0, db / 20.0), 1e-6) << "value " << i << " of " << count;
+  }
+}
+
 // The list file and the five sub-swaths of an import over `root` against
 // the generator's truth.  Without an orbit there are no state vectors,
 // corners, centre or azimuth spacing.
@@ -310,9 +335,11 @@ void ExpectSubSwaths(const SynthRun& run, const std::string& root, bool withOrbi
                                                     "|" + Truth(run, "Scene", "Pass") +
                                                     "|SLANT_RANGE");
     EXPECT_EQ(Field(f, "OtherInfo.ORIGIN DATA"), "ENVISAT_WSM");
+    ExpectElevationPattern(run, s, f);
 
     if (!withOrbit) {
       EXPECT_EQ(Number(f, "nStateVectors"), 0.0);
+      EXPECT_EQ(Number(f, "SceneHeading"), -999.0);
       EXPECT_EQ(Field(f, "PixelSpacingAz"), "");
       EXPECT_EQ(f.count("OtherInfo.CORNER POINT 1  X"), 0u);
       EXPECT_EQ(f.count("OtherInfo.UTM_ZONE"), 0u);
@@ -348,11 +375,13 @@ void ExpectSubSwaths(const SynthRun& run, const std::string& root, bool withOrbi
                 1.0)
           << "corner " << c.number << " against " << corner;
     }
-    const double lat = TruthNumber(run, s, "HeaderCentreLat");
-    const double lon = TruthNumber(run, s, "HeaderCentreLon");
+    // The centre of the image and the heading of the ground track there.
+    const double lat = TruthNumber(run, s, "CentreLat");
+    const double lon = TruthNumber(run, s, "CentreLon");
     EXPECT_LT(Distance(Number(f, "OtherInfo.CENTER SCENE POINT Y"),
                        Number(f, "OtherInfo.CENTER SCENE POINT X"), lat, lon),
               1.0);
+    EXPECT_NEAR(Number(f, "SceneHeading"), TruthNumber(run, s, "CentreHeading"), 0.1);
     EXPECT_LT(Distance(Number(f, "LatNorthing"), Number(f, "LonEasting"), lat, lon), 1.0);
     EXPECT_EQ(Field(f, "OtherInfo.UTM_HEMISPHERE"), lat >= 0.0 ? "NORTH" : "SOUTH");
     EXPECT_EQ(Field(f, "OtherInfo.UTM_ZONE"),
@@ -553,11 +582,12 @@ TEST_F(Import, ASecondImportOverTheSameRootReplacesEverything) {
   ExpectSuccess(runTool(args), args);
   ExpectSubSwaths(second, root, true);
   // Nothing else is left in the folder: the library headers R1.hdr..R5.hdr
-  // stay beside the converted sub-swaths.
+  // and their antenna pattern rasters stay beside the converted sub-swaths.
   std::set<std::string> expected = {"R"};
   for (int k = 1; k <= kSubSwaths; ++k) {
     const std::string r = "R" + std::to_string(k);
-    for (const char* suffix : {".hdr", "_slc", "_slc.sml", "_slc.vrt"}) expected.insert(r + suffix);
+    for (const char* suffix : {".hdr", "_pattern", "_slc", "_slc.sml", "_slc.vrt"})
+      expected.insert(r + suffix);
   }
   std::set<std::string> present;
   for (const auto& e : std::filesystem::directory_iterator(dir))

@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "extraction/images.h"
+#include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/poly_sar.h"
 #include "metadata_sections/sampling_constants.h"
 #include "metadata_sections/sar_pulse.h"
@@ -175,6 +176,25 @@ inline void ExpectFmRateAndOrbitSpan(const SynthRun& run, const std::string& s,
   ASSERT_GE(orbit.n(), 5);
   EXPECT_LE(orbit.t0(), first);
   EXPECT_GE(orbit.t0() + (orbit.n() - 1) * orbit.dt(), last);
+}
+
+// The antenna elevation pattern of the header `hdr` against the parabola in
+// dB that the generator wrote into the product's pattern record of truth
+// section `s`, about the calibration reference angle `referenceKey`.
+inline void ExpectElevationPattern(const SynthRun& run, const std::string& s,
+                                   const std::string& hdr, const std::string& referenceKey) {
+  AntennaPattern_Obj p;
+  ASSERT_EQ(p.readhdr(hdr.c_str()), 0);
+  ASSERT_GE(p.PatternSamples, 3);
+  std::vector<float> gains(static_cast<size_t>(p.PatternSamples));
+  ASSERT_EQ(p.getPatternArray(gains.data()), 0);
+  const double slot = Value(run, s, "XcaSlot");
+  const double centre = Value(run, "Calibration", referenceKey);
+  for (int i = 0; i < p.PatternSamples; ++i) {
+    const double offset = p.StartAngle + i * p.DeltaAngle - centre;
+    const double db = -(0.75 + 0.05 * slot) * offset * offset;
+    EXPECT_NEAR(gains[static_cast<size_t>(i)], std::pow(10.0, db / 20.0), 1e-6) << i;
+  }
 }
 
 // One object for the whole program (an inline variable is initialised once).

@@ -127,11 +127,19 @@ TEST_P(Extraction, RastersAndHeadersOfEverySubSwathMatchTheTruth) {
           1.0)
           << c.truth;
     }
-    // The centre lies at the middle sample and half the bursts' cycles after
-    // the first line.
-    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, Value(run, s, "HeaderCentreLat"),
-                       Value(run, s, "HeaderCentreLon")),
+    // The centre at the middle of the image, with the angles seen there and
+    // the heading of the ground track.
+    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, Value(run, s, "CentreLat"),
+                       Value(run, s, "CentreLon")),
               1.0);
+    // The stated incidence is taken from the geocentric direction of the
+    // ground point, the generator's from the ellipsoid normal: they differ
+    // by up to the difference of geocentric and geodetic latitude (0.19°).
+    EXPECT_NEAR(gc.Center.incidence, Value(run, s, "CentreIncidence"), 0.2);
+    EXPECT_NEAR(gc.Center.lookAngle, Value(run, s, "CentreLookAngle"), 1e-3);
+    DataSetInfo_Obj info;
+    ASSERT_EQ(info.readhdr(hdr.c_str()), 0);
+    EXPECT_NEAR(info.SceneHeading, Value(run, s, "CentreHeading"), 0.1);
   }
   synth_test::remove_run(run);
 }
@@ -235,6 +243,42 @@ TEST(BadProducts, RefusedWithACodeAndNoOutputLeft) {
     }
     synth_test::remove_run(run);
   }
+}
+
+// Antenna pattern records that do not fit their sub-swath (one naming
+// another beam, one with a gain that is not a number) are left out of its
+// header; the other sub-swaths keep theirs and the run succeeds.
+TEST(BadProducts, AntennaPatternRecordsThatDoNotFitAreLeftOut) {
+  const SynthRun run = synth_test::run_synth("--seed 3");
+  ASSERT_EQ(run.exit_code, 0);
+  const std::vector<uint8_t> original = synth_test::read_file(run.product);
+  std::string bytes(original.begin(), original.end());
+  const size_t dsd = bytes.find("DS_NAME=\"MDS1 ANTENNA ELEV PATT ADS");
+  ASSERT_NE(dsd, std::string::npos);
+  const size_t offset = std::stoull(bytes.substr(bytes.find("DS_OFFSET=", dsd) + 10, 21));
+  constexpr size_t kRecord = 162, kBeam = 13, kFirstGain = 104;
+  bytes.replace(offset + kRecord + kBeam, 3, "SS3");
+  const char quietNaN[4] = {0x7f, static_cast<char>(0xc0), 0, 0};
+  bytes.replace(offset + 3 * kRecord + kFirstGain + 8, 4, quietNaN, 4);
+  std::FILE* f = std::fopen(run.product.c_str(), "wb");
+  ASSERT_NE(f, nullptr);
+  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
+  ASSERT_EQ(std::fclose(f), 0);
+
+  images_conf conf;
+  images ex(conf);
+  ASSERT_EQ(Extract(run, conf, &ex), 0);
+  for (int k = 1; k <= 5; ++k) {
+    SCOPED_TRACE(Swath(k));
+    const std::string hdr = run.dir + "R" + std::to_string(k) + ".hdr";
+    if (k == 2 || k == 4) {
+      AntennaPattern_Obj none;
+      EXPECT_NE(none.readhdr(hdr.c_str()), 0);
+    } else {
+      ExpectElevationPattern(run, Swath(k), hdr, "ReferenceAngleSS" + std::to_string(k));
+    }
+  }
+  synth_test::remove_run(run);
 }
 
 // Annotation that is only warned about: without Doppler records the

@@ -161,8 +161,8 @@ TEST_P(ImageModeProducts, RastersAndHeadersOfEveryImageMatchTheTruth) {
     }
     ExpectFmRateAndOrbitSpan(run, s, polys, hdr, first, last);
 
-    // The four corners against the generator's ground points, and the
-    // centre at the middle line and sample.
+    // The four corners against the generator's ground points, the centre at
+    // the middle of the image and the heading of the ground track there.
     geoCoords_Obj gc;
     ASSERT_EQ(gc.readhdr(hdr.c_str()), 0);
     const struct {
@@ -181,13 +181,18 @@ TEST_P(ImageModeProducts, RastersAndHeadersOfEveryImageMatchTheTruth) {
                 1.0)
           << c.corner;
     }
-    const double centreRange = nearTime + std::ceil(Value(run, s, "Samples") / 2.0) * rangeInterval;
-    const double centreTime = first + (Value(run, s, "Records") - 1.0) * interval / 2.0;
-    GeneralSAROrbit orbit;
-    ASSERT_EQ(orbit.readhdr(hdr.c_str()), 0);
-    double lat = 0.0, lon = 0.0;
-    ASSERT_EQ(orbit.SVGetLatLon(centreTime, centreRange, &lat, &lon), 0);
-    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, lat, lon), 1.0);
+    EXPECT_LT(Distance(gc.Center.latitude, gc.Center.longitude, Value(run, s, "CentreLat"),
+                       Value(run, s, "CentreLon")),
+              1.0);
+    EXPECT_NEAR(info.SceneHeading, Value(run, s, "CentreHeading"), 0.1);
+
+    // The product's one antenna pattern table is that of the first image.
+    if (k == 1) {
+      ExpectElevationPattern(run, s, hdr, "ReferenceAngle" + Text(run, s, "Swath"));
+    } else {
+      AntennaPattern_Obj none;
+      EXPECT_NE(none.readhdr(hdr.c_str()), 0);
+    }
   }
   synth_test::remove_run(run);
 }

@@ -135,6 +135,15 @@ TEST_F(AuxFiles, PatternTravelsThroughItsRasterBesideTheHeader) {
   ASSERT_EQ(copy.getPatternArray(copied.data()), 0);
   EXPECT_EQ(copied, gains);
 
+  // A header read and written under another name takes its pattern along.
+  AntennaPattern_Obj moving;
+  ASSERT_EQ(moving.readhdr(hdr.c_str()), 0);
+  ASSERT_EQ(moving.writehdr(path("moved.hdr").c_str()), 0);
+  AntennaPattern_Obj moved;
+  ASSERT_EQ(moved.readhdr(path("moved.hdr").c_str()), 0);
+  ASSERT_EQ(moved.getPatternArray(copied.data()), 0);
+  EXPECT_EQ(copied, gains);
+
   // A header whose raster is shorter than its pattern.
   spit(path("swath_pattern"), std::string(100, '\0'));
   AntennaPattern_Obj shortRaster;

@@ -114,15 +114,27 @@ State state_at(const Scene& s, double t) {
   return s.traj->at(t);
 }
 
+// Heading of the velocity v in the horizontal plane at geodetic latitude and
+// longitude (degrees): clockwise from north, 0..360.
+double heading_deg(Vec3 v, double lat_deg, double lon_deg) {
+  const double phi = lat_deg * M_PI / 180.0, lam = lon_deg * M_PI / 180.0;
+  const Vec3 east{-std::sin(lam), std::cos(lam), 0.0};
+  const Vec3 north{-std::sin(phi) * std::cos(lam), -std::sin(phi) * std::sin(lam), std::cos(phi)};
+  const double h = std::atan2(dot(v, east), dot(v, north)) * 180.0 / M_PI;
+  return h < 0.0 ? h + 360.0 : h;
+}
+
 bool corner(const Scene& s, double t, double tau, Corner* c) {
+  const State st = state_at(s, t);
   GroundPoint g;
-  if (!zero_doppler_point(state_at(s, t), tau, &g)) return false;
+  if (!zero_doppler_point(st, tau, &g)) return false;
   c->t = t;
   c->tau = tau;
   c->lat = g.geo.lat_deg;
   c->lon = g.geo.lon_deg;
   c->incidence = g.incidence_deg;
   c->look = g.look_deg;
+  c->heading = heading_deg(st.v, c->lat, c->lon);
   return true;
 }
 
@@ -203,7 +215,7 @@ double mean_power(const Pattern& p, const SubSwath& w) {
   return 2.0 * (p.scale * p.scale * taper + 1.0 / 12.0);
 }
 
-// Time and range of the centre an importer states in its header.
+// Time and range of the centre by the approximate rule (see SubSwath).
 double header_centre_time(const Scene& s, const SubSwath& w) {
   if (s.wide_swath && w.lines_per_burst > 0) {
     const double bursts = std::round(static_cast<double>(w.records) / w.lines_per_burst);
@@ -499,6 +511,10 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
   // the first image (SS1), the middle of the swath and the far range of the
   // last (SS5).
   const SubSwath& far_image = s->ss[s->images - 1];
+  if (!corner(*s, (s->t0 + s->stop) / 2, (s->ss[0].near_tau + far_image.far_tau) / 2, &s->centre)) {
+    *error = "no ground intersection for the scene centre";
+    return false;
+  }
   {
     const double taus[3] = {s->ss[0].near_tau, (s->ss[0].near_tau + far_image.far_tau) / 2,
                             far_image.far_tau};

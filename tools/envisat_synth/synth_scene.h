@@ -46,6 +46,9 @@ struct Options {
 struct Corner {
   double t = 0, tau = 0;
   double lat = 0, lon = 0, incidence = 0, look = 0;
+  // Direction of the Earth-fixed satellite velocity at t in the horizontal
+  // plane of the ground point, degrees clockwise from north (0..360).
+  double heading = 0;
 };
 
 // One sub-swath (beam) of a wide-swath product, or one image of an
@@ -68,9 +71,9 @@ struct SubSwath {
   double first_time = 0, last_time = 0;
   float time_diff = 0;
   Corner first_near, first_far, last_near, last_far, centre;
-  // The centre an importer states in its header: the middle sample
-  // (half the samples, rounded up) and, for bursts, half the bursts' cycles
-  // after the first line (else the middle line).
+  // A centre by the approximate rule: the middle sample (half the samples,
+  // rounded up) and, for bursts, half the bursts' cycles after the first
+  // line (else the middle line).  The image's own middle is `centre`.
   Corner header_centre;
   double chirp_power = 0;
   int dop_delta = 0;
@@ -132,6 +135,9 @@ struct Scene {
   std::vector<double> dop_c0;
   double dop_c1 = -1.5e4;
   double droop[8] = {0}, temperature = 0;
+  // Middle of the scene: of the earliest first and latest last line, and of
+  // the near range of the first image and the far range of the last.
+  Corner centre;
   // Product corners of the SPH: first and last line at near, mid and far range.
   double sph_lat[6] = {0}, sph_lon[6] = {0};
   // File names in the output folder.

@@ -21,6 +21,11 @@
 //                               all lines (IMS, APS; as the SPH states it)
 //   BurstCycle                  WSS: sum over sub-swaths of (Rank + EchoesPerBurst) / PRF
 //   RangeSamplingRate, CarrierFrequency, RangeSpacing, AzimuthSpacing, TotalSize
+//   CentreTime, CentreRangeTime middle of SensingStart and SensingStop, and of
+//                               the near range of the first image and the far
+//                               range of the last
+//   CentreLat, CentreLon, CentreHeading   the ground point there and the
+//                               heading (below)
 //   SphFirstNearLat/Lon ... SphLastFarLat/Lon   the six product corners of the
 //                               SPH (First/Last line; Near of SS1, Mid, Far of SS5;
 //                               IMS, APS: near, mid and far of the image)
@@ -54,12 +59,19 @@
 //   FirstTieSample              sample number of the first grid tie point
 //   CentreTime, CentreRangeTime middle of the first/last lines and near/far
 //   Near/Centre/FarIncidence, CentreLookAngle
+//   XcaSlot                     slot of the image's patterns in the
+//                               calibration files ([Calibration])
+//   CentreHeading               direction of the Earth-fixed satellite velocity
+//                               at CentreTime in the horizontal plane of the
+//                               centre's ground point, degrees clockwise from
+//                               north (0..360)
 //   FirstNear/FirstFar/LastNear/LastFar/Centre Lat and Lon
 //   HeaderCentreTime, HeaderCentreRangeTime, HeaderCentreLat/Lon
-//                               the centre an importer states in its header:
-//                               the middle sample (half the samples rounded
-//                               up), and half the bursts' cycles after the
-//                               first line (image products: the middle line)
+//                               a centre by the approximate rule: the middle
+//                               sample (half the samples rounded up), and
+//                               half the bursts' cycles after the first line
+//                               (image products: the middle line); the
+//                               image's own middle is Centre*
 //   MdsOffset, RecordSize
 //   RangeWindowType, RangeWindowCoefficient, AzimuthWindowType,
 //   AzimuthWindowCoefficient, AzimuthLookBandwidth
@@ -161,6 +173,11 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.num("RangeSpacing", s.range_spacing, "%.9f");
   t.num("AzimuthSpacing", s.azimuth_spacing, "%.6f");
   t.integer("TotalSize", L.tot_size);
+  t.time("CentreTime", s.centre.t);
+  t.num("CentreRangeTime", s.centre.tau, "%.15e");
+  t.num("CentreLat", s.centre.lat, "%.7f");
+  t.num("CentreLon", s.centre.lon, "%.7f");
+  t.num("CentreHeading", s.centre.heading, "%.6f");
   const char* sph[6] = {"FirstNear", "FirstMid", "FirstFar", "LastNear", "LastMid", "LastFar"};
   for (int i = 0; i < 6; ++i) {
     t.num(std::string("Sph") + sph[i] + "Lat", s.sph_lat[i], "%.7f");
@@ -202,6 +219,8 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
     t.num("CentreIncidence", w.centre.incidence, "%.6f");
     t.num("FarIncidence", w.first_far.incidence, "%.6f");
     t.num("CentreLookAngle", w.centre.look, "%.6f");
+    t.num("CentreHeading", w.centre.heading, "%.6f");
+    t.integer("XcaSlot", w.xca_slot);
     const Corner* c[5] = {&w.first_near, &w.first_far, &w.last_near, &w.last_far, &w.centre};
     const char* n[5] = {"FirstNear", "FirstFar", "LastNear", "LastFar", "Centre"};
     for (int i = 0; i < 5; ++i) {
@@ -301,6 +320,10 @@ bool write_truth(const Scene& s, const ProductLayout& L, std::string* error) {
   t.text("PatternDb",
          "G(offset) = -(0.75 + 0.05 * slot) * offset^2 (two-way dB, offset in "
          "degrees from the reference angle; all polarisations)");
+  t.text("ProductPattern",
+         "the product's antenna elevation pattern record of each image holds G of its "
+         "XcaSlot at the look angles of its 11 tie ranges at CentreTime, offsets from its "
+         "ReferenceAngle (= CentreLookAngle)");
   if (wss) {
     t.text("Slots", "SS1 -> 7 (ss1), SS2..SS5 -> 2..5 (is3_ss2..is6_ss5)");
     for (int k = 0; k < kSubSwaths; ++k)
