@@ -1,6 +1,7 @@
 // Progress protocol: the working file holds the percent and a message.
 #include "runtime/progress.h"
 
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -30,6 +31,14 @@ void traceStreamState(FILE* f, int attempt) {
   NVLR_UTILITY_TracePrint("%s attempt open : %d\n", words.c_str(), attempt);
 }
 
+FILE* openWorkingFile(const std::string& path) {
+  const int fd = ::open(path.c_str(), O_RDWR | O_CREAT, 0666);
+  if (fd < 0) return nullptr;
+  FILE* f = fdopen(fd, "r+");
+  if (f == nullptr) ::close(fd);
+  return f;
+}
+
 }  // namespace
 
 int getAndSetPerc(int previous, int current, const char* message) {
@@ -45,16 +54,17 @@ int getAndSetPerc(int previous, int current, const char* message) {
   if (!NVLR_UTILITY_FileExists(working.c_str())) {
     NVLR_UTILITY_TracePrint("getAndSetPerc - Not found the file : %s\n", working.c_str());
     NVLR_UTILITY_TracePrint(" attempt create : %d\n", 1);
-    f = std::fopen(working.c_str(), "w+");
-  } else {
-    for (int attempt = 1; attempt <= kWorkingOpenAttempts; ++attempt) {
-      f = std::fopen(working.c_str(), "r+");
-      if (f != nullptr) break;
-      traceStreamState(f, attempt);
-      const int error = errno;
-      if (!VlrTransientOpenError(error)) break;
-      sleep(static_cast<unsigned>(attempt - 1));
-    }
+  }
+  // Opened for reading and writing, created when missing and never
+  // truncated: a run sharing the working file may delete it at its end
+  // between any check here and the opening, and that must not end this run.
+  for (int attempt = 1; attempt <= kWorkingOpenAttempts; ++attempt) {
+    f = openWorkingFile(working);
+    if (f != nullptr) break;
+    traceStreamState(f, attempt);
+    const int error = errno;
+    if (!VlrTransientOpenError(error)) break;
+    sleep(static_cast<unsigned>(attempt - 1));
   }
   if (f == nullptr) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
