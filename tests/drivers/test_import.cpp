@@ -603,23 +603,39 @@ std::map<std::string, std::string> FolderFiles(const std::string& dir) {
 
 TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
   useAuxiliaryListOf(*descending_);
+  // Two host runs, each with its own working folder and working file, and
+  // two runs of the command line, which keeps its process log as R.log.
   constexpr int kRuns = 4;
   struct Run {
     std::vector<std::string> args;
-    std::string work;  // the run's own working folder
+    bool commandLine;
+    std::string work;  // the host run's own working folder
   };
   std::vector<Run> runs;
   for (int i = 0; i < kRuns; ++i) {
     const SynthRun& product = i % 2 == 0 ? *descending_ : *ascending_;
-    const std::string dir = folder("side_" + std::to_string(i));
-    Run r{i % 2 == 0 ? descendingArgs_ : ascendingArgs_, folder("side_work_" + std::to_string(i))};
+    Run r{i % 2 == 0 ? descendingArgs_ : ascendingArgs_, i >= 2,
+          folder("side_work_" + std::to_string(i))};
     r.args[kProduct] = product.product;
-    r.args[kRoot] = dir + "R";
+    r.args[kRoot] = folder("side_" + std::to_string(i)) + "R";
+    if (r.commandLine) {
+      r.args[kXca] = product.dir + Truth(product, "Scene", "XcaFile");
+      r.args[kIns] = product.dir + Truth(product, "Scene", "InsFile");
+    }
     runs.push_back(r);
   }
-  // A host run with its own working folder and working file; its outcome
-  // holds that folder's whole Process.log.
-  auto runHost = [&](const Run& r) {
+  // The outcome holds the run's whole process log.
+  auto runTool = [&](const Run& r) {
+    Outcome o;
+    if (r.commandLine) {
+      o.status = vlr_test::RunProgram(
+                     {vlr_test::ToolPath(), "import", r.args[kProduct], "-o", r.args[kRoot],
+                      "--orbit", r.args[kDoris], "--xca", r.args[kXca], "--ins", r.args[kIns]},
+                     {{"VELORAN_INIT_DIR", ""}}, true)
+                     .status;
+      o.log = ReadFile(r.args[kRoot] + ".log");
+      return o;
+    }
     const std::string working = r.work + "Process.working";
     WriteFile(working, "0\nStarting\n");
     WriteFile(working + "_batch_ok", "");
@@ -628,7 +644,6 @@ TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
     std::string content = "ARGUMENTS\n";
     for (const std::string& a : r.args) content += a + "\n";
     WriteFile(list, content);
-    Outcome o;
     o.status = inst_
                    ->run(std::string(kImport) + list,
                          {{"VELORAN_WORKING_DIR", r.work}, {"VELORAN_WORKING_FILE", working}})
@@ -638,18 +653,24 @@ TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
     o.workingFileLeft = Exists(working);
     return o;
   };
+  // The outputs, without the command line's log, which holds local times.
+  auto outputs = [](const Run& r) {
+    auto files = FolderFiles(std::filesystem::path(r.args[kRoot]).parent_path().string());
+    files.erase("R.log");
+    return files;
+  };
 
   std::vector<std::map<std::string, std::string>> oneAfterAnother;
   for (const Run& r : runs) {
-    ExpectSuccess(runHost(r), r.args);
+    ExpectSuccess(runTool(r), r.args);
+    oneAfterAnother.push_back(outputs(r));
     const std::string dir = std::filesystem::path(r.args[kRoot]).parent_path().string();
-    oneAfterAnother.push_back(FolderFiles(dir));
     std::filesystem::remove_all(dir);
     std::filesystem::create_directories(dir);
   }
 
   std::vector<std::future<Outcome>> started;
-  for (const Run& r : runs) started.push_back(std::async(std::launch::async, runHost, r));
+  for (const Run& r : runs) started.push_back(std::async(std::launch::async, runTool, r));
   for (int i = 0; i < kRuns; ++i) {
     SCOPED_TRACE("run " + std::to_string(i));
     const Outcome o = started[i].get();
@@ -665,8 +686,7 @@ TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
         EXPECT_EQ(o.log.find(runs[j].args[kRoot]), std::string::npos) << o.log;
       }
     }
-    const std::string dir = std::filesystem::path(runs[i].args[kRoot]).parent_path().string();
-    const auto sideBySide = FolderFiles(dir);
+    const auto sideBySide = outputs(runs[i]);
     ASSERT_EQ(sideBySide.size(), oneAfterAnother[i].size());
     for (const auto& [name, bytes] : oneAfterAnother[i]) {
       const auto it = sideBySide.find(name);
