@@ -63,9 +63,11 @@ constexpr const char* kHostVariables[] = {"VELORAN_WORKING_DIR", "VELORAN_BATCH_
 
 [[noreturn]] void runChild(const std::string& command, const RunFolder& folder,
                            const EntryDrivers& drivers, int eventFd) {
-  // Ctrl-C reaches the whole process group; the child stops through the
-  // withdrawal that the parent starts instead.
+  // Ctrl-C reaches the whole process group, and a batch system's SIGTERM
+  // every process of the job; the child stops through the withdrawal that
+  // the parent starts instead.
   signal(SIGINT, SIG_IGN);
+  signal(SIGTERM, SIG_IGN);
   signal(SIGPIPE, SIG_IGN);
   prctl(PR_SET_PDEATHSIG, SIGKILL);
   for (const char* v : kHostVariables) unsetenv(v);
@@ -138,7 +140,9 @@ ChildResult RunHostCommand(const std::string& command, const RunFolder& folder,
                            const EntryDrivers& drivers, ProgressDisplay& progress) {
   ChildResult result;
   int fds[2];
-  if (pipe(fds) != 0) {
+  // Close-on-exec: a helper program the run starts must not hold the pipe
+  // open after the run has ended.
+  if (pipe2(fds, O_CLOEXEC) != 0) {
     result.message = std::string("cannot start the run: ") + std::strerror(errno);
     return result;
   }
@@ -180,7 +184,7 @@ ChildResult RunHostCommand(const std::string& command, const RunFolder& folder,
         std::remove(folder.batchOk().c_str());
         progress.note("Stopping at the next step (Ctrl-C again to stop at once) ...");
       } else {
-        kill(child, SIGTERM);
+        kill(child, SIGKILL);
       }
     }
     pollfd p{fds[0], POLLIN, 0};
@@ -212,7 +216,7 @@ ChildResult RunHostCommand(const std::string& command, const RunFolder& folder,
     if (gInterrupts > handledInterrupts) {
       handledInterrupts = gInterrupts;
       result.interrupted = true;
-      kill(child, SIGTERM);
+      kill(child, SIGKILL);
     }
   }
   sigaction(SIGINT, &oldInt, nullptr);

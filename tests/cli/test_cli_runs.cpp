@@ -348,4 +348,39 @@ TEST_F(CommandLineRuns, ProgressIsABarOnATerminalAndPlainLinesOtherwise) {
   EXPECT_NE(plain.err.find("\nDone 100 %\n"), std::string::npos) << plain.err;
 }
 
+// Ctrl-C withdraws the run the way a host does: the run stops at its next
+// progress step with its own error records, and the command line says so.
+TEST_F(CommandLineRuns, CtrlCStopsTheRunThroughTheWithdrawal) {
+  // Enough lines that the run is still extracting when the signal comes.
+  const synth_test::SynthRun big = synth_test::run_synth("--size small");
+  ASSERT_EQ(big.exit_code, 0);
+  const std::string dir = folder("interrupted");
+  const std::string script =
+      "import signal, subprocess, sys\n"
+      "p = subprocess.Popen(sys.argv[2:], cwd=sys.argv[1], stderr=subprocess.PIPE, text=True)\n"
+      "err = ''\n"
+      "for line in p.stderr:\n"
+      "    err += line\n"
+      "    if line.startswith('Extracting data') and p.poll() is None:\n"
+      "        p.send_signal(signal.SIGINT)\n"
+      "        break\n"
+      "err += p.stderr.read()\n"
+      "sys.stderr.write(err)\n"
+      "sys.exit(p.wait())\n";
+  const RunResult r =
+      vlr_test::RunProgram({"/usr/bin/python3", "-c", script, dir, vlr_test::ToolPath(), "import",
+                            big.product, "-o", "R", "--aux-dir", big.dir},
+                           kNoHost, true);
+  synth_test::remove_run(big);
+  EXPECT_EQ(r.status, 130) << r.err;
+  EXPECT_NE(r.err.find("stopped by Ctrl-C (error 326400"), std::string::npos) << r.err;
+  EXPECT_EQ(r.err.find("Done 100 %"), std::string::npos) << r.err;
+  // The run's own records of the withdrawal, kept beside the output; no list
+  // file, since the import never completed.
+  EXPECT_NE(ReadFile(dir + "R.log").find("[ERROR ID : 326400]"), std::string::npos);
+  EXPECT_FALSE(Exists(dir + "R"));
+  for (const std::string& name : listing(dir))
+    EXPECT_EQ(name.find(".import_wss-run-"), std::string::npos) << name;
+}
+
 }  // namespace
