@@ -41,7 +41,8 @@ const std::vector<OptionSpec>& commonOptions() {
        [](Options& o, const std::string& v, std::string& e) {
          return setPath(o.auxDir, v, "the auxiliary folder", e);
        }},
-      {"--quiet", "-q", nullptr, "no progress display and no summary",
+      {"--quiet", "-q", nullptr,
+       "nothing on the terminal but errors: no progress, no notes, no summary",
        [](Options& o, const std::string&, std::string&) {
          o.quiet = true;
          return true;

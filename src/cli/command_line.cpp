@@ -232,7 +232,7 @@ int runCommand(const Options& o, const EntryDrivers& drivers) {
   const fs::path rootPath(root);
   const std::string outDir = rootPath.parent_path().string();
   std::error_code ec;
-  if (rootPath.filename().empty() || o.outRoot.back() == '/') {
+  if (rootPath.filename().empty() || fs::is_directory(root, ec)) {
     return fail(
         {"the output root " + o.outRoot + " names a folder, not a file root", kStatusUsage});
   }
