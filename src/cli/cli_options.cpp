@@ -17,6 +17,10 @@ struct OptionSpec {
   const char* help;
   // Stores the value (empty for a switch); false with a message in error.
   std::function<bool(Options&, const std::string&, std::string&)> apply;
+  // For an option whose value may be left out ("--geocode [EPSG]"): whether
+  // the next argument is its value.  The "--name=VALUE" form always is; a
+  // left-out value reaches apply as "".
+  std::function<bool(const std::string&)> takesNext = nullptr;
 };
 
 bool setPath(std::string& field, const std::string& value, const char* what, std::string& error) {
@@ -41,7 +45,8 @@ const std::vector<OptionSpec>& commonOptions() {
        [](Options& o, const std::string& v, std::string& e) {
          return setPath(o.auxDir, v, "the auxiliary folder", e);
        }},
-      {"--quiet", "-q", nullptr, "no progress display and no summary",
+      {"--quiet", "-q", nullptr,
+       "nothing on the terminal but errors: no progress, no notes, no summary",
        [](Options& o, const std::string&, std::string&) {
          o.quiet = true;
          return true;
@@ -52,7 +57,7 @@ const std::vector<OptionSpec>& commonOptions() {
 
 const std::vector<OptionSpec>& importOptions() {
   static const std::vector<OptionSpec> options = [] {
-    std::vector<OptionSpec> v = commonOptions();
+    std::vector<OptionSpec> v;
     v.push_back({"--orbit", nullptr, "FILE",
                  "DORIS orbit file (DOR_VOR or DOR_POR); without it the import has no state "
                  "vectors and no corners",
@@ -67,6 +72,7 @@ const std::vector<OptionSpec>& importOptions() {
                  [](Options& o, const std::string& s, std::string& e) {
                    return setPath(o.ins, s, "the instrument file", e);
                  }});
+    v.insert(v.end(), commonOptions().begin(), commonOptions().end());
     return v;
   }();
   return options;
@@ -74,7 +80,7 @@ const std::vector<OptionSpec>& importOptions() {
 
 const std::vector<OptionSpec>& multilookOptions() {
   static const std::vector<OptionSpec> options = [] {
-    std::vector<OptionSpec> v = commonOptions();
+    std::vector<OptionSpec> v;
     v.push_back({"--orbit", nullptr, "FILE", "DORIS orbit file (DOR_VOR or DOR_POR); required",
                  [](Options& o, const std::string& s, std::string& e) {
                    return setPath(o.orbit, s, "the orbit file", e);
@@ -109,6 +115,7 @@ const std::vector<OptionSpec>& multilookOptions() {
                    o.saturationGiven = true;
                    return true;
                  }});
+    v.insert(v.end(), commonOptions().begin(), commonOptions().end());
     return v;
   }();
   return options;
@@ -125,26 +132,49 @@ const OptionSpec* findOption(Command c, const std::string& name) {
   return nullptr;
 }
 
+// Text broken into lines of at most kHelpWidth characters after indent.
+std::string wrapped(const std::string& text, const std::string& indent) {
+  constexpr size_t kHelpWidth = 78;
+  std::string out, line;
+  size_t at = 0;
+  while (at < text.size()) {
+    size_t end = text.find(' ', at);
+    if (end == std::string::npos) end = text.size();
+    const std::string word = text.substr(at, end - at);
+    if (!line.empty() && indent.size() + line.size() + 1 + word.size() > kHelpWidth) {
+      out += indent + line + "\n";
+      line.clear();
+    }
+    line += (line.empty() ? "" : " ") + word;
+    at = end + 1;
+  }
+  if (!line.empty()) out += indent + line + "\n";
+  return out;
+}
+
 std::string optionHelp(Command c) {
   std::string text;
   for (const OptionSpec& s : optionsOf(c)) {
     std::string head = "  ";
     if (s.shortName) head += std::string(s.shortName) + ", ";
     head += s.name;
-    if (s.value) head += std::string(" ") + s.value;
-    text += head + "\n      " + s.help + "\n";
+    if (s.value)
+      head += s.takesNext ? std::string(" [") + s.value + "]" : std::string(" ") + s.value;
+    text += head + "\n" + wrapped(s.help, "      ");
   }
   text += "  -h, --help\n      this help\n";
   return text;
 }
 
 constexpr const char* kCommonNotes =
-    "\nThe run's process log is kept beside the output as OUTROOT.log.  The installation data\n"
-    "(catalogs, key files, parameter files, the auxiliary list) ship with the tool; each run\n"
-    "works in a private folder beside the output, removed at the end.  Ctrl-C stops the run\n"
-    "cleanly at its next progress step; a second Ctrl-C stops it at once.\n"
-    "Exit status: 0 on success, 2 for a wrong command line, 130 after Ctrl-C, else the error\n"
-    "code when it is below 256 and 255 for larger codes (the full code is printed).\n";
+    "\nThe run's process log is kept beside the output as OUTROOT.log.  The\n"
+    "installation data (catalogs, key files, parameter files, the auxiliary list)\n"
+    "ship with the tool; each run works in a private folder beside the output,\n"
+    "removed at the end.  Ctrl-C stops the run cleanly at its next progress step;\n"
+    "a second Ctrl-C stops it at once.\n"
+    "Exit status: 0 on success, 2 for a wrong command line, 130 after Ctrl-C, else\n"
+    "the error code when below 256 and 255 for larger codes (the full code is\n"
+    "printed).\n";
 
 }  // namespace
 
@@ -168,11 +198,11 @@ std::string HelpText(Command command) {
     case Command::Multilook:
       return "usage: import_wss multilook PRODUCT --orbit FILE [options]\n"
              "\n"
-             "Imports an ENVISAT ASAR wide-swath SLC product as 'import' does, then multilooks\n"
-             "the five sub-swaths into one power image of the whole swath: OUTROOT_gr in ground\n"
-             "range or OUTROOT_pwr in slant range, with its headers (.sml, .hdr) and, with\n"
-             "--tiff, a GeoTIFF copy (.tif).  Without --aux-dir the auxiliary files are chosen\n"
-             "from the installation's auxiliary list.\n"
+             "Imports an ENVISAT ASAR wide-swath SLC product as 'import' does, then\n"
+             "multilooks the five sub-swaths into one power image of the whole swath:\n"
+             "OUTROOT_gr in ground range or OUTROOT_pwr in slant range, with its headers\n"
+             "(.sml, .hdr) and, with --tiff, a GeoTIFF copy (.tif).  Without --aux-dir the\n"
+             "auxiliary files are chosen from the installation's auxiliary list.\n"
              "\noptions:\n" +
              optionHelp(command) + kCommonNotes;
     case Command::None:
@@ -240,7 +270,9 @@ bool ParseCommandLine(int argc, const char* const* argv, Options& o, std::string
       error = "unknown option '" + arg + "' for '" + word + "'";
       return false;
     }
-    if (spec->value != nullptr && !inlineValue) {
+    if (spec->value != nullptr && !inlineValue && spec->takesNext) {
+      if (i + 1 < argc && spec->takesNext(argv[i + 1])) value = argv[++i];
+    } else if (spec->value != nullptr && !inlineValue) {
       if (i + 1 >= argc) {
         error = std::string("option ") + spec->name + " needs a value (" + spec->value + ")";
         return false;

@@ -20,6 +20,7 @@
 #include "cli/run_summary.h"
 #include "entry/command.h"
 #include "envisat/envisat_types.h"
+#include "runtime/error_codes.h"
 #include "time/date_text.h"
 
 #ifndef VLR_VERSION
@@ -187,134 +188,131 @@ int fail(const Failure& f) {
   return f.status;
 }
 
-int runCommand(const Options& o, const EntryDrivers& drivers) {
-  Failure f;
-  std::string error;
-  const std::string dataDir = FindDataDir(error);
-  if (dataDir.empty()) return fail({error, kStatusFailed});
+// The files a run reads, as absolute paths; empty when not given.
+struct Inputs {
+  std::string product, orbit, xca, ins;
+};
 
-  // Inputs.
-  const std::string product = absolutePath(o.product);
-  if (!readableFile(product, "product", f)) return fail(f);
-  if (!EnvisatTypes::is_wss(product.c_str())) {
-    f.message = product + " is not an ASAR wide-swath SLC product (ASA_WSS_1P)";
-    return fail(f);
+// An optional input of an ENVISAT type: absolute, readable, of that type.
+bool checkTyped(const std::string& given, const char* what, int (*isType)(const char*),
+                const char* typeText, std::string& path, Failure& f) {
+  if (given.empty()) return true;
+  path = absolutePath(given);
+  if (!readableFile(path, what, f)) return false;
+  if (isType(path.c_str()) == 0) {
+    f.message = path + " is not " + typeText;
+    return false;
   }
-  std::string orbit;
-  if (!o.orbit.empty()) {
-    orbit = absolutePath(o.orbit);
-    if (!readableFile(orbit, "orbit file", f)) return fail(f);
-    if (!EnvisatTypes::is_dorvor(orbit.c_str()) && !EnvisatTypes::is_dorpor(orbit.c_str())) {
-      f.message = orbit + " is not a DORIS orbit file (DOR_VOR or DOR_POR)";
-      return fail(f);
-    }
-  }
-  std::string xca, ins;
-  if (!o.xca.empty()) {
-    xca = absolutePath(o.xca);
-    if (!readableFile(xca, "calibration file", f)) return fail(f);
-    if (!EnvisatTypes::is_xca(xca.c_str())) {
-      f.message = xca + " is not an external calibration file (ASA_XCA)";
-      return fail(f);
-    }
-  }
-  if (!o.ins.empty()) {
-    ins = absolutePath(o.ins);
-    if (!readableFile(ins, "instrument file", f)) return fail(f);
-    if (!EnvisatTypes::is_ins(ins.c_str())) {
-      f.message = ins + " is not an instrument characterisation file (ASA_INS)";
-      return fail(f);
-    }
-  }
+  return true;
+}
 
-  // Output.
-  const std::string root = o.outRoot.empty() ? defaultRoot(product) : absolutePath(o.outRoot);
+int isOrbit(const char* path) {
+  return EnvisatTypes::is_dorvor(path) || EnvisatTypes::is_dorpor(path);
+}
+
+bool checkInputs(const Options& o, Inputs& in, Failure& f) {
+  return checkTyped(o.product, "product", EnvisatTypes::is_wss,
+                    "an ASAR wide-swath SLC product (ASA_WSS_1P)", in.product, f) &&
+         checkTyped(o.orbit, "orbit file", isOrbit, "a DORIS orbit file (DOR_VOR or DOR_POR)",
+                    in.orbit, f) &&
+         checkTyped(o.xca, "calibration file", EnvisatTypes::is_xca,
+                    "an external calibration file (ASA_XCA)", in.xca, f) &&
+         checkTyped(o.ins, "instrument file", EnvisatTypes::is_ins,
+                    "an instrument characterisation file (ASA_INS)", in.ins, f);
+}
+
+// The output root: a file root in an existing folder, none of whose outputs
+// is one of the inputs.
+bool checkOutput(const Options& o, const Inputs& in, std::string& root, Failure& f) {
+  root = o.outRoot.empty() ? defaultRoot(in.product) : absolutePath(o.outRoot);
   const fs::path rootPath(root);
-  const std::string outDir = rootPath.parent_path().string();
   std::error_code ec;
-  if (rootPath.filename().empty() || o.outRoot.back() == '/') {
-    return fail(
-        {"the output root " + o.outRoot + " names a folder, not a file root", kStatusUsage});
+  if (rootPath.filename().empty() || fs::is_directory(root, ec)) {
+    f = {"the output root " + o.outRoot + " names a folder, not a file root", kStatusUsage};
+    return false;
   }
-  if (!fs::is_directory(outDir, ec)) {
-    return fail({"the output folder " + outDir + " does not exist", kStatusFailed});
+  if (!fs::is_directory(rootPath.parent_path(), ec)) {
+    f.message = "the output folder " + rootPath.parent_path().string() + " does not exist";
+    return false;
   }
-  if (!usableName(root + "5_slc.sml", "the output root", f)) return fail(f);
+  if (!usableName(root + "5_slc.sml", "the output root", f)) return false;
+  const std::string* inputs[] = {&in.product, &in.orbit, &in.xca, &in.ins};
   for (const std::string& out : outputNames(root, o)) {
-    const std::string* inputs[] = {&product, &orbit, &xca, &ins};
-    for (const std::string* in : inputs) {
-      if (!in->empty() && sameFile(out, *in)) {
-        f.message = "the output " + out + " would overwrite the input " + *in +
+    for (const std::string* input : inputs) {
+      if (!input->empty() && sameFile(out, *input)) {
+        f.message = "the output " + out + " would overwrite the input " + *input +
                     "; choose another output root with -o";
-        return fail(f);
+        return false;
       }
     }
   }
+  return true;
+}
 
-  const bool terminal = isatty(STDERR_FILENO) == 1;
-  ProgressDisplay progress(stderr, terminal, o.quiet);
+// The auxiliary files that --aux-dir chooses, for those not named.
+struct AuxChoice {
+  std::string dir;  // with a trailing '/'; empty without --aux-dir
+  AuxFileName xca, ins;
+};
 
-  // Auxiliary files chosen by their names.
-  AuxFileName xcaChoice, insChoice;
-  std::string auxDir;
-  if (!o.auxDir.empty()) {
-    auxDir = absolutePath(o.auxDir);
-    if (auxDir.back() != '/') auxDir += '/';
-    double sensingStart = 0.0;
-    if (!ProductSensingStart(product, sensingStart, f.message)) return fail(f);
-    if (xca.empty()) {
-      if (!chooseFromFolder(auxDir, "ASA_XCA", sensingStart, xcaChoice, f)) return fail(f);
-      xca = auxDir + xcaChoice.name;
-      if (!usableName(xca, "calibration file", f)) return fail(f);
-      noteChoice(progress, "Calibration file (ASA_XCA)", auxDir, xcaChoice);
-    }
-    if (ins.empty()) {
-      if (!chooseFromFolder(auxDir, "ASA_INS", sensingStart, insChoice, f)) return fail(f);
-      ins = auxDir + insChoice.name;
-      if (!usableName(ins, "instrument file", f)) return fail(f);
-      noteChoice(progress, "Instrument file (ASA_INS)", auxDir, insChoice);
-    }
+bool chooseAux(const Options& o, Inputs& in, AuxChoice& choice, ProgressDisplay& progress,
+               Failure& f) {
+  if (o.auxDir.empty()) return true;
+  choice.dir = absolutePath(o.auxDir);
+  if (choice.dir.back() != '/') choice.dir += '/';
+  double sensingStart = 0.0;
+  if (!ProductSensingStart(in.product, sensingStart, f.message)) return false;
+  const struct {
+    const char* type;
+    const char* what;
+    std::string* path;
+    AuxFileName* chosen;
+  } kinds[] = {{"ASA_XCA", "Calibration file", &in.xca, &choice.xca},
+               {"ASA_INS", "Instrument file", &in.ins, &choice.ins}};
+  for (const auto& k : kinds) {
+    if (!k.path->empty()) continue;
+    if (!chooseFromFolder(choice.dir, k.type, sensingStart, *k.chosen, f)) return false;
+    *k.path = choice.dir + k.chosen->name;
+    if (!usableName(*k.path, k.what, f)) return false;
+    noteChoice(progress, (std::string(k.what) + " (" + k.type + ")").c_str(), choice.dir,
+               *k.chosen);
   }
+  return true;
+}
 
-  // The run's own folder beside the output.
-  RunFolder run;
-  if (!run.create(outDir, error)) return fail({error, kStatusFailed});
-  std::string desDir = dataDir + "des/";
-  if (o.command == Command::Multilook && !auxDir.empty() &&
-      !privateDescriptions(run, dataDir + "des/", auxDir, xcaChoice, insChoice, desDir, f))
-    return fail(f);
-  if (!run.prepare(dataDir, desDir, HelperDir(), error)) return fail({error, kStatusFailed});
-
+// The host's argument list of the command (positions as the drivers read
+// them) and its command word.
+std::vector<std::string> hostArguments(const Options& o, const Inputs& in, const std::string& root,
+                                       std::string& word) {
   std::vector<std::string> args(kArguments, kNotOK);
-  std::string word;
+  auto set = [&args](size_t position, const std::string& value) {
+    if (!value.empty()) args[position] = value;
+  };
   if (o.command == Command::Import) {
     word = "main_import_ESA#";
-    args[0] = product;
-    if (!orbit.empty()) args[1] = orbit;
-    if (!xca.empty()) args[2] = xca;
-    args[3] = root;
-    if (!ins.empty()) args[4] = ins;
-  } else {
-    word = "main_multilook_WSS#";
-    args[0] = product;
-    args[1] = root;
-    args[2] = orbit;
-    args[6] = o.groundRange ? "OK" : kNotOK;
-    args[12] = o.tiff ? "OK" : kNotOK;
-    char saturation[32];
-    std::snprintf(saturation, sizeof saturation, "%.10g", o.saturation);
-    args[13] = saturation;
+    set(0, in.product);
+    set(1, in.orbit);
+    set(2, in.xca);
+    set(3, root);
+    set(4, in.ins);
+    return args;
   }
-  std::string argumentText = "ARGUMENTS\n";
-  for (const std::string& a : args) argumentText += a + "\n";
-  const std::string argumentFile = run.path() + "arguments.txt";
-  if (!WriteTextFile(argumentFile, argumentText, error)) return fail({error, kStatusFailed});
+  word = "main_multilook_WSS#";
+  set(0, in.product);
+  set(1, root);
+  set(2, in.orbit);
+  set(6, o.groundRange ? "OK" : kNotOK);
+  set(12, o.tiff ? "OK" : kNotOK);
+  char saturation[32];
+  std::snprintf(saturation, sizeof saturation, "%.10g", o.saturation);
+  set(13, saturation);
+  return args;
+}
 
-  const std::time_t started = std::time(nullptr) - 1;
-  const ChildResult r = RunHostCommand(word + argumentFile, run, drivers, progress);
-  keepLog(run, root);
+// Tells how the run ended; returns the exit status.
+int reportOutcome(const Options& o, const Inputs& in, const AuxChoice& aux, const ChildResult& r,
+                  const std::string& root, std::time_t started, ProgressDisplay& progress) {
   const std::string log = root + ".log";
-
   if (r.exitStatus == 0) {
     progress.finish(true);
     if (r.interrupted) {
@@ -346,15 +344,51 @@ int runCommand(const Options& o, const EntryDrivers& drivers) {
   } else {
     std::fprintf(stderr, "import_wss: the run failed with exit status %d\n", r.exitStatus);
   }
-  if (o.command == Command::Import ? (xca.empty() || ins.empty()) : auxDir.empty()) {
-    if (r.code == 10 || r.message.find("findaux") != std::string::npos)
-      std::fprintf(stderr,
-                   "import_wss: the installation's auxiliary list has no file for this product; "
-                   "name them with --aux-dir%s\n",
-                   o.command == Command::Import ? ", --xca or --ins" : "");
+  // The installation's list is what failed when the run had to use it.
+  const bool usedList =
+      o.command == Command::Import ? (in.xca.empty() || in.ins.empty()) : aux.dir.empty();
+  if (usedList && (r.code == kLibMissing || r.message.find("findaux") != std::string::npos)) {
+    std::fprintf(stderr,
+                 "import_wss: the installation's auxiliary list has no file for this product; "
+                 "name them with --aux-dir%s\n",
+                 o.command == Command::Import ? ", --xca or --ins" : "");
   }
   std::fprintf(stderr, "import_wss: the process log is %s\n", log.c_str());
   return r.exitStatus;
+}
+
+int runCommand(const Options& o, const EntryDrivers& drivers) {
+  Failure f;
+  std::string error;
+  const std::string dataDir = FindDataDir(error);
+  if (dataDir.empty()) return fail({error, kStatusFailed});
+  Inputs in;
+  std::string root;
+  if (!checkInputs(o, in, f) || !checkOutput(o, in, root, f)) return fail(f);
+
+  ProgressDisplay progress(stderr, isatty(STDERR_FILENO) == 1, o.quiet);
+  AuxChoice aux;
+  if (!chooseAux(o, in, aux, progress, f)) return fail(f);
+
+  // The run's own folder beside the output.
+  RunFolder run;
+  if (!run.create(fs::path(root).parent_path().string(), error)) return fail({error});
+  std::string desDir = dataDir + "des/";
+  if (o.command == Command::Multilook && !aux.dir.empty() &&
+      !privateDescriptions(run, dataDir + "des/", aux.dir, aux.xca, aux.ins, desDir, f))
+    return fail(f);
+  if (!run.prepare(dataDir, desDir, HelperDir(), error)) return fail({error});
+
+  std::string word;
+  std::string argumentText = "ARGUMENTS\n";
+  for (const std::string& a : hostArguments(o, in, root, word)) argumentText += a + "\n";
+  const std::string argumentFile = run.path() + "arguments.txt";
+  if (!WriteTextFile(argumentFile, argumentText, error)) return fail({error});
+
+  const std::time_t started = std::time(nullptr) - 1;
+  const ChildResult r = RunHostCommand(word + argumentFile, run, drivers, progress);
+  keepLog(run, root);
+  return reportOutcome(o, in, aux, r, root, started, progress);
 }
 
 }  // namespace

@@ -29,24 +29,20 @@ volatile sig_atomic_t gInterrupts = 0;
 constexpr int kPollMilliseconds = 200;
 constexpr size_t kTitleMax = 200;
 
-// Sends one event line: "S title" for a step, "P percent" for a percent.
-// Lines stay far below PIPE_BUF, so each write is whole.
+// Sends one event line: "S title" for a step, "P percent [message]" for a
+// percent.  Lines stay far below PIPE_BUF, so each write is whole.
 void sendEvent(int percent, const char* title) {
   if (gEventFd < 0) return;
-  char line[kTitleMax + 8];
-  int n;
-  if (title != nullptr) {
-    std::string t = title;
-    if (t.size() > kTitleMax) t.resize(kTitleMax);
-    for (char& c : t) {
-      if (c == '\n' || c == '\r') c = ' ';
-    }
-    n = std::snprintf(line, sizeof line, "S %s\n", t.c_str());
-  } else {
-    n = std::snprintf(line, sizeof line, "P %d\n", percent);
+  std::string t = title ? title : "";
+  if (t.size() > kTitleMax) t.resize(kTitleMax);
+  for (char& c : t) {
+    if (c == '\n' || c == '\r') c = ' ';
   }
+  char line[kTitleMax + 32];
+  const int n = percent < 0 ? std::snprintf(line, sizeof line, "S %s\n", t.c_str())
+                            : std::snprintf(line, sizeof line, "P %d %s\n", percent, t.c_str());
   if (n > 0) {
-    ssize_t w = write(gEventFd, line, static_cast<size_t>(n));
+    const ssize_t w = write(gEventFd, line, static_cast<size_t>(n));
     (void)w;
   }
 }
@@ -97,7 +93,11 @@ void handleLine(const std::string& line, ProgressDisplay& progress) {
   if (line[0] == 'S') {
     progress.step(line.substr(2));
   } else if (line[0] == 'P') {
-    progress.percent(std::atoi(line.c_str() + 2));
+    char* end = nullptr;
+    const long percent = std::strtol(line.c_str() + 2, &end, 10);
+    // A message given with a percent names the step it belongs to.
+    if (*end == ' ' && end[1] != '\0') progress.stepIfNew(end + 1);
+    progress.percent(static_cast<int>(percent));
   }
 }
 

@@ -91,9 +91,23 @@ void ProgressDisplay::draw(bool force) {
   barShown_ = true;
 }
 
-void ProgressDisplay::step(const std::string& title) {
+namespace {
+
+// A title without the trailing dots and blanks the run puts behind it.
+std::string trimmedTitle(const std::string& title) {
   std::string t = title;
   while (!t.empty() && (t.back() == ' ' || t.back() == '.')) t.pop_back();
+  return t;
+}
+
+}  // namespace
+
+void ProgressDisplay::stepIfNew(const std::string& title) {
+  if (trimmedTitle(title) != stepName_) step(title);
+}
+
+void ProgressDisplay::step(const std::string& title) {
+  const std::string t = trimmedTitle(title);
   if (t.empty()) return;
   // A step that runs again (one per sub-swath) is numbered.
   pass_ = t == stepName_ ? pass_ + 1 : 1;
@@ -134,10 +148,11 @@ void ProgressDisplay::finish(bool success) {
 
 void ProgressDisplay::note(const std::string& text) {
   if (quiet_) return;
+  const bool barWasShown = barShown_;
   clearLine();
   std::fprintf(out_, "%s\n", text.c_str());
   std::fflush(out_);
-  if (terminal_) draw(true);
+  if (barWasShown) draw(true);
 }
 
 }  // namespace vlr::cli

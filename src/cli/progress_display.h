@@ -16,6 +16,9 @@ class ProgressDisplay {
 
   // A new step of the run (the title the run gives it).
   void step(const std::string& title);
+  // A step named by the message of a progress update: a new step unless it
+  // is the current one.
+  void stepIfNew(const std::string& title);
   // The current step's percent, 0 to 100.
   void percent(int value);
   // Ends the display: a successful run shows 100 %.

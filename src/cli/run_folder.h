@@ -20,8 +20,8 @@ std::string HelperDir();
 
 // A private folder for one run, created inside a parent folder: it holds the
 // run's configuration file, Process.log, the working file with its
-// "_batch_ok" and "_error" files and the temporary files.  The destructor
-// removes it with everything in it.
+// "_batch_ok" and "_error" files, and what the run writes to its standard
+// streams.  The destructor removes it with everything in it.
 class RunFolder {
  public:
   RunFolder() = default;

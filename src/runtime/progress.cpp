@@ -85,7 +85,7 @@ int getAndSetPerc(int previous, int current, const char* message) {
   if (ftruncate(fileno(f), std::ftell(f)) != 0) {
   }
   std::fclose(f);
-  VlrNotifyProgressObserver(current, nullptr);
+  VlrNotifyProgressObserver(current, message);
   return 1;
 }
 

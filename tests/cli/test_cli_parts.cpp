@@ -1,9 +1,7 @@
 // The command line's own pieces: choosing auxiliary files by the dates in
-// their names, reading the options, estimating the remaining time and
-// reading the host's error file.
+// their names, reading the options and reading the host's error file.
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <cstdio>
 #include <string>
 #include <vector>
@@ -11,7 +9,6 @@
 #include "cli/aux_choice.h"
 #include "cli/cli_options.h"
 #include "cli/host_child.h"
-#include "cli/progress_display.h"
 
 namespace {
 
@@ -118,17 +115,6 @@ TEST(CommandLineOptions, CommandLinesThatCannotRunAreRefusedWithTheReason) {
   EXPECT_EQ(o.product, "-odd name");
   EXPECT_FALSE(o.groundRange);
   EXPECT_EQ(o.saturation, 2.5);
-}
-
-TEST(ProgressDisplay, RemainingTimeFollowsTheRateSoFar) {
-  EXPECT_EQ(vlr::cli::RemainingTime(10.0, 50), "0:10");
-  EXPECT_EQ(vlr::cli::RemainingTime(30.0, 25), "1:30");
-  EXPECT_EQ(vlr::cli::RemainingTime(3600.0, 50), "1:00:00");
-  // Too early to tell, or finished.
-  EXPECT_EQ(vlr::cli::RemainingTime(0.5, 50), "");
-  EXPECT_EQ(vlr::cli::RemainingTime(10.0, 1), "");
-  EXPECT_EQ(vlr::cli::RemainingTime(10.0, 100), "");
-  EXPECT_EQ(vlr::cli::RemainingTime(std::nan(""), 50), "");
 }
 
 TEST(HostErrorFile, CodeTitleTextAndExtraLinesAreRead) {
