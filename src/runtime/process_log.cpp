@@ -1,9 +1,12 @@
 // Process log, trace, START and END records and the closing sequence.
 #include "runtime/process_log.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <ctime>
@@ -12,6 +15,7 @@
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/progress.h"
 #include "runtime/raise.h"
 #include "runtime/suite_state.h"
 
@@ -25,14 +29,33 @@ constexpr size_t kLabelMax = 80;
 constexpr int64_t kTraceArchiveSize = 1000000;
 constexpr int kDeleteAttempts = 30;
 
+// Writes a whole record with one system call.  The process log is opened for
+// appending, so a record from a run beside this one (sharing the working
+// folder) lands before or after it, never inside it.
+bool writeRecord(FILE* f, const char* text, size_t size) {
+  if (f == nullptr) return false;
+  if (std::fflush(f) != 0) return false;
+  const int fd = fileno(f);
+  while (size > 0) {
+    const ssize_t n = ::write(fd, text, size);
+    if (n < 0 && errno == EINTR) continue;
+    if (n <= 0) return false;
+    text += n;
+    size -= static_cast<size_t>(n);
+  }
+  return true;
+}
+
+bool writeRecord(FILE* f, const std::string& text) {
+  return writeRecord(f, text.data(), text.size());
+}
+
 bool vprint(FILE* f, const char* format, va_list args) {
   if (f == nullptr) return false;
   char buffer[kPrintBuffer];
   const int n = std::vsnprintf(buffer, sizeof buffer, format, args);
   if (n < 0) return false;
-  std::fputs(buffer, f);
-  std::fflush(f);
-  return !std::ferror(f);
+  return writeRecord(f, buffer, std::min(static_cast<size_t>(n), sizeof buffer - 1));
 }
 
 std::string stars() {
@@ -42,14 +65,31 @@ std::string stars() {
 // Writes text to the process log, then to the trace.
 void logAndTrace(const std::string& text) {
   auto& s = suite();
-  if (s.log) {
-    std::fputs(text.c_str(), s.log);
-    std::fflush(s.log);
+  writeRecord(s.log, text);
+  if (s.traceOn) writeRecord(s.trace, text);
+}
+
+// Reserves an archive name in dir: head, the timestamp and tail, created
+// empty and exclusively so that a run ending at the same microsecond in the
+// same folder never copies over this run's archive; on a clash the process
+// id and a count follow the timestamp.
+std::string reserveArchive(const std::string& dir, const char* head, const char* tail) {
+  const std::string stamp = NVLR_UTILITY_Timestamp();
+  std::string path = dir + head + stamp + tail;
+  for (int clash = 0; clash < 100; ++clash) {
+    if (clash > 0) {
+      path = dir + head + stamp +
+             NVLR_UTILITY_Format("_%ld_%d", static_cast<long>(getpid()), clash) + tail;
+    }
+    const int fd = ::open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL, 0666);
+    if (fd >= 0) {
+      ::close(fd);
+      return path;
+    }
+    if (errno != EEXIST) break;
   }
-  if (s.traceOn && s.trace) {
-    std::fputs(text.c_str(), s.trace);
-    std::fflush(s.trace);
-  }
+  // The copy reports what stands in the way.
+  return path;
 }
 
 void closeTrace() {
@@ -96,6 +136,7 @@ void NVLR_UTILITY_SetProcessLabel(const char* title) {
     if (c == '\n') c = ' ';
   }
   suite().processLabel = label;
+  VlrNotifyProgressObserver(-1, title ? title : "");
 }
 
 const std::string& NVLR_UTILITY_ProcessLabel() {
@@ -148,7 +189,11 @@ void NVLR_UTILITY_WriteEnd() {
 void VlrOpenProcessLog() {
   auto& s = suite();
   const std::string path = vlr_detail::workingDir() + "Process.log";
-  s.log = std::fopen(path.c_str(), "a");
+  // O_APPEND: every write goes to the end of the file as it is then, also
+  // when other runs append to the same log.
+  const int fd = ::open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT, 0666);
+  s.log = fd >= 0 ? fdopen(fd, "a") : nullptr;
+  if (s.log == nullptr && fd >= 0) ::close(fd);
 }
 
 void VlrOpenTrace(int fresh) {
@@ -174,13 +219,16 @@ void VlrOpenTrace(int fresh) {
 namespace {
 
 // Deletes the working file at the end of a successful run, retrying while the
-// host may still hold it; raises 261120 when it stays.
+// host may still hold it; raises 261120 when it cannot be deleted.  The run
+// judges its own deletion, not whether a file of that name exists afterwards:
+// another run sharing the working file may already have written it anew, and
+// that file is the other run's.
 void deleteWorkingFile() {
   auto& s = suite();
   if (s.workingFile.empty() || !NVLR_UTILITY_FileExists(s.workingFile.c_str())) return;
   for (int attempt = 1; attempt <= kDeleteAttempts; ++attempt) {
     chmod(s.workingFile.c_str(), S_IRWXU);
-    if (std::remove(s.workingFile.c_str()) == 0) break;
+    if (::unlink(s.workingFile.c_str()) == 0 || errno == ENOENT) return;
     const int wait = static_cast<int>(attempt * 0.1);
     if (wait > 0) sleep(static_cast<unsigned>(wait));
   }
@@ -212,17 +260,17 @@ void NVLR_UTILITY_EndProcess(int code, int writeLog, int successful) {
     s.log = nullptr;
     closeTrace();
     if (!dir.empty() && NVLR_UTILITY_FileExists((dir + "Process.trace_save").c_str())) {
-      const std::string copy = dir + "Process" + NVLR_UTILITY_Timestamp() + ".trace";
+      const std::string copy = reserveArchive(dir, "Process", ".trace");
       NVLR_UTILITY_CopyFile(tracePath.c_str(), copy.c_str());
       sleep(1);
     }
   }
   if (code != 0 && !dir.empty() && NVLR_UTILITY_FileExists(tracePath.c_str())) {
-    const std::string copy = dir + "Veloran_" + NVLR_UTILITY_Timestamp() + "_trace.txt";
+    const std::string copy = reserveArchive(dir, "Veloran_", "_trace.txt");
     NVLR_UTILITY_CopyFile(tracePath.c_str(), copy.c_str());
   }
   if (!dir.empty() && NVLR_UTILITY_FileSize(tracePath.c_str()) > kTraceArchiveSize) {
-    const std::string copy = dir + "Veloran_" + NVLR_UTILITY_Timestamp() + "_trace.txt";
+    const std::string copy = reserveArchive(dir, "Veloran_", "_trace.txt");
     NVLR_UTILITY_CopyFile(tracePath.c_str(), copy.c_str());
     chmod(tracePath.c_str(), S_IRWXU);
     std::remove(tracePath.c_str());

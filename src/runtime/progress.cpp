@@ -1,6 +1,7 @@
 // Progress protocol: the working file holds the percent and a message.
 #include "runtime/progress.h"
 
+#include <fcntl.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -20,6 +21,10 @@ namespace {
 
 constexpr const char* kModule = "vlr_generic_utility";
 constexpr int kMaxPercent = 99;
+
+// Not part of the suite state: it outlives the environment's
+// initialisation, which resets that state.
+VlrProgressObserver gObserver = nullptr;
 
 void traceStreamState(FILE* f, int attempt) {
   if (!NVLR_UTILITY_IsTraceOn()) return;
@@ -46,6 +51,14 @@ void withdrawWhenAsked(const std::string& working, int percent, const std::strin
   std::remove((working + "_batch_ok").c_str());
 }
 
+FILE* openWorkingFile(const std::string& path) {
+  const int fd = ::open(path.c_str(), O_RDWR | O_CREAT, 0666);
+  if (fd < 0) return nullptr;
+  FILE* f = fdopen(fd, "r+");
+  if (f == nullptr) ::close(fd);
+  return f;
+}
+
 }  // namespace
 
 int getAndSetPerc(int previous, int current, const char* message) {
@@ -61,16 +74,17 @@ int getAndSetPerc(int previous, int current, const char* message) {
   if (!NVLR_UTILITY_FileExists(working.c_str())) {
     NVLR_UTILITY_TracePrint("getAndSetPerc - Not found the file : %s\n", working.c_str());
     NVLR_UTILITY_TracePrint(" attempt create : %d\n", 1);
-    f = std::fopen(working.c_str(), "w+");
-  } else {
-    for (int attempt = 1; attempt <= kWorkingOpenAttempts; ++attempt) {
-      f = std::fopen(working.c_str(), "r+");
-      if (f != nullptr) break;
-      traceStreamState(f, attempt);
-      const int error = errno;
-      if (!VlrTransientOpenError(error)) break;
-      sleep(static_cast<unsigned>(attempt - 1));
-    }
+  }
+  // Opened for reading and writing, created when missing and never
+  // truncated: a run sharing the working file may delete it at its end
+  // between any check here and the opening, and that must not end this run.
+  for (int attempt = 1; attempt <= kWorkingOpenAttempts; ++attempt) {
+    f = openWorkingFile(working);
+    if (f != nullptr) break;
+    traceStreamState(f, attempt);
+    const int error = errno;
+    if (!VlrTransientOpenError(error)) break;
+    sleep(static_cast<unsigned>(attempt - 1));
   }
   if (f == nullptr) {
     NVLR_UTILITY_RaiseError(vlr::kCodeBatchWithdrawn, kModule, __LINE__, working.c_str());
@@ -89,5 +103,14 @@ int getAndSetPerc(int previous, int current, const char* message) {
   }
   std::fclose(f);
   withdrawWhenAsked(working, current, shown);
+  VlrNotifyProgressObserver(current, message);
   return 1;
+}
+
+void VlrSetProgressObserver(VlrProgressObserver observer) {
+  gObserver = observer;
+}
+
+void VlrNotifyProgressObserver(int percent, const char* title) {
+  if (gObserver != nullptr) gObserver(percent, title);
 }

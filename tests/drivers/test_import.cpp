@@ -14,6 +14,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
+#include <future>
 #include <map>
 #include <memory>
 #include <set>
@@ -624,3 +625,110 @@ TEST_F(Import, AnOutputFolderThatCannotBeWrittenFailsWithoutAList) {
 }
 
 }  // namespace
+
+namespace {
+
+// Every file of a folder, by name, with its bytes.
+std::map<std::string, std::string> FolderFiles(const std::string& dir) {
+  std::map<std::string, std::string> files;
+  for (const auto& e : std::filesystem::directory_iterator(dir))
+    files[e.path().filename().string()] = ReadFile(e.path().string());
+  return files;
+}
+
+}  // namespace
+
+TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
+  useAuxiliaryListOf(*descending_);
+  // Two host runs, each with its own working folder and working file, and
+  // two runs of the command line, which keeps its process log as R.log.
+  constexpr int kRuns = 4;
+  struct Run {
+    std::vector<std::string> args;
+    bool commandLine;
+    std::string work;  // the host run's own working folder
+  };
+  std::vector<Run> runs;
+  for (int i = 0; i < kRuns; ++i) {
+    const SynthRun& product = i % 2 == 0 ? *descending_ : *ascending_;
+    Run r{i % 2 == 0 ? descendingArgs_ : ascendingArgs_, i >= 2,
+          folder("side_work_" + std::to_string(i))};
+    r.args[kProduct] = product.product;
+    r.args[kRoot] = folder("side_" + std::to_string(i)) + "R";
+    if (r.commandLine) {
+      r.args[kXca] = product.dir + Truth(product, "Scene", "XcaFile");
+      r.args[kIns] = product.dir + Truth(product, "Scene", "InsFile");
+    }
+    runs.push_back(r);
+  }
+  // The outcome holds the run's whole process log.
+  auto runTool = [&](const Run& r) {
+    Outcome o;
+    if (r.commandLine) {
+      o.status = vlr_test::RunProgram(
+                     {vlr_test::ToolPath(), "import", r.args[kProduct], "-o", r.args[kRoot],
+                      "--orbit", r.args[kDoris], "--xca", r.args[kXca], "--ins", r.args[kIns]},
+                     {{"VELORAN_INIT_DIR", ""}}, true)
+                     .status;
+      o.log = ReadFile(r.args[kRoot] + ".log");
+      return o;
+    }
+    const std::string working = r.work + "Process.working";
+    WriteFile(working, "0\nStarting\n");
+    WriteFile(working + "_batch_ok", "");
+    std::remove((r.work + "Process.log").c_str());
+    const std::string list = r.work + "args.txt";
+    std::string content = "ARGUMENTS\n";
+    for (const std::string& a : r.args) content += a + "\n";
+    WriteFile(list, content);
+    o.status = inst_
+                   ->run(std::string(kImport) + list,
+                         {{"VELORAN_WORKING_DIR", r.work}, {"VELORAN_WORKING_FILE", working}})
+                   .status;
+    o.log = ReadFile(r.work + "Process.log");
+    o.error = ReadFile(working + "_error");
+    o.workingFileLeft = Exists(working);
+    return o;
+  };
+  // The outputs, without the command line's log, which holds local times.
+  auto outputs = [](const Run& r) {
+    auto files = FolderFiles(std::filesystem::path(r.args[kRoot]).parent_path().string());
+    files.erase("R.log");
+    return files;
+  };
+
+  std::vector<std::map<std::string, std::string>> oneAfterAnother;
+  for (const Run& r : runs) {
+    ExpectSuccess(runTool(r), r.args);
+    oneAfterAnother.push_back(outputs(r));
+    const std::string dir = std::filesystem::path(r.args[kRoot]).parent_path().string();
+    std::filesystem::remove_all(dir);
+    std::filesystem::create_directories(dir);
+  }
+
+  std::vector<std::future<Outcome>> started;
+  for (const Run& r : runs) started.push_back(std::async(std::launch::async, runTool, r));
+  for (int i = 0; i < kRuns; ++i) {
+    SCOPED_TRACE("run " + std::to_string(i));
+    const Outcome o = started[i].get();
+    ExpectSuccess(o, runs[i].args);
+    // The run's log holds its own run and nothing of the others.
+    size_t starts = 0;
+    for (size_t at = o.log.find("\nSTART : "); at != std::string::npos;
+         at = o.log.find("\nSTART : ", at + 1))
+      ++starts;
+    EXPECT_EQ(starts, 1u) << o.log;
+    for (int j = 0; j < kRuns; ++j) {
+      if (j != i) {
+        EXPECT_EQ(o.log.find(runs[j].args[kRoot]), std::string::npos) << o.log;
+      }
+    }
+    const auto sideBySide = outputs(runs[i]);
+    ASSERT_EQ(sideBySide.size(), oneAfterAnother[i].size());
+    for (const auto& [name, bytes] : oneAfterAnother[i]) {
+      const auto it = sideBySide.find(name);
+      ASSERT_NE(it, sideBySide.end()) << name;
+      EXPECT_TRUE(it->second == bytes) << name << " differs from the run one after another";
+    }
+  }
+}
