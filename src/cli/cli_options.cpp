@@ -190,7 +190,7 @@ std::string HelpText(Command command) {
              "\n"
              "Imports an ENVISAT ASAR wide-swath SLC product (ASA_WSS_1P): writes one complex\n"
              "raster per sub-swath, OUTROOT1_slc to OUTROOT5_slc, with their headers\n"
-             "(OUTROOTk_slc.sml and the ENVI header OUTROOTk_slc.hdr), and the list file\n"
+             "(OUTROOTk_slc.sml, and OUTROOTk_slc.vrt for GDAL), and the list file\n"
              "OUTROOT naming the five rasters.  Without --xca, --ins or --aux-dir the\n"
              "auxiliary files are chosen from the installation's auxiliary list.\n"
              "\noptions:\n" +

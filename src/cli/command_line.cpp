@@ -105,7 +105,7 @@ std::vector<std::string> outputNames(const std::string& root, const Options& o) 
   std::vector<std::string> names = {root, root + ".log"};
   for (int k = 1; k <= kSubSwaths; ++k) {
     const std::string r = root + std::to_string(k);
-    for (const char* s : {"", ".hdr", "_slc", "_slc.sml", "_slc.hdr", "_slc_hdr", "_slc.vrt"})
+    for (const char* s : {"", ".hdr", "_pattern", "_slc", "_slc.sml", "_slc.hdr", "_slc_hdr", "_slc.vrt"})
       names.push_back(r + s);
   }
   if (o.command == Command::Multilook) {

@@ -124,7 +124,7 @@ TEST_F(CommandLineRuns, CommandsWithDefaultsOptionsAndWrongInputs) {
   const std::string xcaName = fs::path(xca).filename().string();
   const std::string insName = fs::path(ins).filename().string();
   const std::vector<std::string> slc = {"R",          "R.log",  "R1_slc",    "R1_slc.sml",
-                                        "R3_slc.hdr", "R5_slc", "R5_slc.sml"};
+                                        "R3_slc.vrt", "R5_slc", "R5_slc.sml"};
 
   // clang-format off
   const std::vector<CliCase> cases = {

@@ -235,11 +235,10 @@ def check_product(outdir, product, truth):
         if size != records * (LINE_PREFIX + SAMPLE_BYTES * samples):
             raise Failure("%s: %d bytes for %d lines of %d samples" % (raster, size, records,
                                                                       samples))
-        with open(raster + ".hdr") as f:
-            envi = f.read()
-        for line in ("samples = %d" % samples, "lines = %d" % records):
-            if "\n%s\n" % line not in envi:
-                raise Failure("%s.hdr lacks %r" % (raster, line))
+        with open(raster + ".vrt") as f:
+            vrt = f.read()
+        if 'rasterXSize="%d" rasterYSize="%d"' % (samples, records) not in vrt:
+            raise Failure("%s.vrt does not state %d x %d" % (raster, samples, records))
         f = sml_fields(raster + ".sml", {"NrOfLinesPerImage", "NrOfPixelsPerLine"})
         if (float(f.get("NrOfLinesPerImage", "nan")) != records or
                 float(f.get("NrOfPixelsPerLine", "nan")) != samples):
