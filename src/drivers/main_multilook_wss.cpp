@@ -200,8 +200,8 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   if (geocode) {
     NVLR_UTILITY_SetProcessLabel("Geocoding ...");
     const std::string target = root + kGeocodeSuffix;
-    if (GeocodeMultilook(output.c_str(), radarGrid, imagingOrbit, geocodeOptions, mconf.GrSamplingStep,
-                         target.c_str(), &geocodeMessage) != 0)
+    if (GeocodeMultilook(output.c_str(), radarGrid, imagingOrbit, geocodeOptions,
+                         mconf.GrSamplingStep, target.c_str(), &geocodeMessage) != 0)
       stepFailed(__LINE__, ("geocode(): " + geocodeMessage).c_str());
     errno = 0;
   }

@@ -1,6 +1,7 @@
 // Suite header of a geocoded image.
 #include "geocode/geocode_header.h"
 
+#include <cerrno>
 #include <string>
 
 #include "runtime/call_scope.h"
@@ -33,11 +34,13 @@ void WriteGeocodedHeader(const char* image, const MapGrid& map, const char* targ
   SetText(header, "RasterInfo.CellType", NVLR_UTILITY_CellTypeName(CVLR_FLOAT));
   SetNumber(header, "RasterInfo.NullCellValue", kGeocodeNoData);
   SetText(header, "RasterInfo.GeocodedImage", "OK");
-  for (const char* path : {"RasterInfo.RowPrefix", "RasterInfo.RowSuffix", "RasterInfo.HeaderOffset"}) {
+  for (const char* path :
+       {"RasterInfo.RowPrefix", "RasterInfo.RowSuffix", "RasterInfo.HeaderOffset"}) {
     CDescriptionField* f = findField(header, path);
     if (f != nullptr && f->type() == CVLR_FieldType::Integer) setInteger(f, 0);
   }
-  const bool utm = (map.epsg > 32600 && map.epsg <= 32660) || (map.epsg > 32700 && map.epsg <= 32760);
+  const bool utm =
+      (map.epsg > 32600 && map.epsg <= 32660) || (map.epsg > 32700 && map.epsg <= 32760);
   if (utm) {
     SetText(header, "CartographicSystem.State", CVLR_STATE_UTM_GLOBAL);
     SetText(header, "CartographicSystem.Hemisphere", map.epsg < 32700 ? "NORTH" : "SOUTH");
@@ -74,5 +77,6 @@ int GeocodeMultilook(const char* image, const MlookRadarGrid& grid, const Genera
   VLR_CALL(GeocodeImage(image, grid, orbit, map, target, message, figures));
   WriteGeocodedHeader(image, map, target);
   if (mapOut != nullptr) *mapOut = map;
+  errno = 0;
   return 0;
 }

@@ -340,7 +340,10 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
     *message = std::string("Cannot write the map image ") + output;
     VLR_FAIL(message->c_str(), vlr::kLibWrite);
   }
-  if (!writer.finish(message)) VLR_FAIL(message->c_str(), vlr::kLibWrite);
+  const bool written = writer.finish(message);
+  // GDAL leaves errno set by the files it probed.
+  errno = 0;
+  if (!written) VLR_FAIL(message->c_str(), vlr::kLibWrite);
   if (figures != nullptr) {
     figures->exactSolutions = workers[0]->exact + workers[1]->exact;
     figures->validPixels = valid;

@@ -2,13 +2,14 @@
 #include "geocode/map_grid.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <cmath>
 #include <limits>
 
 #include "geocode/spatial_reference.h"
 #include "orbit/earth_constants.h"
-#include "orbit/geodetic.h"
 #include "orbit/general_sar_orbit.h"
+#include "orbit/geodetic.h"
 #include "orbit/gr_pt.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
@@ -35,7 +36,8 @@ bool GroundPoint(GeneralSAROrbit& orbit, int lookSign, double t, double tau, dou
                  double* lon, double* lat) {
   double P[3], V[3], G[3];
   if (orbit.SVGetPos(t, P) > 0 || orbit.SVGetVel(t, V) > 0) return false;
-  if (gr_pt(P, V, tau, 0.0, orbit.lambda(), 0.0, lookSign, kWgs84A + height, kWgs84B + height, G) != 0)
+  if (gr_pt(P, V, tau, 0.0, orbit.lambda(), 0.0, lookSign, kWgs84A + height, kWgs84B + height, G) !=
+      0)
     return false;
   double geo[2];
   xyz2geo(G, geo, kWgs84A + height, kWgs84B + height);
@@ -117,14 +119,12 @@ int ChooseMapGrid(const MlookRadarGrid& grid, const GeneralSAROrbit& orbitIn,
   geocode_detail::MapTransform transform;
   if (!transform.open(epsg, message)) VLR_FAIL(message->c_str(), vlr::kLibInconsistent);
   double spacing = options.spacing;
-  if (spacing == 0.0)
-    spacing = transform.geographic() ? groundStep / kMetresPerDegree : groundStep;
+  if (spacing == 0.0) spacing = transform.geographic() ? groundStep / kMetresPerDegree : groundStep;
 
   double minX = std::numeric_limits<double>::infinity(), maxX = -minX, minY = minX, maxY = -minX;
   for (size_t i = 0; i < lons.size(); ++i) {
     double x = 0.0, y = 0.0;
-    if (!transform.fromLonLat(lons[i], lats[i], &x, &y) || !std::isfinite(x) ||
-        !std::isfinite(y)) {
+    if (!transform.fromLonLat(lons[i], lats[i], &x, &y) || !std::isfinite(x) || !std::isfinite(y)) {
       *message = "The image does not lie within the map's reference system";
       VLR_FAIL(message->c_str(), vlr::kLibInconsistent);
     }
@@ -151,5 +151,7 @@ int ChooseMapGrid(const MlookRadarGrid& grid, const GeneralSAROrbit& orbitIn,
   map->width = static_cast<int>(width);
   map->height = static_cast<int>(height);
   map->groundHeight = options.height;
+  // PROJ leaves errno set by the files it probed.
+  errno = 0;
   return 0;
 }

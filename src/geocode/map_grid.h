@@ -24,10 +24,10 @@ struct GeocodeOptions {
 struct MapGrid {
   int epsg = 0;
   bool geographic = false;
-  std::string wkt;           // the reference system as WKT
-  double originX = 0.0;      // upper-left corner of the upper-left pixel
+  std::string wkt;       // the reference system as WKT
+  double originX = 0.0;  // upper-left corner of the upper-left pixel
   double originY = 0.0;
-  double spacing = 0.0;      // square pixels, map units
+  double spacing = 0.0;  // square pixels, map units
   int width = 0;
   int height = 0;
   double groundHeight = 0.0;  // m above the ellipsoid

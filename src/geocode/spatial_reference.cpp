@@ -4,6 +4,8 @@
 #include <cpl_error.h>
 #include <ogr_spatialref.h>
 
+#include <cerrno>
+
 namespace geocode_detail {
 
 void SrsDeleter::operator()(OGRSpatialReference* s) const {
@@ -20,6 +22,8 @@ SrsPtr SrsFromEpsg(int epsg, std::string* message) {
   CPLPushErrorHandler(CPLQuietErrorHandler);
   const OGRErr err = epsg > 0 ? srs->importFromEPSG(epsg) : OGRERR_UNSUPPORTED_SRS;
   CPLPopErrorHandler();
+  // PROJ leaves its own error numbers in errno.
+  errno = 0;
   if (err != OGRERR_NONE) {
     *message = "EPSG code " + std::to_string(epsg) + " names no known reference system";
     return nullptr;
@@ -46,6 +50,7 @@ bool MapTransform::open(int epsg, std::string* message) {
   toGeo_.reset(OGRCreateCoordinateTransformation(map_.get(), wgs84_.get()));
   fromGeo_.reset(OGRCreateCoordinateTransformation(wgs84_.get(), map_.get()));
   CPLPopErrorHandler();
+  errno = 0;
   if (!toGeo_ || !fromGeo_) {
     *message = "No transformation between EPSG:" + std::to_string(epsg) + " and WGS 84";
     return false;

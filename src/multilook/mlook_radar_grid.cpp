@@ -70,8 +70,8 @@ double MlookRadarGrid::rowColumn(const GroundAxisRow& row, double rangeTime) con
   // Beyond the ends the end segments go on straight.
   const int i = std::min(
       n - 2,
-      std::max(0, static_cast<int>(std::upper_bound(r.begin(), r.end(), rangeTime) - r.begin()) -
-                      1));
+      std::max(0,
+               static_cast<int>(std::upper_bound(r.begin(), r.end(), rangeTime) - r.begin()) - 1));
   const double c0 = static_cast<double>(i) * nodeStride_;
   const double c1 = std::min(c0 + nodeStride_, samples_ - 1.0);
   const double span = r[i + 1] - r[i];
