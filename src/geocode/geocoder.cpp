@@ -80,13 +80,10 @@ struct Lattice {
   size_t at(int i, int j) const { return static_cast<size_t>(i) * columns + j; }
 };
 
-// One thread's tools: its exact solver, the image window and the tile.
+// One thread's image window and tile.
 struct Worker {
-  Worker(const MlookRadarGrid& grid, const MapGrid& map) : solver(grid, map) {}
-  MapToRadar solver;
   std::vector<float> window;
   std::vector<float> tile;
-  int exact = 0;
   bool failed = false;
 };
 
@@ -95,17 +92,18 @@ class Geocoder {
   Geocoder(const MlookRadarGrid& grid, const MapGrid& map, const ImageFile& image)
       : grid_(grid), map_(map), image_(image) {}
 
-  void solveNodes(Worker& w, Lattice& lattice, int firstRow, int step) {
-    for (int i = firstRow; i < lattice.rows; i += step)
+  // The orbit's inverse geometry reports through the process-wide call
+  // tree, so the nodes are solved on the calling thread only.
+  static int solveNodes(MapToRadar& solver, Lattice& lattice) {
+    for (int i = 0; i < lattice.rows; ++i)
       for (int j = 0; j < lattice.columns; ++j) {
         double line = NAN, column = NAN;
         const double row = (lattice.rowBase + i) * double{kLookupStep} + 0.5;
-        if (!w.solver.solve(row, j * double{kLookupStep} + 0.5, &line, &column))
-          line = column = NAN;
+        if (!solver.solve(row, j * double{kLookupStep} + 0.5, &line, &column)) line = column = NAN;
         lattice.line[lattice.at(i, j)] = line;
         lattice.column[lattice.at(i, j)] = column;
-        ++w.exact;
       }
+    return lattice.rows * lattice.columns;
   }
 
   // Resamples map rows r0..r1 and columns c0..c1 (exclusive ends) into the
@@ -182,10 +180,10 @@ class Geocoder {
         const double v = fc - j;
         const size_t a = lattice.at(i, j), b = a + 1, d = lattice.at(i + 1, j), e = d + 1;
         if (std::isnan(lattice.line[a] + lattice.line[b] + lattice.line[d] + lattice.line[e])) {
-          // A node without a solution: this pixel is solved exactly.
-          float value = kGeocodeNoData;
-          if (!exactly(w, r, c, any, wl0, wl1, wc0, wc1, ww, &value)) return false;
-          out[c - tileColumn0] = value;
+          // A node the orbit does not see lies far beyond the image in
+          // azimuth (the orbit reaches a fifth of the scene, and at least
+          // ten seconds, past either end): so does its cell.
+          out[c - tileColumn0] = kGeocodeNoData;
           continue;
         }
         const double line = (1 - u) * ((1 - v) * lattice.line[a] + v * lattice.line[b]) +
@@ -195,25 +193,6 @@ class Geocoder {
         out[c - tileColumn0] = sample(w.window.data(), wl0, wl1, wc0, wc1, ww, line, column);
       }
     }
-    return true;
-  }
-
-  // The value of map pixel (r, c) from its own exact solution, from the
-  // window when it covers the position, else read around it.
-  bool exactly(Worker& w, int r, int c, bool any, int wl0, int wl1, int wc0, int wc1, int ww,
-               float* value) {
-    double line = NAN, column = NAN;
-    ++w.exact;
-    if (!w.solver.solve(r + 0.5, c + 0.5, &line, &column) || !inside(line, column)) return true;
-    if (any && line >= wl0 && line <= wl1 && column >= wc0 && column <= wc1) {
-      *value = sample(w.window.data(), wl0, wl1, wc0, wc1, ww, line, column);
-      return true;
-    }
-    const int l = static_cast<int>(line), k = static_cast<int>(column);
-    const int l1 = std::min(l + 1, grid_.lines() - 1), k1 = std::min(k + 1, grid_.samples() - 1);
-    float around[4];
-    if (!image_.read(l, l1, k, k1, around)) return false;
-    *value = sample(around, l, l1, k, k1, k1 - k + 1, line, column);
     return true;
   }
 
@@ -274,11 +253,17 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
     *message = std::string("Cannot read the image ") + image + " with the size of its grid";
     VLR_FAIL(message->c_str(), vlr::kLibRead);
   }
+  MapToRadar solver(grid, map);
+  if (solver.open(orbit, message) != 0) VLR_FAIL(message->c_str(), vlr::kLibInconsistent);
   std::unique_ptr<Worker> workers[kThreads];
-  for (auto& w : workers) {
-    w.reset(new Worker(grid, map));
-    if (w->solver.open(orbit, message) != 0) VLR_FAIL(message->c_str(), vlr::kLibInconsistent);
-    w->tile.assign(static_cast<size_t>(kTile) * kTile, kGeocodeNoData);
+  try {
+    for (auto& w : workers) {
+      w.reset(new Worker);
+      w->tile.assign(static_cast<size_t>(kTile) * kTile, kGeocodeNoData);
+    }
+  } catch (const std::bad_alloc&) {
+    *message = "Cannot allocate the map tiles";
+    VLR_FAIL(message->c_str(), vlr::kLibAlloc);
   }
   CogWriter writer;
   if (!writer.create(output, map, kGeocodeNoData, kTile, message))
@@ -289,14 +274,14 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
   lattice.columns = (map.width - 1) / kLookupStep + 2;
   std::mutex writing;
   bool readFailed = false, writeFailed = false;
-  int valid = 0;
+  int valid = 0, exact = 0;
   for (int band = 0; band < map.height; band += kTile) {
     const int bandEnd = std::min(map.height, band + kTile);
     lattice.rowBase = band / kLookupStep;
     lattice.rows = (bandEnd - 1) / kLookupStep + 2 - lattice.rowBase;
     lattice.line.assign(static_cast<size_t>(lattice.rows) * lattice.columns, NAN);
     lattice.column.assign(lattice.line.size(), NAN);
-    OnTwoThreads([&](int t) { geocoder.solveNodes(*workers[t], lattice, t, kThreads); });
+    exact += Geocoder::solveNodes(solver, lattice);
     std::atomic<int> next{0};
     const int tiles = (map.width + kTile - 1) / kTile;
     OnTwoThreads([&](int t) {
@@ -345,7 +330,7 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
   errno = 0;
   if (!written) VLR_FAIL(message->c_str(), vlr::kLibWrite);
   if (figures != nullptr) {
-    figures->exactSolutions = workers[0]->exact + workers[1]->exact;
+    figures->exactSolutions = exact;
     figures->validPixels = valid;
   }
   return 0;

@@ -1,8 +1,9 @@
 // The exact inverse geometry of one map position: map coordinates to
 // longitude and latitude, to the Earth-fixed point at the grid's height, to
 // its zero-Doppler time and two-way range time through the orbit, and to a
-// line and column of the radar image.  One object per thread: it owns its
-// copy of the orbit and its transformation.
+// line and column of the radar image.  It owns its copy of the orbit and its
+// transformation.  The orbit reports through the process-wide call tree:
+// use it on one thread at a time.
 #pragma once
 
 #include <string>
