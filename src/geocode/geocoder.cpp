@@ -116,14 +116,10 @@ class Geocoder {
     const int j0 = c0 / kLookupStep;
     const int j1 = (c1 - 1) / kLookupStep + 1;
     double lmin = INFINITY, lmax = -INFINITY, cmin = INFINITY, cmax = -INFINITY;
-    bool holes = false;
     for (int i = i0; i <= i1; ++i)
       for (int j = j0; j <= j1; ++j) {
         const double l = lattice.line[lattice.at(i, j)], c = lattice.column[lattice.at(i, j)];
-        if (std::isnan(l)) {
-          holes = true;
-          continue;
-        }
+        if (std::isnan(l)) continue;
         lmin = std::min(lmin, l);
         lmax = std::max(lmax, l);
         cmin = std::min(cmin, c);
@@ -143,12 +139,11 @@ class Geocoder {
         std::fill_n(&w.tile[static_cast<size_t>(r - tileRow0) * tileWidth + (c0 - tileColumn0)],
                     c1 - c0, kGeocodeNoData);
     };
-    if (!holes && wl0 > wl1) {
+    if (wl0 > wl1 || wc0 > wc1) {
       nodata();
       return true;
     }
-    const bool any = wl0 <= wl1 && wc0 <= wc1;
-    const int64_t size = any ? int64_t{wl1 - wl0 + 1} * (wc1 - wc0 + 1) : 0;
+    const int64_t size = int64_t{wl1 - wl0 + 1} * (wc1 - wc0 + 1);
     if (size > kMaxWindow && (r1 - r0 > kLookupStep || c1 - c0 > kLookupStep)) {
       const int rm = r1 - r0 > kLookupStep ? r0 + (r1 - r0) / 2 / kLookupStep * kLookupStep : r1;
       const int cm = c1 - c0 > kLookupStep ? c0 + (c1 - c0) / 2 / kLookupStep * kLookupStep : c1;
@@ -166,7 +161,7 @@ class Geocoder {
     } catch (const std::bad_alloc&) {
       return false;
     }
-    if (any && !image_.read(wl0, wl1, wc0, wc1, w.window.data())) return false;
+    if (!image_.read(wl0, wl1, wc0, wc1, w.window.data())) return false;
     const int ww = wc1 - wc0 + 1;
     for (int r = r0; r < r1; ++r) {
       // Position of the pixel centre between the node rows.

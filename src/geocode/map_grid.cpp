@@ -70,9 +70,9 @@ int CheckGeocodeOptions(const GeocodeOptions& options, double groundStep, std::s
   }
   if (!(options.spacing >= 0.0) || !std::isfinite(options.spacing) ||
       (options.spacing == 0.0 && !(groundStep > 0.0)))
-    return Refuse("The map pixel spacing must be positive", message);
+    return Refuse("Map pixel spacing not positive", message);
   if (!std::isfinite(options.height) || std::fabs(options.height) > 10000.0)
-    return Refuse("The ground height must lie within 10 km of the ellipsoid", message);
+    return Refuse("Ground height beyond 10 km", message);
   return 0;
 }
 

@@ -25,16 +25,15 @@ SrsPtr SrsFromEpsg(int epsg, std::string* message) {
   // PROJ leaves its own error numbers in errno.
   errno = 0;
   if (err != OGRERR_NONE) {
-    *message = "EPSG code " + std::to_string(epsg) + " names no known reference system";
+    *message = "EPSG code " + std::to_string(epsg) + " is unknown";
     return nullptr;
   }
   if (!srs->IsProjected() && !srs->IsGeographic()) {
-    *message = "EPSG code " + std::to_string(epsg) + " is neither a projected nor a geographic " +
-               "reference system";
+    *message = "EPSG code " + std::to_string(epsg) + " is not a map";
     return nullptr;
   }
   if (srs->IsGeographic() && srs->GetAxesCount() != 2) {
-    *message = "EPSG code " + std::to_string(epsg) + " is not a two-dimensional reference system";
+    *message = "EPSG code " + std::to_string(epsg) + " is not a 2D map";
     return nullptr;
   }
   srs->SetAxisMappingStrategy(OAMS_TRADITIONAL_GIS_ORDER);

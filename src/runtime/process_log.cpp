@@ -12,6 +12,7 @@
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/progress.h"
 #include "runtime/raise.h"
 #include "runtime/suite_state.h"
 
@@ -96,6 +97,7 @@ void NVLR_UTILITY_SetProcessLabel(const char* title) {
     if (c == '\n') c = ' ';
   }
   suite().processLabel = label;
+  VlrNotifyProgressObserver(-1, title ? title : "");
 }
 
 const std::string& NVLR_UTILITY_ProcessLabel() {

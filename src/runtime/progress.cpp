@@ -20,6 +20,10 @@ namespace {
 constexpr const char* kModule = "vlr_generic_utility";
 constexpr int kMaxPercent = 99;
 
+// Not part of the suite state: it outlives the environment's
+// initialisation, which resets that state.
+VlrProgressObserver gObserver = nullptr;
+
 void traceStreamState(FILE* f, int attempt) {
   if (!NVLR_UTILITY_IsTraceOn()) return;
   std::string words = " File ";
@@ -71,5 +75,14 @@ int getAndSetPerc(int previous, int current, const char* message) {
   if (ftruncate(fileno(f), std::ftell(f)) != 0) {
   }
   std::fclose(f);
+  VlrNotifyProgressObserver(current, message);
   return 1;
+}
+
+void VlrSetProgressObserver(VlrProgressObserver observer) {
+  gObserver = observer;
+}
+
+void VlrNotifyProgressObserver(int percent, const char* title) {
+  if (gObserver != nullptr) gObserver(percent, title);
 }

@@ -483,8 +483,7 @@ TEST_F(MultilookCommand, GeocodedCopyOnlyWhenAsked) {
   parameters({{"Geocode", "1"}, {"MapEPSG", "99999"}});
   args[kRoot] = folder("badmap") + "R";
   const Outcome bad = runTool(args);
-  ExpectFailure(bad, 130560, "geocode(): EPSG code 99999",
-                "EPSG code 99999 names no known reference system");
+  ExpectFailure(bad, 130560, "geocode(): EPSG code 99999", "EPSG code 99999 is unknown");
   EXPECT_FALSE(Exists(args[kRoot] + "_gr"));
   EXPECT_FALSE(Exists(args[kRoot] + "_geo.tif"));
 }
