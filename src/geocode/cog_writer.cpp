@@ -13,6 +13,10 @@
 namespace {
 
 std::once_flag gRegistered;
+// GDAL's block cache unless the user set one: the map's blocks pass through
+// it on their way to the file, so it bounds the memory the writing takes
+// whatever the size of the map.
+constexpr GIntBig kCacheBytes = GIntBig{64} << 20;
 
 std::string LastGdalError(const char* what) {
   const char* text = CPLGetLastErrorMsg();
@@ -38,7 +42,10 @@ void CogWriter::discard() {
 
 bool CogWriter::create(const std::string& target, const MapGrid& map, float noData, int blockSize,
                        std::string* message) {
-  std::call_once(gRegistered, [] { GDALAllRegister(); });
+  std::call_once(gRegistered, [] {
+    GDALAllRegister();
+    if (CPLGetConfigOption("GDAL_CACHEMAX", nullptr) == nullptr) GDALSetCacheMax64(kCacheBytes);
+  });
   target_ = target;
   workName_ = target + ".work.tif";
   GDALDriver* gtiff = GetGDALDriverManager()->GetDriverByName("GTiff");

@@ -21,6 +21,7 @@
 #include "geocode/map_to_radar.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
+#include "runtime/progress.h"
 
 namespace {
 
@@ -33,6 +34,7 @@ static_assert(kTile % kLookupStep == 0, "bands start on lattice rows");
 // be larger is split into quarters.
 constexpr int64_t kMaxWindow = int64_t{4} << 20;
 constexpr int kThreads = 2;
+constexpr const char* kProgressTitle = "GEOCODING";
 
 // The multilook raster: float32 lines, nothing else.
 class ImageFile {
@@ -269,8 +271,12 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
   lattice.columns = (map.width - 1) / kLookupStep + 2;
   std::mutex writing;
   bool readFailed = false, writeFailed = false;
-  int valid = 0, exact = 0;
+  int valid = 0, exact = 0, percent = -1;
   for (int band = 0; band < map.height; band += kTile) {
+    // Progress for the host, which may also withdraw the run here.
+    const int now = static_cast<int>(int64_t{100} * band / map.height);
+    getAndSetPerc(percent, now, kProgressTitle);
+    percent = now;
     const int bandEnd = std::min(map.height, band + kTile);
     lattice.rowBase = band / kLookupStep;
     lattice.rows = (bandEnd - 1) / kLookupStep + 2 - lattice.rowBase;
