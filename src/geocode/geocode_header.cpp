@@ -46,6 +46,13 @@ void WriteGeocodedHeader(const char* image, const MapGrid& map, const char* targ
     SetText(header, "CartographicSystem.Hemisphere", map.epsg < 32700 ? "NORTH" : "SOUTH");
     SetText(header, "CartographicSystem.Projection", "UTM");
     SetText(header, "CartographicSystem.Zone", std::to_string(map.epsg % 100));
+    // The transverse Mercator of the zone.
+    SetNumber(header, "CartographicSystem.ProjectionDatumFalseEasting", 500000.0);
+    SetNumber(header, "CartographicSystem.ProjectionDatumFalseNorthing",
+              map.epsg < 32700 ? 0.0 : 10000000.0);
+    SetNumber(header, "CartographicSystem.CentralOfProjLongitude", -183.0 + 6.0 * (map.epsg % 100));
+    SetNumber(header, "CartographicSystem.CentralOfProjLatitude", 0.0);
+    SetNumber(header, "CartographicSystem.ScaleFactor", 0.9996);
   } else if (map.epsg == 4326) {
     SetText(header, "CartographicSystem.State", CVLR_STATE_GEO_GLOBAL);
     SetText(header, "CartographicSystem.Hemisphere", map.originY > 0.0 ? "NORTH" : "SOUTH");

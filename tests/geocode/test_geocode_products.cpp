@@ -382,7 +382,11 @@ TEST_F(GeocodeProducts, CloudOptimizedGeoTiffThatGdalPlaces) {
   // The suite header holds the map grid.
   const std::string sml = synth_test::read_text(g.path + ".sml");
   EXPECT_NE(sml.find("UTM-GLOBAL"), std::string::npos);
-  EXPECT_NE(sml.find(">" + std::to_string(zone % 100) + "<"), std::string::npos);
+  EXPECT_NE(sml.find("<Zone>" + std::to_string(zone % 100) + "</Zone>"), std::string::npos);
+  char meridian[96];
+  std::snprintf(meridian, sizeof meridian, "<CentralOfProjLongitude>%d</CentralOfProjLongitude>",
+                -183 + 6 * (zone % 100));
+  EXPECT_NE(sml.find(meridian), std::string::npos) << sml;
 }
 
 // The UTM zone holds the scene centre: south of the equator on a
