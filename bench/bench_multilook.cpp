@@ -2,8 +2,11 @@
 //
 //   bench_multilook import PRODUCT ORBIT XCA ROOT
 //       extraction of the five sub-swaths and their header conversion
-//   bench_multilook multilook ROOT XCA OUTPUT slant|ground
-//       the multilook as the driver runs it; prints the transform plan
+//   bench_multilook multilook ROOT XCA OUTPUT slant|ground [GEOCODED]
+//       the multilook as the driver runs it; prints the transform plan; with
+//       GEOCODED also the geocoding of its output into that COG, timed on
+//       its own ("geocode_seconds") with the peak memory it added
+//       ("geocode_peak_rss_mib", over "geocode_start_rss_mib")
 //   bench_multilook fft NFFT LOOKLEN LOOKS LINES [NFFT LOOKLEN LOOKS LINES ...]
 //       the same transforms alone: per line one forward transform of NFFT
 //       and LOOKS inverse transforms of LOOKLEN, lines split on two threads
@@ -22,6 +25,7 @@
 
 #include "convert/imagesar_kestova.h"
 #include "extraction/images.h"
+#include "geocode/geocode_header.h"
 #include "multilook/mlook.h"
 #include "runtime/ckerr.h"
 #include "runtime/environment.h"
@@ -55,6 +59,27 @@ bool Environment(const std::string& root) {
   return true;
 }
 
+// A figure of /proc/self/status ("VmRSS", "VmHWM"), MiB.
+double StatusMib(const char* key) {
+  std::FILE* f = std::fopen("/proc/self/status", "r");
+  if (f == nullptr) return -1.0;
+  char line[256];
+  double kib = -1.0;
+  const size_t n = std::strlen(key);
+  while (std::fgets(line, sizeof line, f) != nullptr)
+    if (std::strncmp(line, key, n) == 0 && line[n] == ':') kib = std::atof(line + n + 1);
+  std::fclose(f);
+  return kib / 1024.0;
+}
+
+// Starts the peak figure of VmHWM afresh (Linux).
+void ResetPeak() {
+  if (std::FILE* f = std::fopen("/proc/self/clear_refs", "w")) {
+    std::fputs("5", f);
+    std::fclose(f);
+  }
+}
+
 int Import(char** argv) {
   if (!Environment(argv[5])) return 2;
   images_conf conf;
@@ -69,7 +94,7 @@ int Import(char** argv) {
   return 0;
 }
 
-int Multilook(char** argv) {
+int Multilook(int argc, char** argv) {
   if (!Environment(argv[4])) return 2;
   mlook_conf conf;
   conf.W1 = 0.25;
@@ -91,6 +116,28 @@ int Multilook(char** argv) {
                 static_cast<long long>(ml.transformedLines(k)));
   std::printf("\n");
   PrintUsage();
+  if (argc > 6) {
+    MlookRadarGrid grid;
+    GeneralSAROrbit orbit;
+    if (ml.radarGrid(&grid) != 0 || ml.orbit()->clone(&orbit) != 0) return 1;
+    ml.freeimages();
+    ResetPeak();
+    const double startRss = StatusMib("VmRSS");
+    std::string message;
+    GeocodeFigures figures;
+    MapGrid map;
+    const auto geocodeStart = std::chrono::steady_clock::now();
+    if (GeocodeMultilook(argv[4], grid, orbit, GeocodeOptions(), conf.GrSamplingStep, argv[6],
+                         &message, &map, &figures) != 0) {
+      std::fprintf(stderr, "%s\n", message.c_str());
+      return 1;
+    }
+    std::printf("geocode_seconds %.3f\ngeocode_map %d %d\ngeocode_exact %d\n", Since(geocodeStart),
+                map.width, map.height, figures.exactSolutions);
+    std::printf("geocode_start_rss_mib %.1f\ngeocode_peak_rss_mib %.1f\n", startRss,
+                StatusMib("VmHWM"));
+    return 0;
+  }
   ml.freeimages();
   return 0;
 }
@@ -133,10 +180,11 @@ int Transforms(int argc, char** argv) {
 int main(int argc, char** argv) {
   const std::string mode = argc > 1 ? argv[1] : "";
   if (mode == "import" && argc == 6) return Import(argv);
-  if (mode == "multilook" && argc == 6) return Multilook(argv);
+  if (mode == "multilook" && (argc == 6 || argc == 7)) return Multilook(argc, argv);
   if (mode == "fft" && argc >= 6) return Transforms(argc, argv);
   std::fprintf(stderr,
                "usage: %s import PRODUCT ORBIT XCA ROOT | multilook ROOT XCA OUTPUT slant|ground "
+               "[GEOCODED] "
                "| fft NFFT LOOKLEN LOOKS LINES ...\n",
                argv[0]);
   return 2;

@@ -6,7 +6,10 @@
 #   - multilook: reading the converted sub-swaths, burst processing and
 #     recomposition, in slant and in ground range;
 #   - transforms alone: the forward and inverse transforms the multilook ran
-#     (same lengths, same line counts, two threads), without any I/O.
+#     (same lengths, same line counts, two threads), without any I/O;
+#   - geocoding of the ground-range output onto its UTM grid (Cloud Optimized
+#     GeoTIFF), in the same process as that multilook, with the memory it
+#     added.
 # Prints the times, the ratio of the multilook to its transforms and the
 # peak memory of each step.
 #
@@ -41,7 +44,7 @@ best() { awk -v a="$1" -v b="$2" 'BEGIN { print (b == "" || a < b) ? a : b }'; }
 # Rounds of every step, interleaved so that a slow spell of the machine
 # does not fall on one of them only; the best time of each counts.
 cat "$product" > /dev/null
-import_s=; slant_s=; ground_s=; fft_s=
+import_s=; slant_s=; ground_s=; fft_s=; geo_s=
 for round in 1 2 3; do
   "$build/bin/bench_multilook" import "$product" "$orbit" "$xca" "$work/R" > "$work/import.txt"
   import_s=$(best "$(value seconds "$work/import.txt")" "$import_s")
@@ -51,9 +54,11 @@ for round in 1 2 3; do
   slant_s=$(best "$(value seconds "$work/slant.txt")" "$slant_s")
   rm -f "$work/R_pwr"
   sync
-  "$build/bin/bench_multilook" multilook "$work/R" "$xca" "$work/R_gr" ground > "$work/ground.txt"
+  "$build/bin/bench_multilook" multilook "$work/R" "$xca" "$work/R_gr" ground "$work/R_geo.tif" \
+    > "$work/ground.txt"
   ground_s=$(best "$(value seconds "$work/ground.txt")" "$ground_s")
-  rm -f "$work/R_gr"
+  geo_s=$(best "$(value geocode_seconds "$work/ground.txt")" "$geo_s")
+  rm -f "$work/R_gr" "$work/R_geo.tif" "$work/R_geo.tif.sml"
   sync
   # shellcheck disable=SC2046
   "$build/bin/bench_multilook" fft $(value plan "$work/ground.txt") > "$work/fft.txt"
@@ -63,7 +68,9 @@ done
 awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
     -v s="$slant_s" -v sm="$(value peak_rss_mib "$work/slant.txt")" \
     -v g="$ground_s" -v gm="$(value peak_rss_mib "$work/ground.txt")" \
-    -v f="$fft_s" \
+    -v f="$fft_s" -v geo="$geo_s" -v map="$(value geocode_map "$work/ground.txt")" \
+    -v g0="$(value geocode_start_rss_mib "$work/ground.txt")" \
+    -v g1="$(value geocode_peak_rss_mib "$work/ground.txt")" \
     -v looks="$(value looks "$work/ground.txt")" -v d="$(value decimation "$work/ground.txt")" \
     -v gs="$(value samples "$work/ground.txt")" -v ss="$(value samples "$work/slant.txt")" \
     -v lines="$(value lines "$work/ground.txt")" -v plan="$(value plan "$work/ground.txt")" \
@@ -78,4 +85,6 @@ awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
   printf "%-40s %8.2f s  peak %7.1f MiB\n", "multilook, ground range", g, gm
   printf "%-40s %8.2f s\n", "the same transforms alone", f
   printf "multilook / transforms: slant %.2f, ground %.2f\n", s / f, g / f
+  printf "%-40s %8.2f s  peak %7.1f MiB (%.1f MiB at its start)\n", "geocoding of the ground-range output", geo, g1, g0
+  printf "map %s pixels; geocoding / ground-range multilook: %.2f\n", map, geo / g
 }'

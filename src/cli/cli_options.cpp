@@ -1,6 +1,7 @@
 #include "cli/cli_options.h"
 
 #include <cerrno>
+#include <cmath>
 #include <cstdlib>
 #include <functional>
 
@@ -113,6 +114,40 @@ const std::vector<OptionSpec>& multilookOptions() {
                    }
                    o.saturation = pct;
                    o.saturationGiven = true;
+                   return true;
+                 }});
+    v.push_back({"--geocode", nullptr, "EPSG",
+                 "also write OUTROOT_geo.tif, the amplitude geocoded onto a map (Cloud Optimized "
+                 "GeoTIFF): UTM in the zone of the scene centre, or the map of the EPSG code",
+                 [](Options& o, const std::string& s, std::string& e) {
+                   o.geocode = true;
+                   if (s.empty()) return true;
+                   char* end = nullptr;
+                   errno = 0;
+                   const long code = std::strtol(s.c_str(), &end, 10);
+                   if (*end != '\0' || errno != 0 || code < 1 || code > 999999) {
+                     e = "--geocode takes an EPSG code, not '" + s + "'";
+                     return false;
+                   }
+                   o.mapEpsg = static_cast<int>(code);
+                   return true;
+                 },
+                 [](const std::string& next) {
+                   return !next.empty() &&
+                          next.find_first_not_of("0123456789") == std::string::npos;
+                 }});
+    v.push_back({"--spacing", nullptr, "SPACING",
+                 "with --geocode: map pixel spacing in map units (metres, or degrees on a "
+                 "geographic map); default: the ground sampling step",
+                 [](Options& o, const std::string& s, std::string& e) {
+                   char* end = nullptr;
+                   errno = 0;
+                   const double v = std::strtod(s.c_str(), &end);
+                   if (s.empty() || *end != '\0' || errno != 0 || !(v > 0.0) || !std::isfinite(v)) {
+                     e = "--spacing needs a positive number, not '" + s + "'";
+                     return false;
+                   }
+                   o.mapSpacing = v;
                    return true;
                  }});
     v.insert(v.end(), commonOptions().begin(), commonOptions().end());
@@ -300,6 +335,10 @@ bool ParseCommandLine(int argc, const char* const* argv, Options& o, std::string
     }
     if (o.saturationGiven && !o.tiff) {
       error = "--saturation applies to the TIFF copy: add --tiff";
+      return false;
+    }
+    if (o.mapSpacing > 0.0 && !o.geocode) {
+      error = "--spacing applies to the geocoded copy: add --geocode";
       return false;
     }
   }

@@ -24,6 +24,12 @@ struct Options {
   bool tiff = false;
   double saturation = 0.0;  // 0: the export's own default
   bool saturationGiven = false;
+  // The geocoded copy OUTROOT_geo.tif: its map (an EPSG code; 0 for UTM in
+  // the zone of the scene centre) and pixel spacing (0: the ground sampling
+  // step).
+  bool geocode = false;
+  int mapEpsg = 0;
+  double mapSpacing = 0.0;
 };
 
 // Parses argv[1..] into options; false with a message in error for a

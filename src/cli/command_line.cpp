@@ -9,6 +9,7 @@
 #include <cstring>
 #include <ctime>
 #include <filesystem>
+#include <fstream>
 #include <string>
 #include <vector>
 
@@ -41,6 +42,8 @@ constexpr int kSubSwaths = 5;
 constexpr size_t kPathMax = 500;
 constexpr int kArguments = 14;
 constexpr const char* kNotOK = "NotOK";
+// The multilook parameter file of the installation.
+constexpr const char* kMultilookParameters = "parameters_multilook.hdr";
 
 // A failure found before the run starts: message, exit status.
 struct Failure {
@@ -136,10 +139,34 @@ bool chooseFromFolder(const std::string& dir, const std::string& type, double se
   return true;
 }
 
-// The description folder of a multilook with auxiliary files of its own:
-// the shipped description files, and an auxiliary list naming the two
-// chosen files.
-bool privateDescriptions(const RunFolder& run, const std::string& dataDes,
+// The shipped multilook parameters with the geocoded copy switched on: the
+// shipped "[Geocoding]" section is replaced by one with the command line's
+// map.
+bool geocodeParameters(const std::string& shipped, const Options& o, const std::string& path,
+                       std::string& error) {
+  std::ifstream in(shipped);
+  if (!in) {
+    error = "cannot read " + shipped;
+    return false;
+  }
+  std::string text, line;
+  bool inGeocoding = false;
+  while (std::getline(in, line)) {
+    if (!line.empty() && line[0] == '[') inGeocoding = line.rfind("[Geocoding]", 0) == 0;
+    if (!inGeocoding) text += line + "\n";
+  }
+  char section[160];
+  std::snprintf(section, sizeof section,
+                "\n[Geocoding]\nGeocode = 1\nMapEPSG = %d\nMapSpacing = %.17g\nGroundHeight = 0\n",
+                o.mapEpsg, o.mapSpacing);
+  return WriteTextFile(path, text + section, error);
+}
+
+// The description folder of a multilook with auxiliary files of its own
+// (when auxDir is set: the two chosen files and an auxiliary list naming
+// them) or with the geocoded copy (its own parameter file); everything else
+// is the shipped description files.
+bool privateDescriptions(const RunFolder& run, const std::string& dataDes, const Options& o,
                          const std::string& auxDir, const AuxFileName& xca, const AuxFileName& ins,
                          std::string& desDir, Failure& f) {
   desDir = run.path() + "des/";
@@ -149,11 +176,17 @@ bool privateDescriptions(const RunFolder& run, const std::string& dataDes,
     f.message = "cannot create " + desDir + ": " + ec.message();
     return false;
   }
+  const bool ownAux = !auxDir.empty();
   for (const fs::directory_entry& e : fs::directory_iterator(dataDes, ec)) {
     const std::string name = e.path().filename().string();
-    if (name == "ASA_AUX_list.dat" || name == xca.name || name == ins.name) continue;
+    if (ownAux && (name == "ASA_AUX_list.dat" || name == xca.name || name == ins.name)) continue;
+    if (o.geocode && name == kMultilookParameters) continue;
     fs::create_symlink(e.path(), desDir + name, ec);
   }
+  if (o.geocode && !geocodeParameters(dataDes + kMultilookParameters, o,
+                                      desDir + kMultilookParameters, f.message))
+    return false;
+  if (!ownAux) return true;
   std::string list;
   for (const AuxFileName* a : {&xca, &ins}) {
     fs::create_symlink(fs::path(auxDir) / a->name, desDir + a->name, ec);
@@ -374,8 +407,8 @@ int runCommand(const Options& o, const EntryDrivers& drivers) {
   RunFolder run;
   if (!run.create(fs::path(root).parent_path().string(), error)) return fail({error});
   std::string desDir = dataDir + "des/";
-  if (o.command == Command::Multilook && !aux.dir.empty() &&
-      !privateDescriptions(run, dataDir + "des/", aux.dir, aux.xca, aux.ins, desDir, f))
+  if (o.command == Command::Multilook && (!aux.dir.empty() || o.geocode) &&
+      !privateDescriptions(run, dataDir + "des/", o, aux.dir, aux.xca, aux.ins, desDir, f))
     return fail(f);
   if (!run.prepare(dataDir, desDir, HelperDir(), error)) return fail({error});
 

@@ -11,8 +11,10 @@
 #include "drivers/find_aux.h"
 #include "envisat/envisat_types.h"
 #include "extraction/images.h"
+#include "geocode/geocode_header.h"
 #include "multilook/mlook.h"
 #include "multilook/mlook_io.h"
+#include "profile/profile_par.h"
 #include "runtime/call_scope.h"
 #include "runtime/ckerr.h"
 #include "runtime/environment.h"
@@ -29,6 +31,10 @@ constexpr const char* kModule = "main_multilook_wss";
 constexpr const char* kTitle = "Multilooking ASA WSS";
 
 constexpr const char* kParameterFile = "parameters_multilook.hdr";
+// The optional map-projected copy of the output: section and keys of the
+// multilook parameter file.  Without "Geocode = 1" nothing is geocoded.
+constexpr const char* kGeocodeSection = "Geocoding";
+constexpr const char* kGeocodeSuffix = "_geo.tif";
 
 enum MultilookArgument : size_t {
   kProduct = 0,
@@ -67,6 +73,18 @@ int controlPoints(mlook& processor, std::vector<CVlrGroundControlPoint>* points)
     }
   }
   return 0;
+}
+
+// Whether the parameter file asks for the geocoded copy, and its options:
+// "Geocode" (0 or 1), "MapEPSG" (0: UTM of the scene centre), "MapSpacing"
+// (0: the ground sampling step), "GroundHeight" (m).
+bool geocodeRequested(const std::string& file, GeocodeOptions* options) {
+  int on = 0;
+  if (GetParInt(file.c_str(), "Geocode", 1, &on, 1, kGeocodeSection) != 0 || on != 1) return false;
+  GetParInt(file.c_str(), "MapEPSG", 1, &options->epsg, 1, kGeocodeSection);
+  GetParDouble(file.c_str(), "MapSpacing", 1, &options->spacing, 1, kGeocodeSection);
+  GetParDouble(file.c_str(), "GroundHeight", 1, &options->height, 1, kGeocodeSection);
+  return true;
 }
 
 }  // namespace
@@ -129,6 +147,13 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   mlook_output moutput;
   if (mconf.readpar(parameterFile.c_str()) != 0) stepFailed(__LINE__, "mlook conf readpar()");
   if (mconf.checkpar() != 0) stepFailed(__LINE__, "mlook conf checkpar()");
+  GeocodeOptions geocodeOptions;
+  const bool geocode = geocodeRequested(parameterFile, &geocodeOptions);
+  std::string geocodeMessage;
+  // Wrong map options are refused before the long multilook.
+  if (geocode && CheckGeocodeOptions(geocodeOptions, mconf.GrSamplingStep, &geocodeMessage) != 0)
+    stepFailed(__LINE__, ("geocode(): " + geocodeMessage).c_str());
+  errno = 0;
   // The command decides the geometry; the antenna correction stays off.
   const bool groundRange = DriverArgument(args, kGroundRange) == vlr::kOK;
   mconf.Sl2Gr = groundRange ? 1 : 0;
@@ -143,6 +168,8 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   }
   const bool tiff = DriverArgument(args, kTiff) == vlr::kOK;
   std::vector<CVlrGroundControlPoint> points;
+  MlookRadarGrid radarGrid;
+  GeneralSAROrbit imagingOrbit;
   {
     mlook processor(&mconf, &minput, &moutput);
     if (processor.readimages_kestova() != 0) stepFailed(__LINE__, "mlook readimages()");
@@ -156,6 +183,11 @@ int fvlr_main_multilook_wss(const char* argumentText) {
       processor.freeimages();
       stepFailed(__LINE__, "mlook writepar()");
     }
+    if (geocode && (processor.radarGrid(&radarGrid) != 0 || processor.orbit() == nullptr ||
+                    processor.orbit()->clone(&imagingOrbit) != 0)) {
+      processor.freeimages();
+      stepFailed(__LINE__, "geocode()");
+    }
     // Without an orbit position the TIFF simply carries no control points.
     if (tiff && controlPoints(processor, &points) != 0) points.clear();
     errno = 0;
@@ -165,6 +197,14 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   const std::string suiteHeader = output + "_hdr";
   if (writehdr_kestova(libraryHeader.c_str(), suiteHeader.c_str(), xcaPath.c_str(), 0) != 0)
     stepFailed(__LINE__, "writehdr kestova()");
+  if (geocode) {
+    NVLR_UTILITY_SetProcessLabel("Geocoding ...");
+    const std::string target = root + kGeocodeSuffix;
+    if (GeocodeMultilook(output.c_str(), radarGrid, imagingOrbit, geocodeOptions,
+                         mconf.GrSamplingStep, target.c_str(), &geocodeMessage) != 0)
+      stepFailed(__LINE__, ("geocode(): " + geocodeMessage).c_str());
+    errno = 0;
+  }
   exit_report();
 
   if (tiff) {

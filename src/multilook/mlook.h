@@ -18,6 +18,7 @@
 #include <vector>
 
 #include "multilook/mlook_io.h"
+#include "multilook/mlook_radar_grid.h"
 #include "runtime/call_scope.h"
 #include "sar_container/general_sar.h"
 
@@ -86,6 +87,11 @@ class mlook {
   // longitude on the ellipsoid.  Valid after run and before freeimages.
   int outputPixelTimes(double column, double row, double* azimuth, double* range);
   int geolocate(double column, double row, double* lat, double* lon);
+  // The radar geometry of the output image (its line times and the range
+  // time of its columns) and the orbit it was imaged from.  Valid after run
+  // and before freeimages.
+  int radarGrid(MlookRadarGrid* grid);
+  const GeneralSAROrbit* orbit() const { return headers_[0] ? &headers_[0]->orbit : nullptr; }
   // First composite sample of each sub-swath, as a two-way range time.
   double swathStartRangeTime(int k) const { return boundaryTime_[k]; }
   int lookLength(int k) const { return lookLength_[k]; }

@@ -94,6 +94,9 @@ TEST(CommandLineOptions, CommandLinesThatCannotRunAreRefusedWithTheReason) {
       {{"multilook", "p", "--orbit", "o", "--tiff", "--saturation", "0"}, "above 0"},
       {{"multilook", "p", "--orbit", "o", "--tiff", "--saturation=51"}, "at most 50"},
       {{"multilook", "p", "--orbit", "o", "--tiff=1"}, "takes no value"},
+      {{"multilook", "p", "--orbit", "o", "--geocode=utm"}, "EPSG code, not 'utm'"},
+      {{"multilook", "p", "--orbit", "o", "--geocode", "--spacing", "-75"}, "positive number"},
+      {{"multilook", "p", "--orbit", "o", "--spacing", "75"}, "add --geocode"},
       {{"export", "p"}, "unknown command 'export'"},
   };
   for (const auto& c : cases) {
@@ -106,11 +109,15 @@ TEST(CommandLineOptions, CommandLinesThatCannotRunAreRefusedWithTheReason) {
     EXPECT_NE(error.find(c.reason), std::string::npos) << error;
   }
 
-  const char* argv[] = {"import_wss", "multilook", "--slant", "--tiff",   "--saturation=2.5",
-                        "--orbit",    "orbit",     "--",      "-odd name"};
+  const char* argv[] = {"import_wss", "multilook", "--slant",   "--tiff", "--saturation=2.5",
+                        "--geocode",  "4326",      "--spacing", "0.001",  "--orbit",
+                        "orbit",      "--",        "-odd name"};
   vlr::cli::Options o;
   std::string error;
-  ASSERT_TRUE(vlr::cli::ParseCommandLine(9, argv, o, error)) << error;
+  ASSERT_TRUE(vlr::cli::ParseCommandLine(13, argv, o, error)) << error;
+  EXPECT_TRUE(o.geocode);
+  EXPECT_EQ(o.mapEpsg, 4326);
+  EXPECT_EQ(o.mapSpacing, 0.001);
   // Behind "--" a name that begins with '-' is the product.
   EXPECT_EQ(o.product, "-odd name");
   EXPECT_FALSE(o.groundRange);

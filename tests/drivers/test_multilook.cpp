@@ -514,6 +514,30 @@ TEST_F(MultilookCommand, AntennaFlagInTheParameterFileChangesNothing) {
       << "the antenna correction changed the image";
 }
 
+// The map-projected copy "<root>_geo.tif" is written only when the
+// parameter file asks for it; map options that cannot make a map end the
+// run before the multilook, with the reason in the error file.
+TEST_F(MultilookCommand, GeocodedCopyOnlyWhenAsked) {
+  ExpectSuccess(groundRun_, groundArgs_);
+  EXPECT_FALSE(Exists(groundArgs_[kRoot] + "_geo.tif"));
+  useAuxiliaryListOf(*vor_);
+  parameters({{"Geocode", "1"}});
+  std::vector<std::string> args = groundArgs_;
+  args[kRoot] = folder("geocoded") + "R";
+  ExpectSuccess(runTool(args), args);
+  EXPECT_TRUE(Exists(args[kRoot] + "_geo.tif"));
+  EXPECT_TRUE(Exists(args[kRoot] + "_geo.tif.sml"));
+  // The other outputs are those of a run without it.
+  EXPECT_TRUE(ReadFile(args[kRoot] + "_gr") == ReadFile(groundArgs_[kRoot] + "_gr"));
+
+  parameters({{"Geocode", "1"}, {"MapEPSG", "99999"}});
+  args[kRoot] = folder("badmap") + "R";
+  const Outcome bad = runTool(args);
+  ExpectFailure(bad, 130560, "geocode(): EPSG code 99999", "EPSG code 99999 is unknown");
+  EXPECT_FALSE(Exists(args[kRoot] + "_gr"));
+  EXPECT_FALSE(Exists(args[kRoot] + "_geo.tif"));
+}
+
 TEST_F(MultilookCommand, PreliminaryOrbitIsAccepted) {
   ExpectSuccess(porRun_, porArgs_);
   ExpectOutput(*por_, porArgs_[kRoot], true);

@@ -1,0 +1,35 @@
+// Writing a float32 map image as a Cloud Optimized GeoTIFF through GDAL:
+// blocks go into a tiled working GeoTIFF beside the target, which GDAL's COG
+// driver then copies into the target with DEFLATE compression, internal
+// tiles and overviews.  The working file is removed in every case.
+#pragma once
+
+#include <string>
+
+#include "geocode/map_grid.h"
+
+class GDALDataset;
+
+class CogWriter {
+ public:
+  CogWriter() = default;
+  ~CogWriter();
+  CogWriter(const CogWriter&) = delete;
+  CogWriter& operator=(const CogWriter&) = delete;
+
+  // Creates the working file for `target`.  False with *message.
+  bool create(const std::string& target, const MapGrid& map, float noData, int blockSize,
+              std::string* message);
+  // Writes a block of columns x rows values at (x, y).  Not thread-safe.
+  bool write(int x, int y, int columns, int rows, const float* values);
+  // Copies the working file into the target COG and removes the working
+  // file.  False with *message (no target is left behind then).
+  bool finish(std::string* message);
+
+ private:
+  void discard();
+
+  GDALDataset* work_ = nullptr;
+  std::string target_;
+  std::string workName_;
+};

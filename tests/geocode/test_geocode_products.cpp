@@ -1,0 +1,430 @@
+// Generated products multilooked and geocoded: the checkerboard's cell edges
+// and the point targets lie where the generator's geometry puts them on the
+// map (transformed by GDAL into the map the file states), the file is a
+// Cloud Optimized GeoTIFF that GDAL places by itself, the UTM zone fits the
+// scene, and the lattice of exact solutions stays close to the exact
+// mapping.
+#include <cpl_conv.h>
+#include <gdal_priv.h>
+#include <ogr_spatialref.h>
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "geocode/geocode_header.h"
+#include "geocode/map_to_radar.h"
+#include "mlook_fixture.h"
+
+namespace mlook_test {
+namespace {
+
+// Descending pass over the default real orbit; ascending over a circular
+// model orbit; descending above 77 N across the antimeridian.
+constexpr const char* kDescending = "--size small --pattern checkerboard --band-limit --seed 11";
+constexpr const char* kAscending =
+    "--size small --pattern checkerboard --band-limit --seed 12 --orbit kepler --pass ascending";
+constexpr const char* kArctic =
+    "--size small --pattern checkerboard --band-limit --seed 13 --start \"02-MAR-2008 00:11:00\"";
+constexpr const char* kPoints = "--size small --pattern points --band-limit --seed 14";
+// Descending in the southern hemisphere; across the border of UTM zones 55
+// and 56 (150 E).
+constexpr const char* kSouth = "--size tiny --seed 15 --start \"02-MAR-2008 00:46:02\"";
+constexpr const char* kZoneBorder = "--size tiny --seed 16 --start \"02-MAR-2008 00:21:13\"";
+
+// Profiles averaged across one edge of a cell: enough to beat the speckle.
+constexpr int kEdgePoints = 48;
+
+// A geocoded image as GDAL reads it.
+struct MapImage {
+  int width = 0, height = 0;
+  double gt[6] = {};
+  int epsg = 0;
+  std::vector<float> v;
+  double noData = NAN;
+  float at(int x, int y) const { return v[static_cast<size_t>(y) * width + x]; }
+  // Bilinear amplitude at pixel position (x, y) (pixel centres at +0.5);
+  // NaN where a neighbour has no data.
+  double sample(double x, double y) const {
+    const double fx = x - 0.5, fy = y - 0.5;
+    const int i = static_cast<int>(std::floor(fx)), j = static_cast<int>(std::floor(fy));
+    if (i < 0 || j < 0 || i + 1 >= width || j + 1 >= height) return NAN;
+    const double u = fx - i, w = fy - j;
+    const double a = at(i, j), b = at(i + 1, j), c = at(i, j + 1), d = at(i + 1, j + 1);
+    if (a == noData || b == noData || c == noData || d == noData) return NAN;
+    return (1 - w) * ((1 - u) * a + u * b) + w * ((1 - u) * c + u * d);
+  }
+};
+
+MapImage ReadMap(const std::string& path) {
+  GDALAllRegister();
+  MapImage m;
+  std::unique_ptr<GDALDataset> ds(static_cast<GDALDataset*>(GDALOpen(path.c_str(), GA_ReadOnly)));
+  if (!ds) {
+    ADD_FAILURE() << "GDAL cannot open " << path;
+    return m;
+  }
+  m.width = ds->GetRasterXSize();
+  m.height = ds->GetRasterYSize();
+  ds->GetGeoTransform(m.gt);
+  const OGRSpatialReference* srs = ds->GetSpatialRef();
+  if (srs != nullptr && srs->GetAuthorityCode(nullptr) != nullptr)
+    m.epsg = std::atoi(srs->GetAuthorityCode(nullptr));
+  int has = 0;
+  m.noData = ds->GetRasterBand(1)->GetNoDataValue(&has);
+  if (!has) m.noData = NAN;
+  m.v.resize(static_cast<size_t>(m.width) * m.height);
+  EXPECT_EQ(ds->GetRasterBand(1)->RasterIO(GF_Read, 0, 0, m.width, m.height, m.v.data(), m.width,
+                                           m.height, GDT_Float32, 0, 0, nullptr),
+            CE_None);
+  return m;
+}
+
+// WGS 84 longitude and latitude into pixel positions of the map image,
+// through the reference system GDAL reads from the file.
+class ToPixel {
+ public:
+  explicit ToPixel(const MapImage& m) : m_(m) {
+    OGRSpatialReference geo, map;
+    geo.importFromEPSG(4326);
+    geo.SetAxisMappingStrategy(OAMS_TRADITIONAL_GIS_ORDER);
+    map.importFromEPSG(m.epsg);
+    map.SetAxisMappingStrategy(OAMS_TRADITIONAL_GIS_ORDER);
+    ct_.reset(OGRCreateCoordinateTransformation(&geo, &map));
+  }
+  std::array<double, 2> operator()(double lon, double lat) const {
+    double x = lon, y = lat;
+    EXPECT_TRUE(ct_ && ct_->Transform(1, &x, &y));
+    return {(x - m_.gt[0]) / m_.gt[1], (y - m_.gt[3]) / m_.gt[5]};
+  }
+
+ private:
+  const MapImage& m_;
+  std::unique_ptr<OGRCoordinateTransformation> ct_;
+};
+
+struct Geocoded {
+  int code = -1;
+  std::string path, message;
+  MapGrid map;
+  MlookRadarGrid grid;
+  std::unique_ptr<GeneralSAROrbit> orbit;
+  MapImage image;
+};
+
+class GeocodeProducts : public MultilookTest {
+ protected:
+  // Multilooks the product as the driver does and geocodes the output.
+  Geocoded geocode(const Imported& p, const std::string& name, bool ground,
+                   GeocodeOptions options = {}) {
+    Geocoded g;
+    mlook_conf conf;
+    installedConfiguration(&conf);
+    conf.Sl2Gr = ground ? 1 : 0;
+    mlook_input input;
+    mlook_output output;
+    std::snprintf(input.Level1Filename, kMlookNameSize, "%s", p.root.c_str());
+    std::snprintf(input.ASA_XCA_Filename, kMlookNameSize, "%s", xca(p).c_str());
+    const std::string image = work(name);
+    std::snprintf(output.OutputFilename, kMlookNameSize, "%s", image.c_str());
+    g.orbit = std::make_unique<GeneralSAROrbit>();
+    {
+      mlook ml(&conf, &input, &output);
+      g.code = ml.readimages_kestova();
+      if (g.code == 0) g.code = ml.run();
+      if (g.code == 0) g.code = ml.radarGrid(&g.grid);
+      if (g.code == 0) g.code = ml.orbit()->clone(g.orbit.get());
+      ml.freeimages();
+    }
+    if (g.code != 0) return g;
+    g.path = work(name + "_geo.tif");
+    g.code = GeocodeMultilook(image.c_str(), g.grid, *g.orbit, options, conf.GrSamplingStep,
+                              g.path.c_str(), &g.message, &g.map);
+    if (g.code == 0) g.image = ReadMap(g.path);
+    return g;
+  }
+
+  // Where the profiles of the map image across a straight edge cross the
+  // level halfway (in amplitude) between its two sides: the offset along
+  // the normals, in map pixels, from the points where the truth puts the
+  // edge.  NaN when the profiles leave the data.
+  static double EdgeOffset(const MapImage& m, const std::vector<std::array<double, 2>>& points,
+                           const std::vector<std::array<double, 2>>& normals) {
+    constexpr int kReach = 32;  // quarter pixels
+    std::vector<double> profile(2 * kReach + 1, 0.0);
+    for (size_t k = 0; k < points.size(); ++k)
+      for (int s = -kReach; s <= kReach; ++s) {
+        const double a = m.sample(points[k][0] + 0.25 * s * normals[k][0],
+                                  points[k][1] + 0.25 * s * normals[k][1]);
+        if (std::isnan(a)) return NAN;
+        profile[static_cast<size_t>(s + kReach)] += a * a;
+      }
+    double low = 0.0, high = 0.0;
+    for (int s = 12; s <= kReach; ++s) {
+      low += profile[static_cast<size_t>(kReach - s)];
+      high += profile[static_cast<size_t>(kReach + s)];
+    }
+    const double level = std::pow(0.5 * (std::sqrt(low) + std::sqrt(high)), 2) / (kReach - 11);
+    double best = NAN;
+    for (int s = -12; s < 12; ++s) {
+      const double a = profile[static_cast<size_t>(s + kReach)] - level;
+      const double b = profile[static_cast<size_t>(s + kReach + 1)] - level;
+      if (a * b > 0.0 || a == b) continue;
+      const double x = 0.25 * (s + a / (a - b));
+      if (std::isnan(best) || std::fabs(x) < std::fabs(best)) best = x;
+    }
+    return best;
+  }
+
+  // Every cell edge of the checkerboard that lies within the image, away
+  // from its first and last lines, is within one map pixel of the truth;
+  // range edges are found in every sub-swath.
+  void CheckCheckerboard(const char* args, bool ground) {
+    const Imported& p = product(args);
+    const Geocoded g = geocode(p, ground ? "C_gr" : "C_pwr", ground);
+    ASSERT_EQ(g.code, 0) << g.message;
+    const MapImage& m = g.image;
+    const auto traj = trajectory(p);
+    const ToPixel toPixel(m);
+    const double t0 = p.number("Scene", "SensingStart");
+    const double span = p.number("Scene", "SensingStop") - t0;
+    const double near = p.swath(0, "NearRangeTime");
+    const double width = p.swath(4, "FarRangeTime") - near;
+    const double azCell = p.number("Pattern", "AzCell"), rgCell = p.number("Pattern", "RgCell");
+    // Map pixel position of scene coordinates (time from the start, range
+    // time from the near range).
+    auto at = [&](double daz, double drg) {
+      synth::GroundPoint gp;
+      EXPECT_TRUE(synth::zero_doppler_point(traj->at(t0 + daz), near + drg, &gp));
+      return toPixel(gp.geo.lon_deg, gp.geo.lat_deg);
+    };
+    auto edge = [&](bool range, double fixed, double from, double to) {
+      std::vector<std::array<double, 2>> points, normals;
+      for (int q = 0; q < kEdgePoints; ++q) {
+        const double along = from + (to - from) * q / (kEdgePoints - 1.0);
+        const double d = 0.1 * (range ? rgCell : azCell);
+        const auto a = range ? at(along, fixed - d) : at(fixed - d, along);
+        const auto b = range ? at(along, fixed + d) : at(fixed + d, along);
+        const double n = std::hypot(b[0] - a[0], b[1] - a[1]);
+        points.push_back(range ? at(along, fixed) : at(fixed, along));
+        normals.push_back({(b[0] - a[0]) / n, (b[1] - a[1]) / n});
+      }
+      return EdgeOffset(m, points, normals);
+    };
+    // The first and last seconds are covered by fewer bursts.
+    const double margin = 0.5;
+    int rangeEdges[kMlookSwaths] = {}, azimuthEdges = 0;
+    for (int a = 0; a * azCell < span; ++a) {
+      const double from = (a + 0.3) * azCell, to = (a + 0.7) * azCell;
+      if (from < margin || to > span - margin) continue;
+      for (int r = 1; r * rgCell < width; ++r) {
+        const double x = edge(true, r * rgCell, from, to);
+        if (std::isnan(x)) continue;
+        EXPECT_LE(std::fabs(x), 1.0) << "range edge " << r << " in azimuth cell " << a;
+        int swath = 0;
+        while (swath < 4 && near + r * rgCell > p.swath(swath + 1, "NearRangeTime")) ++swath;
+        ++rangeEdges[swath];
+      }
+    }
+    for (int r = 0; r * rgCell < width; ++r) {
+      const double from = (r + 0.3) * rgCell, to = std::min((r + 0.7) * rgCell, width);
+      for (int a = 1; a * azCell < span; ++a) {
+        if (a * azCell < margin + azCell * 0.2 || a * azCell > span - margin - azCell * 0.2)
+          continue;
+        const double x = edge(false, a * azCell, from, to);
+        if (std::isnan(x)) continue;
+        EXPECT_LE(std::fabs(x), 1.0) << "azimuth edge " << a << " in range cell " << r;
+        ++azimuthEdges;
+      }
+    }
+    for (int k = 0; k < kMlookSwaths; ++k) EXPECT_GT(rangeEdges[k], 0) << "sub-swath " << k + 1;
+    EXPECT_GT(azimuthEdges, 10);
+
+    // The lattice: line and column interpolated between exact solutions
+    // kLookupStep pixels apart stay within 0.05 image pixel of the exact
+    // solution, at the middle of lattice cells (where the error is largest).
+    MapToRadar exact(g.grid, g.map);
+    std::string message;
+    ASSERT_EQ(exact.open(*g.orbit, &message), 0) << message;
+    double worst = 0.0;
+    for (int i = 0; i + kLookupStep < g.map.height; i += 5 * kLookupStep)
+      for (int j = 0; j + kLookupStep < g.map.width; j += 3 * kLookupStep) {
+        double l[4], c[4], line = 0, column = 0;
+        bool ok = exact.solve(i + 0.5 + kLookupStep / 2, j + 0.5 + kLookupStep / 2, &line, &column);
+        for (int n = 0; n < 4; ++n)
+          ok = ok && exact.solve(i + 0.5 + (n / 2) * kLookupStep, j + 0.5 + (n % 2) * kLookupStep,
+                                 &l[n], &c[n]);
+        if (!ok || line < 0 || line > g.grid.lines() - 1 || column < 0 ||
+            column > g.grid.samples() - 1)
+          continue;
+        worst = std::max(worst, std::fabs((l[0] + l[1] + l[2] + l[3]) / 4 - line));
+        worst = std::max(worst, std::fabs((c[0] + c[1] + c[2] + c[3]) / 4 - column));
+      }
+    EXPECT_LT(worst, 0.05);
+    std::printf("lattice of %d pixels: largest error %.4f image pixel\n", kLookupStep, worst);
+  }
+};
+
+TEST_F(GeocodeProducts, CheckerboardDescendingRealOrbitGroundRange) {
+  CheckCheckerboard(kDescending, true);
+}
+
+TEST_F(GeocodeProducts, CheckerboardAscendingModelOrbitSlantRange) {
+  CheckCheckerboard(kAscending, false);
+}
+
+TEST_F(GeocodeProducts, CheckerboardAbove77NorthAcrossTheAntimeridian) {
+  CheckCheckerboard(kArctic, true);
+}
+
+// The bright points away from the image border have their centres of power
+// where the truth puts them: within one map pixel on average, and none
+// further than the multilook itself may displace a point (one of its lines,
+// 79 m here, on top of the map's own half pixel).
+TEST_F(GeocodeProducts, PointTargetsWhereTheTruthPutsThem) {
+  const Imported& p = product(kPoints);
+  const Geocoded g = geocode(p, "P_gr", true);
+  ASSERT_EQ(g.code, 0) << g.message;
+  const MapImage& m = g.image;
+  const ToPixel toPixel(m);
+  std::vector<double> all;
+  for (float v : m.v)
+    if (v != m.noData) all.push_back(double{v} * v);
+  std::nth_element(all.begin(), all.begin() + all.size() / 2, all.end());
+  const double background = all[all.size() / 2];
+  const int targets = static_cast<int>(p.number("Pattern", "Targets"));
+  int checked = 0;
+  double squares = 0.0;
+  for (int i = 0; i < targets; ++i) {
+    double daz = 0, drg = 0, lat = 0, lon = 0;
+    ASSERT_EQ(std::sscanf(text(p.run, "Pattern", "Target" + std::to_string(i)).c_str(),
+                          "%lf %lf %lf %lf", &daz, &drg, &lat, &lon),
+              4);
+    const auto e = toPixel(lon, lat);
+    const int x0 = static_cast<int>(e[0]), y0 = static_cast<int>(e[1]);
+    double sum = 0, sx = 0, sy = 0, peak = 0;
+    bool whole = true;
+    for (int y = y0 - 3; y <= y0 + 3; ++y)
+      for (int x = x0 - 3; x <= x0 + 3; ++x) {
+        if (x < 0 || y < 0 || x >= m.width || y >= m.height || m.at(x, y) == m.noData) {
+          whole = false;
+          continue;
+        }
+        const double pw = double{m.at(x, y)} * m.at(x, y);
+        const double w = std::max(0.0, pw - 2.0 * background);
+        peak = std::max(peak, pw);
+        sum += w;
+        sx += w * (x + 0.5);
+        sy += w * (y + 0.5);
+      }
+    // Targets on a sub-swath seam or at the image border may be dim.
+    if (!whole || peak < 4.0 * background) continue;
+    const double offset = std::hypot(sx / sum - e[0], sy / sum - e[1]);
+    EXPECT_LE(offset, 1.5) << "target " << i;
+    squares += offset * offset;
+    ++checked;
+  }
+  EXPECT_GE(checked, targets / 2);
+  EXPECT_LE(std::sqrt(squares / checked), 0.75);
+  std::printf("%d targets: rms offset %.3f map pixel\n", checked, std::sqrt(squares / checked));
+}
+
+// What gdalinfo reports of the file, and its placement by GDAL alone: the
+// scene centre of the truth has data, the map corners outside the swath
+// have none, and nothing is NaN.
+TEST_F(GeocodeProducts, CloudOptimizedGeoTiffThatGdalPlaces) {
+  const Imported& p = product(kDescending);
+  const Geocoded g = geocode(p, "G_gr", true);
+  ASSERT_EQ(g.code, 0) << g.message;
+  const std::string info = work("gdalinfo.txt");
+  ASSERT_EQ(synth_test::shell("gdalinfo '" + g.path + "' > '" + info + "'"), 0);
+  const std::string text = synth_test::read_text(info);
+  const double centreLon = p.swath(2, "CentreLon"), centreLat = p.swath(2, "CentreLat");
+  const int zone = UtmEpsg(centreLat, centreLon);
+  for (const std::string& expected :
+       {std::string("ID[\"EPSG\",") + std::to_string(zone) + "]]", std::string("LAYOUT=COG"),
+        std::string("COMPRESSION=DEFLATE"), std::string("Block=512x512 Type=Float32"),
+        std::string("NoData Value=0"), std::string("Overviews: "),
+        std::string("Pixel Size = (75.000000000000000,-75.000000000000000)")})
+    EXPECT_NE(text.find(expected), std::string::npos) << expected << "\n" << text;
+  char origin[128];
+  std::snprintf(origin, sizeof origin, "Origin = (%.15f,%.15f)", g.map.originX, g.map.originY);
+  EXPECT_NE(text.find(origin), std::string::npos) << origin << "\n" << text;
+
+  const MapImage& m = g.image;
+  auto valueAt = [&](double lon, double lat) {
+    const std::string out = work("location.txt");
+    char cmd[512];
+    std::snprintf(cmd, sizeof cmd, "gdallocationinfo -valonly -wgs84 '%s' %.7f %.7f > '%s'",
+                  g.path.c_str(), lon, lat, out.c_str());
+    EXPECT_EQ(synth_test::shell(cmd), 0);
+    return std::atof(synth_test::read_text(out).c_str());
+  };
+  EXPECT_GT(valueAt(centreLon, centreLat), 0.0);
+  for (int k = 0; k < kMlookSwaths; ++k)
+    EXPECT_GT(valueAt(p.swath(k, "CentreLon"), p.swath(k, "CentreLat")), 0.0) << k + 1;
+  size_t nan = 0, data = 0;
+  for (float v : m.v) {
+    nan += std::isnan(v) ? 1 : 0;
+    data += v != m.noData ? 1 : 0;
+  }
+  EXPECT_EQ(nan, 0u);
+  EXPECT_GT(data, m.v.size() / 2);
+  EXPECT_EQ(m.at(0, 0), m.noData);
+  EXPECT_EQ(m.at(m.width - 1, 0), m.noData);
+  EXPECT_EQ(m.at(0, m.height - 1), m.noData);
+  EXPECT_EQ(m.at(m.width - 1, m.height - 1), m.noData);
+
+  // The suite header holds the map grid.
+  const std::string sml = synth_test::read_text(g.path + ".sml");
+  EXPECT_NE(sml.find("UTM-GLOBAL"), std::string::npos);
+  EXPECT_NE(sml.find("<Zone>" + std::to_string(zone % 100) + "</Zone>"), std::string::npos);
+  char meridian[96];
+  std::snprintf(meridian, sizeof meridian, "<CentralOfProjLongitude>%d</CentralOfProjLongitude>",
+                -183 + 6 * (zone % 100));
+  EXPECT_NE(sml.find(meridian), std::string::npos) << sml;
+}
+
+// The UTM zone holds the scene centre: south of the equator on a
+// descending pass, and for a scene across a zone border (whose centre lies
+// just west of it).
+TEST_F(GeocodeProducts, SensibleUtmZone) {
+  struct Case {
+    const char* args;
+    int epsg;
+  } cases[] = {{kSouth, 32752}, {kZoneBorder, 32655}};
+  for (const Case& c : cases) {
+    const Imported& p = product(c.args);
+    const Geocoded g = geocode(p, "Z_gr", true);
+    ASSERT_EQ(g.code, 0) << g.message;
+    EXPECT_EQ(g.image.epsg, c.epsg) << c.args;
+    const double centralMeridian = -183.0 + 6.0 * (c.epsg % 100);
+    EXPECT_LE(std::fabs(p.swath(2, "CentreLon") - centralMeridian), 3.0) << c.args;
+  }
+  // The border scene does lie on both sides of 150 E.
+  const Imported& border = product(kZoneBorder);
+  EXPECT_LT(border.swath(4, "LastFarLon"), 150.0);
+  EXPECT_GT(border.swath(0, "FirstNearLon"), 150.0);
+}
+
+// A geographic map at a given spacing in degrees.
+TEST_F(GeocodeProducts, GeographicMap) {
+  const Imported& p = product(kSouth);
+  GeocodeOptions o;
+  o.epsg = 4326;
+  o.spacing = 0.001;
+  const Geocoded g = geocode(p, "W_gr", true, o);
+  ASSERT_EQ(g.code, 0) << g.message;
+  EXPECT_EQ(g.image.epsg, 4326);
+  EXPECT_DOUBLE_EQ(g.image.gt[1], 0.001);
+  const ToPixel toPixel(g.image);
+  const auto c = toPixel(p.swath(2, "CentreLon"), p.swath(2, "CentreLat"));
+  EXPECT_GT(g.image.at(static_cast<int>(c[0]), static_cast<int>(c[1])), 0.0f);
+}
+
+}  // namespace
+}  // namespace mlook_test
