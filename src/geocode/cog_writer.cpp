@@ -10,6 +10,8 @@
 
 #include <mutex>
 
+#include "runtime/run_outputs.h"
+
 namespace {
 
 std::once_flag gRegistered;
@@ -36,6 +38,7 @@ void CogWriter::discard() {
   }
   if (!workName_.empty()) {
     unlink(workName_.c_str());
+    VlrRunOutputRemoved(workName_.c_str());
     workName_.clear();
   }
 }
@@ -61,9 +64,11 @@ bool CogWriter::create(const std::string& target, const MapGrid& map, float noDa
   options.SetNameValue("BIGTIFF", "IF_SAFER");
   options.SetNameValue("SPARSE_OK", "TRUE");
   CPLErrorReset();
+  VlrRunOutputBegun(workName_.c_str());
   work_ = gtiff->Create(workName_.c_str(), map.width, map.height, 1, GDT_Float32, options.List());
   if (work_ == nullptr) {
     *message = LastGdalError(("Cannot create " + workName_).c_str());
+    VlrRunOutputRemoved(workName_.c_str());
     workName_.clear();
     return false;
   }
@@ -109,6 +114,7 @@ bool CogWriter::finish(std::string* message) {
   options.SetNameValue("NUM_THREADS", "2");
   options.SetNameValue("BIGTIFF", "IF_SAFER");
   unlink(target_.c_str());
+  VlrRunOutputBegun(target_.c_str());
   CPLErrorReset();
   GDALDataset* out =
       cog->CreateCopy(target_.c_str(), work_, FALSE, options.List(), nullptr, nullptr);
