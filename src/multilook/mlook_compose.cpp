@@ -178,7 +178,9 @@ int mlook::composeswaths() {
     spread[k] = static_cast<float>(r * r * r / 3.0);
   }
 
-  // Ground range: the axis at the middle of the output gives the width.
+  // Ground range: the ground width of the swath changes along the scene
+  // (the far edge moves by several samples over a long product), so the
+  // output is as wide as the widest line; shorter lines end in zeros.
   const bool ground = conf_->Sl2Gr != 0;
   GroundLine axis;
   GeneralSAR* headers[kMlookSwaths];
@@ -191,13 +193,27 @@ int mlook::composeswaths() {
       if (headers_[k]->polys.nsl2gr < 1) VLR_FAIL("NO SL2GR poly available", vlr::kLibMissing);
     if (!(conf_->GrSamplingStep > 0))
       VLR_FAIL("Ground sampling step not positive", vlr::kLibInconsistent);
-    axis.set(headers, boundaryTime, outputStartTime_ + 0.5 * (outputLines_ - 1) * lineInterval_);
-    const double far = axis.ground(rangeTime_[0] + (width - 1) * spacing);
+    const double farTime = rangeTime_[0] + (width - 1) * spacing;
+    double far = -1.0;
+    int widest = 0;
+    for (int line = 0; line < outputLines_; ++line) {
+      axis.set(headers, boundaryTime, outputStartTime_ + line * lineInterval_);
+      const double g = axis.ground(farTime);
+      if (!std::isfinite(g)) {
+        far = NAN;
+        break;
+      }
+      if (g > far) {
+        far = g;
+        widest = line;
+      }
+    }
     const double count = std::floor(far / conf_->GrSamplingStep + 1.0);
     if (!(count >= 1.0) || count > 16.0 * width)
       VLR_FAIL("Slant-to-ground polynomials give no ground range across the swath",
                vlr::kLibInconsistent);
     outputSamples_ = static_cast<int>(count);
+    axis.set(headers, boundaryTime, outputStartTime_ + widest * lineInterval_);
     outputFarRangeTime_ =
         axis.slant((outputSamples_ - 1) * conf_->GrSamplingStep, NAN, kNewtonTolerance / fs);
     const int phases = static_cast<int>(1.0f + 1.0f / kKernelStep);
@@ -289,9 +305,11 @@ int mlook::composeswaths() {
         const int j0 = j / kNodeStride * kNodeStride;
         const int j1 = std::min(j0 + kNodeStride, last);
         const double t1 = j1 == hi ? after : current[j1];
-        const double tau = j == j0 || j1 == j0
-                               ? current[j0]
-                               : current[j0] + (t1 - current[j0]) * (j - j0) / (j1 - j0);
+        double tau = j == j0 || j1 == j0 ? current[j0]
+                                         : current[j0] + (t1 - current[j0]) * (j - j0) / (j1 - j0);
+        // A node without a solution (beyond the polynomials' reach) must not
+        // take the samples between it and its neighbour with it.
+        if (!std::isfinite(tau)) tau = axis.slant(j * step, NAN, tolerance);
         const double x = (tau - first) / spacing;
         if (!(x >= -0.5 && x <= width - 0.5)) {
           out[j] = 0.0f;
