@@ -67,7 +67,7 @@ awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
     -v looks="$(value looks "$work/ground.txt")" -v d="$(value decimation "$work/ground.txt")" \
     -v gs="$(value samples "$work/ground.txt")" -v ss="$(value samples "$work/slant.txt")" \
     -v lines="$(value lines "$work/ground.txt")" -v plan="$(value plan "$work/ground.txt")" \
-    -v bytes="$(wc -c < "$product")" 'BEGIN {
+    -v bytes="$(wc -c < "$product")" -v err="$(value resampling_error "$work/ground.txt")" 'BEGIN {
   n = split(plan, p, " ")
   for (k = 1; k <= n; k += 4) transformed += p[k + 3]
   printf "product %.0f MB; %d range looks, decimation %d; %.0f lines transformed\n",
@@ -78,4 +78,5 @@ awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
   printf "%-40s %8.2f s  peak %7.1f MiB\n", "multilook, ground range", g, gm
   printf "%-40s %8.2f s\n", "the same transforms alone", f
   printf "multilook / transforms: slant %.2f, ground %.2f\n", s / f, g / f
+  printf "ground-range resampling times within %s composite samples of the exact ones\n", err
 }'

@@ -58,6 +58,7 @@ mlook::~mlook() {
 void mlook::release() {
   for (auto& h : headers_) h.reset();
   for (auto& t : burstTimes_) std::vector<double>().swap(t);
+  std::vector<double>().swap(gridTimes_);
 }
 
 int mlook::readimages() {
