@@ -160,19 +160,27 @@ void Bracket(int x, int last, int stride, int nodes, int* k, double* f) {
   if (k1 == *k) *f = 0.0;
 }
 
+// Whether the ground axis between two node times is not one smooth curve:
+// the nodes lie in different sub-swaths (the axis bends at their boundary)
+// or one of them has no solution.
 // Range time of output sample j of a line from the line's node times:
 // linear between the two nodes around it, except where the nodes lie in
 // different sub-swaths (the ground axis bends at their boundary) or have no
 // solution; there the sample is solved exactly.
+bool Bends(double t0, double t1, const GroundLine& axis) {
+  if (!std::isfinite(t0) || !std::isfinite(t1)) return true;
+  for (int i = 1; i < kMlookSwaths; ++i)
+    if ((t0 < axis.startTime[i]) != (t1 < axis.startTime[i])) return true;
+  return false;
+}
+
 double SampleTime(const double* nodes, int lastNode, int last, int j, const GroundLine& axis,
                   double step, double tolerance) {
   const int k = std::min(j / kNodeSamples, lastNode);
   const int k1 = std::min(k + 1, lastNode);
   const int j0 = k * kNodeSamples, j1 = std::min(k1 * kNodeSamples, last);
   const double t0 = nodes[k], t1 = nodes[k1];
-  bool exact = !std::isfinite(t0) || !std::isfinite(t1);
-  for (int i = 1; i < kMlookSwaths && !exact; ++i)
-    exact = (t0 < axis.startTime[i]) != (t1 < axis.startTime[i]);
+  const bool exact = Bends(t0, t1, axis);
   if (j == j0) return exact && !std::isfinite(t0) ? axis.slant(j * step, NAN, tolerance) : t0;
   const double tau = j1 > j0 ? t0 + (t1 - t0) * (j - j0) / (j1 - j0) : t0;
   if (!exact) return tau;
@@ -385,6 +393,7 @@ int mlook::composeswaths() {
     const double step = conf_->GrSamplingStep;
     const double first = rangeTime_[0];
     const float* table = kernels.data();
+    const double phaseScale = 1.0 / kKernelStep;
     // This line's range times at the grid's node columns, then between
     // them.  One thread: handing a line of this cheap work to the helper
     // costs more than the work.
@@ -393,16 +402,13 @@ int mlook::composeswaths() {
     const int last = count - 1;
     const double* nodes = lineNodes.data();
     const int lastNode = gridColumns_ - 1;
-    for (int j = 0; j < count; ++j) {
-      const double tau = SampleTime(nodes, lastNode, last, j, axis, step, tolerance);
-      const double x = (tau - first) / spacing;
-      if (!(x >= -0.5 && x <= width - 0.5)) {
-        out[j] = 0.0f;
-        continue;
-      }
+    // Composite sample x resampled: the kernel of x's phase around the
+    // nearest composite sample; 0 outside the composite line.
+    auto resample = [&](double x) -> float {
+      if (!(x >= -0.5 && x <= width - 0.5)) return 0.0f;
       // x >= -0.5 here, so truncation rounds to nearest.
       const int i0 = static_cast<int>(x + 0.5);
-      int phase = static_cast<int>((x - i0) / kKernelStep + 0.5 + phases / 2);
+      int phase = static_cast<int>((x - i0) * phaseScale + 0.5 + phases / 2);
       phase = std::min(std::max(phase, 0), phases - 1);
       const float* kernel = table + static_cast<size_t>(phase) * kKernelTaps;
       float sum = 0.0f;
@@ -410,8 +416,23 @@ int mlook::composeswaths() {
       for (int t = 0; t < kKernelTaps; ++t) sum += kernel[t] * around[t];
       // Kernel side lobes may undershoot next to dark samples; an
       // amplitude is never negative.
-      out[j] = std::max(sum, 0.0f);
+      return std::max(sum, 0.0f);
+    };
+    for (int k = 0; k < lastNode; ++k) {
+      const int j0 = k * kNodeSamples, j1 = std::min(j0 + kNodeSamples, last);
+      if (Bends(nodes[k], nodes[k + 1], axis)) {
+        for (int j = j0; j < j1; ++j)
+          out[j] = resample((SampleTime(nodes, lastNode, last, j, axis, step, tolerance) - first) /
+                            spacing);
+        continue;
+      }
+      // Linear in range time, so linear in composite position.
+      const double x0 = (nodes[k] - first) / spacing;
+      const double dx = ((nodes[k + 1] - first) / spacing - x0) / (j1 - j0);
+      for (int j = j0; j < j1; ++j) out[j] = resample(x0 + dx * (j - j0));
     }
+    out[last] = resample((SampleTime(nodes, lastNode, last, last, axis, step, tolerance) - first) /
+                         spacing);
     if (image.write(out, static_cast<int64_t>(outputSamples_) * sizeof(float)) != 0)
       VLR_FAIL("File writing failed!", vlr::kLibWrite);
   }
