@@ -163,10 +163,6 @@ void Bracket(int x, int last, int stride, int nodes, int* k, double* f) {
 // Whether the ground axis between two node times is not one smooth curve:
 // the nodes lie in different sub-swaths (the axis bends at their boundary)
 // or one of them has no solution.
-// Range time of output sample j of a line from the line's node times:
-// linear between the two nodes around it, except where the nodes lie in
-// different sub-swaths (the ground axis bends at their boundary) or have no
-// solution; there the sample is solved exactly.
 bool Bends(double t0, double t1, const GroundLine& axis) {
   if (!std::isfinite(t0) || !std::isfinite(t1)) return true;
   for (int i = 1; i < kMlookSwaths; ++i)
@@ -174,6 +170,9 @@ bool Bends(double t0, double t1, const GroundLine& axis) {
   return false;
 }
 
+// Range time of output sample j of a line from the line's node times:
+// linear between the two nodes around it, except where the axis bends
+// between them; there the sample is solved exactly.
 double SampleTime(const double* nodes, int lastNode, int last, int j, const GroundLine& axis,
                   double step, double tolerance) {
   const int k = std::min(j / kNodeSamples, lastNode);
