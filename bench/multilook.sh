@@ -74,7 +74,7 @@ awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
     -v looks="$(value looks "$work/ground.txt")" -v d="$(value decimation "$work/ground.txt")" \
     -v gs="$(value samples "$work/ground.txt")" -v ss="$(value samples "$work/slant.txt")" \
     -v lines="$(value lines "$work/ground.txt")" -v plan="$(value plan "$work/ground.txt")" \
-    -v bytes="$(wc -c < "$product")" 'BEGIN {
+    -v bytes="$(wc -c < "$product")" -v err="$(value resampling_error "$work/ground.txt")" 'BEGIN {
   n = split(plan, p, " ")
   for (k = 1; k <= n; k += 4) transformed += p[k + 3]
   printf "product %.0f MB; %d range looks, decimation %d; %.0f lines transformed\n",
@@ -87,4 +87,5 @@ awk -v i="$import_s" -v im="$(value peak_rss_mib "$work/import.txt")" \
   printf "multilook / transforms: slant %.2f, ground %.2f\n", s / f, g / f
   printf "%-40s %8.2f s  peak %7.1f MiB (%.1f MiB at its start)\n", "geocoding of the ground-range output", geo, g1, g0
   printf "map %s pixels; geocoding / ground-range multilook: %.2f\n", map, geo / g
+  printf "ground-range resampling times within %s composite samples of the exact ones\n", err
 }'

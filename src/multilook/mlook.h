@@ -92,6 +92,10 @@ class mlook {
   // and before freeimages.
   int radarGrid(MlookRadarGrid* grid);
   const GeneralSAROrbit* orbit() const { return headers_[0] ? &headers_[0]->orbit : nullptr; }
+  // Two-way range time from which the ground-range resampling took output
+  // sample `column` of line `line`.  Valid after a ground-range run and
+  // before freeimages; 0 or 1.
+  int resampledRangeTime(int column, int line, double* range) const;
   // First composite sample of each sub-swath, as a two-way range time.
   double swathStartRangeTime(int k) const { return boundaryTime_[k]; }
   int lookLength(int k) const { return lookLength_[k]; }
@@ -112,6 +116,8 @@ class mlook {
   int timing();
   int processswath(int k);
   int composeswaths();
+  int groundgrid();
+  void gridline(int line, double* nodes) const;
   int envi_beam_corr(int k, std::vector<float>* gain);
   void release();
 
@@ -150,6 +156,11 @@ class mlook {
   int outputSamples_ = 0;
   int compositeSamples_ = 0;
   double outputFarRangeTime_ = 0.0;  // range time of the last output sample
+  // Ground-range resampling: exact range times on a coarse grid of output
+  // samples and lines (rows of gridColumns_ nodes).
+  std::vector<double> gridTimes_;
+  int gridColumns_ = 0;
+  int gridRows_ = 0;
   int burstsDone_ = 0;
   int percentShown_ = -1;
   bool tempWritten_[kMlookSwaths] = {};

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <cmath>
+#include <cstring>
 #include <new>
 #include <string>
 
@@ -22,6 +23,8 @@ namespace {
 constexpr const char* kModule = "mlook_v2";
 // Bytes of the line prefix that hold the line's time record.
 constexpr int kLineTimeBytes = static_cast<int>(kMjdRecordSize);
+// Quality flag of the line prefix, after the time: -1 marks a blank line.
+constexpr int kQualityByte = 12;
 // Sub-swaths must share their line interval to this relative precision.
 constexpr double kLineIntervalTolerance = 1e-3;
 // Most output lines per raster line of the longest sub-swath: the bursts of
@@ -30,6 +33,18 @@ constexpr int kMaxOutputLinesPerInputLine = 4;
 
 bool Positive(double v) {
   return v > 0.0 && std::isfinite(v);
+}
+
+// The time of a line prefix of `bytes` bytes (the quality flag counts when
+// it is among them), or NaN for a blank line.
+double LineTime(const unsigned char* prefix, int bytes) {
+  if (bytes > kQualityByte && static_cast<signed char>(prefix[kQualityByte]) == -1) return NAN;
+  bool set = false;
+  for (int i = 0; i < kLineTimeBytes; ++i) set = set || prefix[i] != 0;
+  if (!set) return NAN;
+  MjdRecord record;
+  std::memcpy(record.bytes, prefix, kLineTimeBytes);
+  return mjd2sec85(record);
 }
 
 }  // namespace
@@ -44,6 +59,7 @@ mlook::~mlook() {
 void mlook::release() {
   for (auto& h : headers_) h.reset();
   for (auto& t : burstTimes_) std::vector<double>().swap(t);
+  std::vector<double>().swap(gridTimes_);
 }
 
 int mlook::readimages() {
@@ -153,38 +169,47 @@ int mlook::checkbursts() {
   return 0;
 }
 
-// Times of the first line of every burst of sub-swath k, from the line
-// prefixes of its raster.
+// Times of the first line of every burst of sub-swath k, on the burst
+// structure: record r is line r mod L of burst r / L, bursts one burst cycle
+// apart.  The structure is anchored at the first line that carries a time
+// (blank lines, quality -1 or an all-zero time, carry none, and products
+// may begin or end with them); without any, at the start time of the
+// sub-swath's header.
 int mlook::readbursttimes(int k, std::vector<double>* times) {
   VLR_SCOPE("readbursttimes", kModule);
-  DataFile data(headers_[k]->datafile.data);
   const mlook_swath_par& s = swathPar[k];
+  const DataFile& described = headers_[k]->datafile.data;
   try {
     times->assign(static_cast<size_t>(s.bursts), 0.0);
   } catch (const std::bad_alloc&) {
     VLR_FAIL("Cannot allocate the burst times", vlr::kLibAlloc);
   }
+  const int prefixBytes = described.row_prefix > kQualityByte ? kQualityByte + 1 : kLineTimeBytes;
+  DataFile data(described);
   VLR_CALL(data.open(DataFile::kOpenRead));
-  for (int b = 0; b < s.bursts; ++b) {
-    MjdRecord record;
-    int rc =
-        data.seek(data.line_offset(static_cast<int64_t>(b) * s.linesPerBurst), DataFile::kSeekSet);
-    if (rc == 0) rc = data.read(record.bytes, kLineTimeBytes);
+  double anchor = NAN;
+  for (int64_t r = 0; r < s.lines && std::isnan(anchor); ++r) {
+    unsigned char prefix[kQualityByte + 1] = {};
+    int rc = data.seek(data.line_offset(r), DataFile::kSeekSet);
+    if (rc == 0) rc = data.read(prefix, prefixBytes);
     if (rc != 0) {
       data.close();
       VLR_FAIL("File reading failed!", vlr::kLibRead);
     }
-    (*times)[static_cast<size_t>(b)] = mjd2sec85(record);
+    const double t = LineTime(prefix, prefixBytes);
+    if (std::isfinite(t))
+      anchor = t - static_cast<double>(r / s.linesPerBurst) * s.burstCycle -
+               static_cast<double>(r % s.linesPerBurst) * s.lineInterval;
   }
   data.close();
-  for (int b = 0; b < s.bursts; ++b) {
-    const double t = (*times)[static_cast<size_t>(b)];
-    if (!std::isfinite(t) || (b > 0 && !(t > (*times)[static_cast<size_t>(b) - 1])))
-      VLR_FAIL(NVLR_UTILITY_Format("Sub-swath %d: burst %d time is not after the previous burst",
-                                   k + 1, b + 1)
-                   .c_str(),
+  if (std::isnan(anchor)) {
+    anchor = headers_[k]->roi.roi.SlowStartTime;
+    if (!Positive(anchor))
+      VLR_FAIL(NVLR_UTILITY_Format("Sub-swath %d: no line time and no start time", k + 1).c_str(),
                vlr::kLibInconsistent);
   }
+  for (int b = 0; b < s.bursts; ++b)
+    (*times)[static_cast<size_t>(b)] = anchor + static_cast<double>(b) * s.burstCycle;
   return 0;
 }
 

@@ -353,12 +353,12 @@ Fields ExpectOutput(const SynthRun& run, const std::string& root, bool ground) {
 }
 
 // Ground range from the near edge of sub-swath 1 to the far edge of
-// sub-swath 5 at the first line of the scene.
-double SwathWidthOnGround(const SynthRun& run) {
+// sub-swath 5 at azimuth time t (by default the first line of the scene).
+double SwathWidthOnGround(const SynthRun& run, double t = NAN) {
   synth::DorisTrajectory orbit;
   std::string error;
   EXPECT_TRUE(orbit.load(run.dir + Truth(run, "Scene", "OrbitFile"), &error)) << error;
-  const synth::State s = orbit.at(TruthNumber(run, "Scene", "SensingStart"));
+  const synth::State s = orbit.at(std::isnan(t) ? TruthNumber(run, "Scene", "SensingStart") : t);
   const double near = TruthNumber(run, SubSwath(1), "NearRangeTime");
   const double far = TruthNumber(run, SubSwath(kSubSwaths), "FarRangeTime");
   constexpr int kPieces = 1000;
@@ -476,6 +476,80 @@ TEST_F(MultilookCommand, GroundRangeWhenAskedWhateverTheParameterFileSays) {
   // up to the far edge of the last.
   EXPECT_NEAR(Integer(f, "NrOfPixelsPerLine"), SwathWidthOnGround(*vor_) / kGroundStep + 1.0, 1.0);
   EXPECT_TRUE(Exists(groundArgs_[kRoot] + "_gr.tif"));
+}
+
+// The ground width of a long scene changes along it: on this descending
+// pass the far edge moves by about 5 m a second.  With a fine ground step,
+// and one look so that the composite keeps every input sample, that is
+// several output samples over the scene.  The output is as wide as the
+// widest line, and every line ends at its own far edge, the narrower ones
+// in zeros.
+TEST_F(MultilookCommand, GroundRangeKeepsTheFarEdgeOfEveryLine) {
+  constexpr double kFineStep = 10.0;  // m
+  constexpr long kMargin = 40;        // lines at either end that the burst taper darkens
+  const SynthRun run = synth_test::run_synth("--size small --bursts 90 --pass descending");
+  ASSERT_EQ(run.exit_code, 0);
+  parameters({{"GrSamplingStep", "10"}, {"GrResolution", "30"}});
+  std::vector<std::string> args = arguments(run, folder("long") + "R");
+  args[kGroundRange] = kOK;
+  useAuxiliaryListOf(run);
+  ExpectSuccess(runTool(args), args);
+  const std::string output = args[kRoot] + "_gr";
+  const Fields f = ReadSml(output + ".sml");
+  const long lines = Integer(f, "NrOfLinesPerImage");
+  const long samples = Integer(f, "NrOfPixelsPerLine");
+  ASSERT_GT(lines, 2 * kMargin);
+  const std::string image = ReadFile(output);
+  ASSERT_EQ(image.size(), static_cast<size_t>(lines * samples) * kFloatBytes);
+  // The last sample of a line that holds data.
+  auto lastData = [&](long line) {
+    for (long k = samples - 1; k >= 0; --k) {
+      float v = 0.0f;
+      std::memcpy(&v, image.data() + (line * samples + k) * kFloatBytes, kFloatBytes);
+      if (v != 0.0f) return k;
+    }
+    return -1L;
+  };
+  // The generator's far edge of a line, in output samples.
+  const double start = TruthNumber(run, "Scene", "SensingStart");
+  const double interval = TruthNumber(run, "Scene", "LineTimeInterval");
+  auto edge = [&](long line) {
+    return SwathWidthOnGround(run, start + line * interval) / kFineStep;
+  };
+  const double first = edge(0), last = edge(lines - 1);
+  ASSERT_GT(std::fabs(first - last), 8.0) << "the scene is too short to show the far edge move";
+  EXPECT_NEAR(samples, std::max(first, last) + 1.0, 1.5);
+  // Within about half an input sample of the last input sample's position.
+  for (const long line : {kMargin, lines / 2, lines - 1 - kMargin}) {
+    SCOPED_TRACE("line " + std::to_string(line));
+    EXPECT_NEAR(lastData(line), edge(line), 1.5);
+  }
+  synth_test::remove_run(run);
+}
+
+// Products that begin and end with blank records, their time fields zero or
+// nominal, multilook onto the same grid as the product without them.
+TEST_F(MultilookCommand, BlankRecordsAtEitherEndMultilook) {
+  ASSERT_EQ(groundRun_.status, 0);
+  const Fields plain = ReadSml(groundArgs_[kRoot] + "_gr.sml");
+  for (const bool zero : {false, true}) {
+    SCOPED_TRACE(zero ? "zero times" : "nominal times");
+    // The whole first burst and the first line of the last one are blank.
+    const SynthRun run =
+        synth_test::run_synth(std::string("--size tiny --pass descending --blank-start 60 "
+                                          "--blank-end 60") +
+                              (zero ? " --blank-zero-time" : ""));
+    ASSERT_EQ(run.exit_code, 0);
+    std::vector<std::string> args =
+        arguments(run, folder(zero ? "blank_zero" : "blank_nominal") + "R");
+    args[kGroundRange] = kOK;
+    useAuxiliaryListOf(run);
+    ExpectSuccess(runTool(args), args);
+    const Fields f = ExpectOutput(run, args[kRoot], true);
+    EXPECT_EQ(Field(f, "NrOfLinesPerImage"), Field(plain, "NrOfLinesPerImage"));
+    EXPECT_EQ(Field(f, "NrOfPixelsPerLine"), Field(plain, "NrOfPixelsPerLine"));
+    synth_test::remove_run(run);
+  }
 }
 
 TEST_F(MultilookCommand, SlantRangeWithoutTiffUnlessExactlyOK) {

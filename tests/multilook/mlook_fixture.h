@@ -117,8 +117,10 @@ class MultilookTest : public vlr_test::SuiteTest {
 
   // Multilooks `p` into "<working>name" as the driver does; `edit` may
   // change the blocks first.
+  // `inspect` sees the processor after a successful run.
   Output multilook(const Imported& p, const std::string& name, bool ground,
-                   const std::function<void(mlook_conf&, mlook_input&)>& edit = nullptr) {
+                   const std::function<void(mlook_conf&, mlook_input&)>& edit = nullptr,
+                   const std::function<void(mlook&)>& inspect = nullptr) {
     Output out;
     mlook_conf conf;
     installedConfiguration(&conf);
@@ -135,6 +137,7 @@ class MultilookTest : public vlr_test::SuiteTest {
       mlook ml(&conf, &input, &output);
       out.code = ml.readimages_kestova();
       if (out.code == 0) out.code = ml.run();
+      if (out.code == 0 && inspect) inspect(ml);
       if (out.code == 0) out.code = ml.writepar();
       const int freed = ml.freeimages();
       if (out.code == 0) out.code = freed;

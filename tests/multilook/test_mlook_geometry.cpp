@@ -171,6 +171,28 @@ class MultilookGeometry : public MultilookTest {
   }
 };
 
+// The ground-range resampling interpolates its range times between exact
+// solutions on a coarse grid: every output sample within a hundredth of a
+// composite sample of the exact ground-to-slant solution at its line.
+TEST_F(MultilookGeometry, ResamplingTimesMatchTheExactSolution) {
+  const Imported& p = product(kChecker);
+  double worst = -1.0;
+  const Output o = multilook(p, "R_gr", true, nullptr, [&](mlook& ml) {
+    const double composite = ml.decimation() / ml.fs;
+    for (int line = 0; line < ml.outputLines(); line += 3) {
+      for (int column = 0; column < ml.outputSamples(); ++column) {
+        double az = 0.0, exact = 0.0, used = 0.0;
+        ASSERT_EQ(ml.outputPixelTimes(column, line, &az, &exact), 0);
+        ASSERT_EQ(ml.resampledRangeTime(column, line, &used), 0);
+        worst = std::max(worst, std::fabs(used - exact) / composite);
+      }
+    }
+  });
+  ASSERT_EQ(o.code, 0);
+  EXPECT_GE(worst, 0.0);
+  EXPECT_LT(worst, 0.01);
+}
+
 TEST_F(MultilookGeometry, CheckerboardInSlantRange) {
   CheckCheckerboard(false);
 }

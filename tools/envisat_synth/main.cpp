@@ -57,6 +57,8 @@ const char* kHelp =
     "                       uniform: every sample the same expected power (no burst taper)\n"
     "  --band-limit         range spectrum of every line limited to the sub-swath's chirp\n"
     "                       bandwidth (exact for the flat and uniform patterns)\n"
+    "  --bursts N           WSS: N bursts per sub-swath instead of those of the size\n"
+    "                       (a longer or shorter scene of the same width)\n"
     "  --first-tie-sample N sample number of the first tie point of the geolocation grid\n"
     "                       (default 1)\n"
     "defects:\n"
@@ -144,6 +146,8 @@ int main(int argc, char** argv) {
         o.blank_first = static_cast<int>(n);
       else if ((a == "--blank-end" || a == "--blank-last") && n >= 0 && n <= 10000000)
         o.blank_last = static_cast<int>(n);
+      else if (a == "--bursts" && n >= 1 && n <= 5000)
+        o.bursts = static_cast<int>(n);
       else if (a == "--first-tie-sample" && n >= 1 && n <= 100000)
         o.first_tie_sample = static_cast<int>(n);
       else if (a == "--mds-count" && n >= 0 && n <= 5)

@@ -352,6 +352,7 @@ bool build_scene(const Options& opt, Scene* s, std::string* error) {
     *error = "unknown size '" + opt.size + "' (tiny, small, realistic)";
     return false;
   }
+  if (opt.bursts > 0) plan.bursts = opt.bursts;
   if (opt.polarisation != "HH" && opt.polarisation != "VV") {
     *error = "polarisation must be HH or VV";
     return false;

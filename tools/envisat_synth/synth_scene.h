@@ -32,6 +32,7 @@ struct Options {
   std::string pattern = "checkerboard";  // flat, checkerboard, points, uniform
   bool band_limit = false;   // range spectrum limited to the sub-swath's chirp bandwidth
   int first_tie_sample = 1;  // sample number of the first tie point of every grid line
+  int bursts = 0;            // WSS: bursts per sub-swath; 0: those of the size
   // Defects.
   int blank_first = 0, blank_last = 0;
   bool blank_zero_time = false;  // blank records carry zero time fields
