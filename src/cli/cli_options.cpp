@@ -11,7 +11,7 @@ namespace {
 
 // One option of a subcommand.  A new option is one more row in the table of
 // its subcommand: the parser and the help text both read it from there.
-struct OptionSpec {
+struct OptionRow {
   const char* name;       // "--orbit"
   const char* shortName;  // "-o" or nullptr
   const char* value;      // name of its value in the help, nullptr for a switch
@@ -33,8 +33,8 @@ bool setPath(std::string& field, const std::string& value, const char* what, std
   return true;
 }
 
-const std::vector<OptionSpec>& commonOptions() {
-  static const std::vector<OptionSpec> options = {
+const std::vector<OptionRow>& commonOptions() {
+  static const std::vector<OptionRow> options = {
       {"--output", "-o", "OUTROOT",
        "output root name; default: the product name without its extension, in the current folder",
        [](Options& o, const std::string& v, std::string& e) {
@@ -56,9 +56,9 @@ const std::vector<OptionSpec>& commonOptions() {
   return options;
 }
 
-const std::vector<OptionSpec>& importOptions() {
-  static const std::vector<OptionSpec> options = [] {
-    std::vector<OptionSpec> v;
+const std::vector<OptionRow>& importOptions() {
+  static const std::vector<OptionRow> options = [] {
+    std::vector<OptionRow> v;
     v.push_back({"--orbit", nullptr, "FILE",
                  "DORIS orbit file (DOR_VOR or DOR_POR); without it the import has no state "
                  "vectors and no corners",
@@ -79,9 +79,9 @@ const std::vector<OptionSpec>& importOptions() {
   return options;
 }
 
-const std::vector<OptionSpec>& multilookOptions() {
-  static const std::vector<OptionSpec> options = [] {
-    std::vector<OptionSpec> v;
+const std::vector<OptionRow>& multilookOptions() {
+  static const std::vector<OptionRow> options = [] {
+    std::vector<OptionRow> v;
     v.push_back({"--orbit", nullptr, "FILE", "DORIS orbit file (DOR_VOR or DOR_POR); required",
                  [](Options& o, const std::string& s, std::string& e) {
                    return setPath(o.orbit, s, "the orbit file", e);
@@ -156,12 +156,12 @@ const std::vector<OptionSpec>& multilookOptions() {
   return options;
 }
 
-const std::vector<OptionSpec>& optionsOf(Command c) {
+const std::vector<OptionRow>& optionsOf(Command c) {
   return c == Command::Import ? importOptions() : multilookOptions();
 }
 
-const OptionSpec* findOption(Command c, const std::string& name) {
-  for (const OptionSpec& s : optionsOf(c)) {
+const OptionRow* findOption(Command c, const std::string& name) {
+  for (const OptionRow& s : optionsOf(c)) {
     if (name == s.name || (s.shortName != nullptr && name == s.shortName)) return &s;
   }
   return nullptr;
@@ -189,7 +189,7 @@ std::string wrapped(const std::string& text, const std::string& indent) {
 
 std::string optionHelp(Command c) {
   std::string text;
-  for (const OptionSpec& s : optionsOf(c)) {
+  for (const OptionRow& s : optionsOf(c)) {
     std::string head = "  ";
     if (s.shortName) head += std::string(s.shortName) + ", ";
     head += s.name;
@@ -300,7 +300,7 @@ bool ParseCommandLine(int argc, const char* const* argv, Options& o, std::string
       arg.resize(eq);
       inlineValue = true;
     }
-    const OptionSpec* spec = findOption(o.command, arg);
+    const OptionRow* spec = findOption(o.command, arg);
     if (spec == nullptr) {
       error = "unknown option '" + arg + "' for '" + word + "'";
       return false;
