@@ -15,6 +15,7 @@
 #include "extraction/geolocation_polys.h"
 #include "extraction/product_file.h"
 #include "extraction/product_kind.h"
+#include "metadata_framework/tessal_xml.h"
 #include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/geo_coords.h"
@@ -259,6 +260,9 @@ int images::processImage(Run& r, int k) {
   VLR_CALL(prepareOutputNames(k, &im));
   VLR_REPORT(NVLR_UTILITY_Format("Writing Header file: %s\n", im.hdr).c_str(), ARE_CHECKPOINT);
 
+  // The sections are gathered in memory and the header written once, whole;
+  // a step that fails leaves no header behind.
+  HeldXmlDocument header(im.hdr);
   // The data-set information is written after the orbit step, which adds
   // the scene heading.
   DataSetInfo_Obj info;
@@ -275,6 +279,7 @@ int images::processImage(Run& r, int k) {
   VLR_CALL(writeAttitude(r, im));
   VLR_CALL(writeElevationPattern(r, k, im.hdr));
   VLR_CALL(writePulse(im));
+  VLR_CALL(header.save());
   return 0;
 }
 
