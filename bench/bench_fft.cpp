@@ -22,6 +22,11 @@
 
 namespace {
 
+// Direction codes of the tables below: 1 forward, -1 and -2 backward, 0 none.
+FftDirection Dir(int code) {
+  return static_cast<FftDirection>(code);
+}
+
 struct Batch {
   const char* name;
   int rowStride, rowLen, rows, colLen, rowDir, colDir;
@@ -50,9 +55,10 @@ int Time(const Batch& b, int repeats, size_t misalign) {
   fcomplex* base = data.data() + misalign;
   fft_plan_c whole, half;
   const bool rowsSplit = b.rowDir != 0;
-  if (fft_makep_c(&whole, b.rowStride, b.rowLen, b.rows, b.colLen, b.rowDir, b.colDir, 1) != 0 ||
+  if (fft_makep_c(&whole, b.rowStride, b.rowLen, b.rows, b.colLen, Dir(b.rowDir), Dir(b.colDir),
+                  1) != 0 ||
       fft_makep_c(&half, b.rowStride, rowsSplit ? b.rowLen : b.rowLen / 2, b.rows,
-                  rowsSplit ? b.colLen / 2 : b.colLen, b.rowDir, b.colDir, 1) != 0) {
+                  rowsSplit ? b.colLen / 2 : b.colLen, Dir(b.rowDir), Dir(b.colDir), 1) != 0) {
     std::fprintf(stderr, "planning failed for %s\n", b.name);
     return 1;
   }

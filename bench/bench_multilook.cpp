@@ -168,8 +168,9 @@ int Transforms(int argc, char** argv) {
     const int nfft = std::atoi(argv[a]), m = std::atoi(argv[a + 1]), looks = std::atoi(argv[a + 2]);
     const long long lines = std::atoll(argv[a + 3]);
     fft_plan_c forward, inverse;
-    if (fft_makep_c(&forward, nfft, nfft, 1, 1, 1, 0, 1) != 0 ||
-        fft_makep_c(&inverse, m, m, 1, 1, -2, 0, 1) != 0)
+    if (fft_makep_c(&forward, nfft, nfft, 1, 1, FftDirection::kForward, FftDirection::kNone, 1) !=
+            0 ||
+        fft_makep_c(&inverse, m, m, 1, 1, FftDirection::kBackward, FftDirection::kNone, 1) != 0)
       return 1;
     std::vector<fcomplex> rows[2], look[2];
     for (int t = 0; t < 2; ++t) {

@@ -24,6 +24,7 @@
 #include "convert/imagesar_kestova_internal.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
+#include "runtime/file_handle.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
@@ -46,27 +47,6 @@ constexpr long kMaxSphSize = 6099;
 // Section line that opens the text-form header (20 bytes).
 constexpr const char kSectionLine[] = "\n[EnvisatFixHeader]\n";
 constexpr const char* kTemporarySuffixes[] = {"_tmp1_hdr", "_tmp2_hdr"};
-
-// Closes a stream on every return path.
-class File {
- public:
-  File(const char* name, const char* mode) : f_(std::fopen(name, mode)) {}
-  ~File() {
-    if (f_ != nullptr) std::fclose(f_);
-  }
-  File(const File&) = delete;
-  File& operator=(const File&) = delete;
-  FILE* get() const { return f_; }
-  // Closes now; false when the close (the final flush) fails.
-  bool close() {
-    FILE* f = f_;
-    f_ = nullptr;
-    return f == nullptr || std::fclose(f) == 0;
-  }
-
- private:
-  FILE* f_;
-};
 
 // Removes the temporary headers when the carry ends, however it ends.
 class TemporaryFiles {
@@ -120,7 +100,7 @@ int ReadBlock(FILE* f, std::vector<char>* block) {
 int WriteTemporaryHeader(const std::string& name, const std::vector<char>& mph,
                          const std::vector<char>& sph) {
   VLR_SCOPE("WriteTemporaryHeader", kModule);
-  File out(name.c_str(), "wb");
+  FileHandle out(name.c_str(), "wb");
   if (out.get() == nullptr) {
     errno = 0;
     VLR_FAIL("File not opened!", vlr::kLibOpen);
@@ -158,7 +138,7 @@ int CarryEnvisatFixHeader(CDescriptionHeader& header, CDescriptionHeader& fixed,
                           const char* suiteHeader, const char* aux) {
   VLR_SCOPE("CarryEnvisatFixHeader", kModule);
   if (aux == nullptr || aux[0] == '\0') VLR_FAIL("File not opened!", vlr::kLibOpen);
-  File in(aux, "rb");
+  FileHandle in(aux, "rb");
   if (in.get() == nullptr) {
     errno = 0;
     VLR_FAIL("File not opened!", vlr::kLibOpen);

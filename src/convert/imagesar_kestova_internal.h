@@ -4,15 +4,14 @@
 #include <string>
 #include <vector>
 
+#include "runtime/light_speed.h"
+
 class CDescriptionHeader;
 class GeneralSAR;
 
 namespace kestova {
 
 constexpr const char* kModule = "imagesar_kestova";
-// Two-way range delay (s) to slant range (m): half the speed of light.
-constexpr double kHalfSpeedOfLight = 149896229.0;
-constexpr double kSpeedOfLight = 299792458.0;
 // Swath text of a product composed from the five sub-swaths.
 constexpr const char* kComposedSwath = "ALL";
 // Section of the suite header that holds the ENVISAT fixed headers.

@@ -156,7 +156,7 @@ int fvlr_main_multilook_wss(const char* argumentText) {
   errno = 0;
   // The command decides the geometry; the antenna correction stays off.
   const bool groundRange = DriverArgument(args, kGroundRange) == vlr::kOK;
-  mconf.Sl2Gr = groundRange ? 1 : 0;
+  mconf.setGeometry(groundRange ? OutputGeometry::kGroundRange : OutputGeometry::kSlantRange);
   mconf.RgAnt_flag = 0;
   const std::string output = root + (groundRange ? "_gr" : "_pwr");
   minput.BurstsToSkip = 0;

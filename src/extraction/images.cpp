@@ -15,6 +15,7 @@
 #include "extraction/geolocation_polys.h"
 #include "extraction/product_file.h"
 #include "extraction/product_kind.h"
+#include "metadata_framework/tessal_xml.h"
 #include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/geo_coords.h"
@@ -32,14 +33,14 @@
 #include "raster/data_file.h"
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
+#include "runtime/file_handle.h"
 #include "runtime/file_utility.h"
+#include "runtime/light_speed.h"
 #include "time/date_text.h"
 
 namespace {
 
 constexpr const char* kModule = "images_v2";
-constexpr double kHalfSpeedOfLight = 149896229.0;
-constexpr double kSpeedOfLight = 299792458.0;
 // Place of each sub-swath in the burst sequence SS1 SS4 SS2 SS5 SS3.
 constexpr int kBurstOrder[kMaxImages] = {0, 2, 4, 1, 3};
 // More samples per line than any ASAR product holds: a larger value is a
@@ -229,12 +230,67 @@ int images::runSteps(Run& r) {
   return 0;
 }
 
+// What one image is: its main processing parameters, range sampling,
+// measurement data set, line times and output names.  Every header section
+// is filled from it.
+struct images::Image {
+  int k = 0;
+  bool wss = false;
+  bool second = false;  // second image of an alternating-polarisation product
+  asar::Record m{nullptr, 0};
+  GeolocationRows rows;
+  double rangeInterval = 0.0;  // s between samples
+  double lineInterval = 0.0;   // s between lines
+  double nearTime = 0.0, farTime = 0.0;
+  uint32_t samples = 0;
+  const EnvisatDataSet* mds = nullptr;
+  int32_t records = 0;
+  int linesPerBurst = 0;
+  double first = 0.0, last = 0.0;  // zero-Doppler times of the first and last line
+  int64_t lineTimes = 0;           // lines of the region's time grid
+  std::string polar;
+  std::string raster;
+  const char* hdr = nullptr;
+};
+
 int images::processImage(Run& r, int k) {
   VLR_SCOPE("images::processImage", kModule);
+  Image im;
+  VLR_CALL(planImage(r, k, &im));
+  VLR_CALL(prepareOutputNames(k, &im));
+  VLR_REPORT(NVLR_UTILITY_Format("Writing Header file: %s\n", im.hdr).c_str(), ARE_CHECKPOINT);
+
+  // The sections are gathered in memory and the header written once, whole;
+  // a step that fails leaves no header behind.
+  HeldXmlDocument header(im.hdr);
+  // The data-set information is written after the orbit step, which adds
+  // the scene heading.
+  DataSetInfo_Obj info;
+  fillDataSetInfo(r, im, &info);
+  VLR_CALL(writeSwathInfo(r, im));
+  double lambda = 0.0;
+  VLR_CALL(writeSamplingConstants(r, im, &lambda));
+  VLR_CALL(writeSpectralWindows(im));
+  VLR_CALL(describeRaster(r, im));
+  VLR_CALL(writeOrbitAndCorners(im, lambda, &info));
+  VLR_CALL(info.writehdr(im.hdr));
+  VLR_CALL(writeRegion(im));
+  VLR_CALL(writePolynomials(r, im));
+  VLR_CALL(writeAttitude(r, im));
+  VLR_CALL(writeElevationPattern(r, k, im.hdr));
+  VLR_CALL(writePulse(im));
+  VLR_CALL(header.save());
+  return 0;
+}
+
+int images::planImage(const Run& r, int k, Image* im) {
+  VLR_SCOPE("images::planImage", kModule);
   const EnvisatHeaders& h = r.h;
   const ProductKind& kind = *r.kind;
   const bool wss = kind.wideSwath;
-  const char* product = input.ASA_level1_filename;
+  im->k = k;
+  im->wss = wss;
+  im->second = !wss && k == 1;
 
   // The image's main processing parameters.
   if (k >= r.mpp.count() && !(kind.images == 2 && r.mpp.count() >= 1)) {
@@ -242,7 +298,8 @@ int images::processImage(Run& r, int k) {
         NVLR_UTILITY_Format("Image %d has no main processing parameters record", k + 1).c_str(),
         vlr::kLibInconsistent);
   }
-  const asar::Record m = r.mpp.record(k < r.mpp.count() ? k : r.mpp.count() - 1);
+  im->m = r.mpp.record(k < r.mpp.count() ? k : r.mpp.count() - 1);
+  const asar::Record& m = im->m;
   if (wss) {
     const char digit = m.ch(asar::mpp::kSwathDigit);
     if (digit != '1' + k && digit != ' ') {
@@ -254,22 +311,22 @@ int images::processImage(Run& r, int k) {
   }
 
   // Range sampling and near range.
-  const double rangeInterval = h.rangeSpacing / kHalfSpeedOfLight;
-  GeolocationRows rows;
-  VLR_CALL(SelectGeolocationRows(r.geolocation, wss ? k + 1 : 0, &rows));
-  if (rows.empty()) {
+  im->rangeInterval = h.rangeSpacing / kHalfSpeedOfLight;
+  im->lineInterval = h.lineTimeInterval;
+  VLR_CALL(SelectGeolocationRows(r.geolocation, wss ? k + 1 : 0, &im->rows));
+  if (im->rows.empty()) {
     VLR_FAIL(NVLR_UTILITY_Format("No geolocation record of image %d", k + 1).c_str(),
              vlr::kLibInconsistent);
   }
-  const asar::Record g = r.geolocation.record(rows.front());
-  const double nearTime =
-      g.f32(asar::geo::kSlantRangeTimes) * 1e-9 -
-      (static_cast<double>(g.u32(asar::geo::kFirstTieSample)) - 1.0) * rangeInterval;
+  const asar::Record g = r.geolocation.record(im->rows.front());
+  im->nearTime = g.f32(asar::geo::kSlantRangeTimes) * 1e-9 -
+                 (static_cast<double>(g.u32(asar::geo::kFirstTieSample)) - 1.0) * im->rangeInterval;
   const uint32_t samples = m.u32(asar::mpp::kSamplesPerLine);
-  if (samples < 1 || samples > kMaxSamples || !Finite(nearTime)) {
+  if (samples < 1 || samples > kMaxSamples || !Finite(im->nearTime)) {
     VLR_FAIL(NVLR_UTILITY_Format("Image %d: %u samples per line", k + 1, samples).c_str(),
              vlr::kLibInconsistent);
   }
+  im->samples = samples;
 
   // The image's measurement data set.
   const int mdsIndex = wss ? k : (k < r.mdsFound ? k : -1);
@@ -293,47 +350,50 @@ int images::processImage(Run& r, int k) {
         ARE_ERROR);
     VLR_FAIL("File reading failed!", vlr::kLibRead);
   }
-  const int32_t records = static_cast<int32_t>(mds.numDsr);
+  im->mds = &mds;
+  im->records = static_cast<int32_t>(mds.numDsr);
 
   // Azimuth limits.
   LineTiming timing;
   timing.lineInterval = h.lineTimeInterval;
   timing.firstLineText = kind.sensingFromMph ? h.sensingStart : h.firstLineTime;
   timing.lastLineText = kind.sensingFromMph ? h.sensingStop : h.lastLineTime;
-  const int linesPerBurst = m.i32(asar::mpp::kLinesPerBurst);
-  timing.linesPerBurst = linesPerBurst;
+  im->linesPerBurst = m.i32(asar::mpp::kLinesPerBurst);
+  timing.linesPerBurst = im->linesPerBurst;
   timing.burstCycle = r.burstCycle;
-  double first = 0.0, last = 0.0;
-  VLR_CALL(
-      get_first_last(product, mds.offset, mds.dsrSize, mds.numDsr, timing, wss, &first, &last));
+  VLR_CALL(get_first_last(input.ASA_level1_filename, mds.offset, mds.dsrSize, mds.numDsr, timing,
+                          wss, &im->first, &im->last));
 
   // Derived geometry.  A wide-swath raster keeps every record (bursts
   // overlap in time); its region describes the zero-Doppler line grid.
-  const double farTime = nearTime + (samples - 1.0) * rangeInterval;
-  const double interval = h.lineTimeInterval;
-  int64_t lineTimes = 0;
+  im->farTime = im->nearTime + (samples - 1.0) * im->rangeInterval;
   if (wss) {
-    const double steps = (last - first) / interval;
+    const double steps = (im->last - im->first) / im->lineInterval;
     // Far beyond any product: a damaged time or interval, not a line grid.
     if (!(steps >= 0.0 && steps < 1e9)) {
       VLR_FAIL(NVLR_UTILITY_Format("Image %d: impossible line timing", k + 1).c_str(),
                vlr::kLibInconsistent);
     }
-    lineTimes = std::llround(steps) + 1;
+    im->lineTimes = std::llround(steps) + 1;
   } else {
-    lineTimes = kind.linesSummed ? r.summedLines : m.u32(asar::mpp::kNumOutputLines);
-    if (lineTimes != records) {
+    im->lineTimes = kind.linesSummed ? r.summedLines : m.u32(asar::mpp::kNumOutputLines);
+    if (im->lineTimes != im->records) {
       VLR_FAIL(NVLR_UTILITY_Format("Image %d: %lld output lines but %d records", k + 1,
-                                   static_cast<long long>(lineTimes), records)
+                                   static_cast<long long>(im->lineTimes), im->records)
                    .c_str(),
                vlr::kLibInconsistent);
     }
   }
-  if (lineTimes < 1) VLR_FAIL("Image without lines", vlr::kLibInconsistent);
+  if (im->lineTimes < 1) VLR_FAIL("Image without lines", vlr::kLibInconsistent);
+  const std::string& polar = im->second ? h.mds2Polar : h.mds1Polar;
+  im->polar = polar;
+  return 0;
+}
 
-  // File names.
-  const bool numbered = wss || nImages_ > 1;
-  const char* root = conf.ExtractData != 0 ? output.OutputFile : product;
+int images::prepareOutputNames(int k, Image* im) {
+  VLR_SCOPE("images::prepareOutputNames", kModule);
+  const bool numbered = im->wss || nImages_ > 1;
+  const char* root = conf.ExtractData != 0 ? output.OutputFile : input.ASA_level1_filename;
   const std::string raster =
       numbered ? NVLR_UTILITY_Format("%s%d", root, k + 1) : std::string(root);
   const std::string header = NVLR_UTILITY_Format("%s.hdr", raster.c_str());
@@ -354,67 +414,73 @@ int images::processImage(Run& r, int k) {
   errno = 0;
   std::snprintf(rasterNames_[k], kImagesNameSize, "%s", raster.c_str());
   std::snprintf(headerNames_[k], kImagesNameSize, "%s", header.c_str());
-  const char* hdr = headerNames_[k];
-  VLR_REPORT(NVLR_UTILITY_Format("Writing Header file: %s\n", hdr).c_str(), ARE_CHECKPOINT);
+  im->raster = raster;
+  im->hdr = headerNames_[k];
+  return 0;
+}
 
-  // Data-set information.
-  const bool second = !wss && k == 1;
-  DataSetInfo_Obj info;
-  SetText(info.OrbitNumber, h.absOrbit);
-  SetText(info.Track, h.relOrbit);
-  SetText(info.SenseDate, h.sensingStart);
-  SetText(info.SceneID, h.product);
-  SetText(info.Description, kind.description != nullptr ? kind.description : h.sphDescriptor);
-  SetText(info.AcquisitionStation, h.acquisitionStation);
-  SetText(info.ProcessingCenter, h.procCenter);
-  SetText(info.ProcessingDate, h.procTime);
-  SetText(info.ProcessingSoftware, h.softwareVer);
+void images::fillDataSetInfo(const Run& r, const Image& im, DataSetInfo_Obj* info) const {
+  const EnvisatHeaders& h = r.h;
+  const ProductKind& kind = *r.kind;
+  SetText(info->OrbitNumber, h.absOrbit);
+  SetText(info->Track, h.relOrbit);
+  SetText(info->SenseDate, h.sensingStart);
+  SetText(info->SceneID, h.product);
+  SetText(info->Description, kind.description != nullptr ? kind.description : h.sphDescriptor);
+  SetText(info->AcquisitionStation, h.acquisitionStation);
+  SetText(info->ProcessingCenter, h.procCenter);
+  SetText(info->ProcessingDate, h.procTime);
+  SetText(info->ProcessingSoftware, h.softwareVer);
   // The pass direction: the composed product's heading is chosen by it.
-  if (h.pass == "ASCENDING" || h.pass == "DESCENDING") SetText(info.OrbitConfiguration, h.pass);
+  if (h.pass == "ASCENDING" || h.pass == "DESCENDING") SetText(info->OrbitConfiguration, h.pass);
   switch (kind.swath) {
     case SwathNaming::kSubSwath:
-      SetText(info.Swath, NVLR_UTILITY_Format("SS%d", k + 1));
+      SetText(info->Swath, NVLR_UTILITY_Format("SS%d", im.k + 1));
       break;
     case SwathNaming::kSphSwath:
-      SetText(info.Swath, h.swath);
+      SetText(info->Swath, h.swath);
       break;
     case SwathNaming::kIsDigit:
-      SetText(info.Swath,
+      SetText(info->Swath,
               "IS" + (h.swath.empty() ? std::string() : h.swath.substr(h.swath.size() - 1)));
       break;
   }
-  const std::string& polar = second ? h.mds2Polar : h.mds1Polar;
-  if (polar.size() >= 3)
-    SetText(info.Polarization, NVLR_UTILITY_Format("%c/%c", polar[0], polar[2]));
-  info.ExternalCalibrationFactor = m.f32(asar::mpp::kExternalCalibrationFactor);
-  info.SetType(kind.image, DS_SENSOR_ASAR, kind.mode, kind.projection, kind.unit,
-               DS_REFSYS_UNDEFINED);
+  if (im.polar.size() >= 3)
+    SetText(info->Polarization, NVLR_UTILITY_Format("%c/%c", im.polar[0], im.polar[2]));
+  info->ExternalCalibrationFactor = im.m.f32(asar::mpp::kExternalCalibrationFactor);
+  info->SetType(kind.image, DS_SENSOR_ASAR, kind.mode, kind.projection, kind.unit,
+                DS_REFSYS_UNDEFINED);
+}
 
-  // Swath and burst information.
+int images::writeSwathInfo(const Run& r, const Image& im) {
+  VLR_SCOPE("images::writeSwathInfo", kModule);
+  const ProductKind& kind = *r.kind;
+  const asar::Record& m = im.m;
+  const int k = im.k;
   SwathInfo swath;
   swath.Acquisition_Start_Time =
       m.time(asar::mpp::kFirstZeroDopplerTime) + m.f32(asar::mpp::kTimeDiffZeroDoppler);
   swath.ProcessorGain = m.f32(asar::mpp::kProcessorGain);
-  swath.NoisePower = m.f32(second && kind.secondNoiseField ? asar::mpp::kNoisePowerSecond
-                                                           : asar::mpp::kNoisePower);
-  if (wss) {
-    if (linesPerBurst < 1) {
+  swath.NoisePower = m.f32(im.second && kind.secondNoiseField ? asar::mpp::kNoisePowerSecond
+                                                              : asar::mpp::kNoisePower);
+  if (im.wss) {
+    if (im.linesPerBurst < 1) {
       VLR_FAIL(
-          NVLR_UTILITY_Format("Sub-swath %d: %d lines per burst", k + 1, linesPerBurst).c_str(),
+          NVLR_UTILITY_Format("Sub-swath %d: %d lines per burst", k + 1, im.linesPerBurst).c_str(),
           vlr::kLibInconsistent);
     }
     const uint32_t outputLines = m.u32(asar::mpp::kNumOutputLines);
-    if (outputLines != static_cast<uint32_t>(records)) {
+    if (outputLines != static_cast<uint32_t>(im.records)) {
       VLR_REPORT(NVLR_UTILITY_Format("Sub-swath %d: %u output lines, %d records; the records are "
                                      "kept",
-                                     k + 1, outputLines, records)
+                                     k + 1, outputLines, im.records)
                      .c_str(),
                  ARE_WARNING);
     }
     swath.Rank = m.i32(asar::mpp::kRank);
     swath.Echoes_per_burst = m.i32(asar::mpp::kEchoesPerBurst);
-    swath.Lines_per_burst = linesPerBurst;
-    swath.Bursts = records / linesPerBurst;
+    swath.Lines_per_burst = im.linesPerBurst;
+    swath.Bursts = im.records / im.linesPerBurst;
     swath.Order = kBurstOrder[k];
   }
   if (r.chirp.count() > 0) {
@@ -423,16 +489,20 @@ int images::processImage(Run& r, int k) {
     } else if (kind.chirpPower == ChirpPowerSource::kMatchingPolarDb) {
       for (int i = 0; i < r.chirp.count(); ++i) {
         const asar::Record c = r.chirp.record(i);
-        if (c.token(asar::chirp::kPolarisation, 3) == polar) {
+        if (c.token(asar::chirp::kPolarisation, 3) == im.polar) {
           swath.ChirpPower = std::pow(10.0, c.f32(asar::chirp::kElevationChirpPowerDb) / 10.0);
           break;
         }
       }
     }
   }
-  VLR_CALL(swath.writehdr(hdr));
+  VLR_CALL(swath.writehdr(im.hdr));
+  return 0;
+}
 
-  // Sampling constants.
+int images::writeSamplingConstants(const Run& r, const Image& im, double* lambda) {
+  VLR_SCOPE("images::writeSamplingConstants", kModule);
+  const asar::Record& m = im.m;
   SamplingConstants_Obj sampling;
   sampling.fc_hz = m.f32(asar::mpp::kRadarFrequency);
   sampling.lambda_m = kSpeedOfLight / sampling.fc_hz;
@@ -447,13 +517,18 @@ int images::processImage(Run& r, int k) {
   sampling.brf_hz = r.burstCycle > 0.0 ? 1.0 / r.burstCycle : 0.0;
   if (!(sampling.fc_hz > 0.0) || !(sampling.frg_hz > 0.0) || !(sampling.prf_hz > 0.0)) {
     VLR_FAIL(
-        NVLR_UTILITY_Format("Image %d: carrier, range sampling rate or PRF not positive", k + 1)
+        NVLR_UTILITY_Format("Image %d: carrier, range sampling rate or PRF not positive", im.k + 1)
             .c_str(),
         vlr::kLibInconsistent);
   }
-  VLR_CALL(sampling.writehdr(hdr));
+  VLR_CALL(sampling.writehdr(im.hdr));
+  *lambda = sampling.lambda_m;
+  return 0;
+}
 
-  // Spectral windows.
+int images::writeSpectralWindows(const Image& im) {
+  VLR_SCOPE("images::writeSpectralWindows", kModule);
+  const asar::Record& m = im.m;
   SpectralWindows_Obj windows;
   SetText(windows.RgMatchedFilterType,
           m.token(asar::mpp::kRangeWindowType, asar::mpp::kWindowTypeWidth));
@@ -461,16 +536,21 @@ int images::processImage(Run& r, int k) {
   SetText(windows.AzMatchedFilterType,
           m.token(asar::mpp::kAzimuthWindowType, asar::mpp::kWindowTypeWidth));
   windows.AzMatchedFilterCoef = m.f32(asar::mpp::kAzimuthWindowCoef);
-  windows.RgLookBandwidth = m.f32(asar::mpp::kRangeLookBandwidth + 4 * (wss ? k : 0));
+  // A wide-swath record holds one range look bandwidth per sub-swath.
+  windows.RgLookBandwidth = m.f32(asar::mpp::kRangeLookBandwidth + 4 * (im.wss ? im.k : 0));
   windows.AzLookBandwidth = m.f32(asar::mpp::kAzimuthLookBandwidth);
-  VLR_CALL(windows.writehdr(hdr));
+  VLR_CALL(windows.writehdr(im.hdr));
+  return 0;
+}
 
-  // Raster description: the lines inside the product.
-  ImageData& d = data_[k];
-  d.offset = mds.offset;
-  d.recordSize = mds.dsrSize;
-  d.samples = static_cast<int32_t>(samples);
-  d.lines = records;
+int images::describeRaster(const Run& r, const Image& im) {
+  VLR_SCOPE("images::describeRaster", kModule);
+  // The lines inside the product.
+  ImageData& d = data_[im.k];
+  d.offset = im.mds->offset;
+  d.recordSize = im.mds->dsrSize;
+  d.samples = static_cast<int32_t>(im.samples);
+  d.lines = im.records;
   if (r.elementSize == 4 || r.elementSize == 2) {
     d.inputCellType = r.complex ? CT_SHORT_COMPLEX : CT_INT16;
   } else {
@@ -478,7 +558,7 @@ int images::processImage(Run& r, int k) {
   }
   d.outputCellType = r.complex ? CT_FLOAT_COMPLEX : CT_FLOAT32;
   DataFile described;
-  described.set_name(raster.c_str());
+  described.set_name(im.raster.c_str());
   described.pixels_per_line = d.samples;
   described.lines_per_image = d.lines;
   described.row_prefix = static_cast<int32_t>(asar::mds::kLinePrefixSize);
@@ -486,69 +566,86 @@ int images::processImage(Run& r, int k) {
   described.cell_type = d.inputCellType;
   described.byte_order = 1;
   VLR_CALL(described.write_hdr());
+  return 0;
+}
 
-  // State vectors and corners.
-  const double lambda = sampling.lambda_m;
-  FILE* orbitFile = input.ASA_dor_vor[0] != '\0' ? std::fopen(input.ASA_dor_vor, "rb") : nullptr;
-  if (orbitFile != nullptr) {
-    std::fclose(orbitFile);
-    GeneralSAROrbit orbit(lambda);
-    VLR_CALL(orbit.GetStateVectorsENVI(input.ASA_dor_vor, first, last - first));
-    VLR_CALL(orbit.writehdr(hdr));
-    GSRoi_Obj extent;
-    extent.roi.FastStartTime = nearTime;
-    extent.roi.FastTimeLength = farTime - nearTime;
-    extent.roi.SlowStartTime = first;
-    extent.roi.SlowTimeLength = last - first;
-    geoCoords_Obj corners;
-    // The corners, and the centre at the middle of the zero-Doppler span and
-    // of the range span: the image's own middle, whatever blank records or
-    // overlapping bursts the data set holds.
-    VLR_CALL(orbit.SVGetGeoCoords(&corners, &extent));
-    VLR_CALL(corners.writehdr(hdr));
-    VLR_CALL(scene_heading(orbit, first + 0.5 * (last - first),
-                           nearTime + 0.5 * (farTime - nearTime), &info.SceneHeading));
-  } else if (conf.Verbose != 0) {
-    VLR_REPORT("No DOR_VOR file provided. Skipping state vectors informations", ARE_WARNING);
+int images::writeOrbitAndCorners(const Image& im, double lambda, DataSetInfo_Obj* info) {
+  VLR_SCOPE("images::writeOrbitAndCorners", kModule);
+  // Only an orbit file that opens gives state vectors.
+  if (input.ASA_dor_vor[0] == '\0' || !FileHandle(input.ASA_dor_vor, "rb").valid()) {
+    if (conf.Verbose != 0)
+      VLR_REPORT("No DOR_VOR file provided. Skipping state vectors informations", ARE_WARNING);
+    return 0;
   }
+  const double span = im.last - im.first;
+  GeneralSAROrbit orbit(lambda);
+  VLR_CALL(orbit.GetStateVectorsENVI(input.ASA_dor_vor, im.first, span));
+  VLR_CALL(orbit.writehdr(im.hdr));
+  GSRoi_Obj extent;
+  extent.roi.FastStartTime = im.nearTime;
+  extent.roi.FastTimeLength = im.farTime - im.nearTime;
+  extent.roi.SlowStartTime = im.first;
+  extent.roi.SlowTimeLength = span;
+  geoCoords_Obj corners;
+  // The corners, and the centre at the middle of the zero-Doppler span and
+  // of the range span: the image's own middle, whatever blank records or
+  // overlapping bursts the data set holds.
+  VLR_CALL(orbit.SVGetGeoCoords(&corners, &extent));
+  VLR_CALL(corners.writehdr(im.hdr));
+  VLR_CALL(scene_heading(orbit, im.first + 0.5 * span,
+                         im.nearTime + 0.5 * (im.farTime - im.nearTime), &info->SceneHeading));
+  return 0;
+}
 
-  // Data-set information and region.
-  VLR_CALL(info.writehdr(hdr));
+int images::writeRegion(const Image& im) {
+  VLR_SCOPE("images::writeRegion", kModule);
   GSRoi_Obj region;
-  region.roi.FastStartTime = nearTime;
-  region.roi.FastTimeDelta = rangeInterval;
-  region.roi.Samples = d.samples;
-  region.roi.FastTimeLength = farTime - nearTime;
+  region.roi.FastStartTime = im.nearTime;
+  region.roi.FastTimeDelta = im.rangeInterval;
+  region.roi.Samples = static_cast<int32_t>(im.samples);
+  region.roi.FastTimeLength = im.farTime - im.nearTime;
   // The region starts at the image's own first line, so that each sub-swath
   // header says when its lines were taken (the sub-swaths of one product
   // start up to a burst cycle apart).
-  region.roi.SlowStartTime = first;
-  region.roi.SlowTimeDelta = interval;
-  region.roi.Lines = static_cast<int>(lineTimes);
-  region.roi.SlowTimeLength = last - first;
-  VLR_CALL(region.writehdr(hdr));
+  region.roi.SlowStartTime = im.first;
+  region.roi.SlowTimeDelta = im.lineInterval;
+  region.roi.Lines = static_cast<int>(im.lineTimes);
+  region.roi.SlowTimeLength = im.last - im.first;
+  VLR_CALL(region.writehdr(im.hdr));
+  return 0;
+}
 
-  // Polynomials.
+int images::writePolynomials(const Run& r, const Image& im) {
+  VLR_SCOPE("images::writePolynomials", kModule);
   polySAR polys;
-  VLR_CALL(MakeImagePolynomials(r.doppler, r.geolocation, rows, wss ? k : -1, m, &polys));
-  VLR_CALL(polys.writehdr(hdr));
+  VLR_CALL(
+      MakeImagePolynomials(r.doppler, r.geolocation, im.rows, im.wss ? im.k : -1, im.m, &polys));
+  VLR_CALL(polys.writehdr(im.hdr));
+  return 0;
+}
 
-  // Attitude and pulse.
+int images::writeAttitude(const Run& r, const Image& im) {
+  VLR_SCOPE("images::writeAttitude", kModule);
   SensorAttitude_Obj attitude;
   attitude.Eq_speed = -1.0;
   attitude.Mean_DC = -1.0;
   attitude.SquintAngle = -1.0;
   attitude.AntennaLength = 10.0;
   if (input.ASA_INS_Filename[0] != '\0') {
-    VLR_CALL(attitude.getDroopGain(input.ASA_INS_Filename, kind.droopMode));
+    VLR_CALL(attitude.getDroopGain(input.ASA_INS_Filename, r.kind->droopMode));
   }
-  VLR_CALL(attitude.writehdr(hdr));
-  VLR_CALL(writeElevationPattern(r, k, hdr));
+  VLR_CALL(attitude.writehdr(im.hdr));
+  return 0;
+}
+
+int images::writePulse(const Image& im) {
+  VLR_SCOPE("images::writePulse", kModule);
+  const asar::Record& m = im.m;
   SARPulse_Obj pulse;
   pulse.PulseLength = m.f32(asar::mpp::kPulseLength);
   pulse.Bandwidth = m.f32(asar::mpp::kRangeBandwidth);
   pulse.PulseSamplingRate = m.f32(asar::mpp::kRangeSamplingRate);
-  VLR_CALL(pulse.writehdr(hdr));
+  VLR_CALL(pulse.writehdr(im.hdr));
   return 0;
 }
 

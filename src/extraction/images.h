@@ -16,6 +16,8 @@
 
 #include "extraction/images_io.h"
 
+class DataSetInfo_Obj;
+
 // Largest number of images of one product.
 constexpr int kMaxImages = 5;
 
@@ -71,8 +73,26 @@ class images {
 
  private:
   struct Run;
+  struct Image;
   int runSteps(Run& r);
+  // Writes the header of image k, one section per step.
   int processImage(Run& r, int k);
+  // Checks the image's records and dates its lines.
+  int planImage(const Run& r, int k, Image* im);
+  // Names the raster and header of image k and removes earlier ones.
+  int prepareOutputNames(int k, Image* im);
+  void fillDataSetInfo(const Run& r, const Image& im, DataSetInfo_Obj* info) const;
+  int writeSwathInfo(const Run& r, const Image& im);
+  int writeSamplingConstants(const Run& r, const Image& im, double* lambda);
+  int writeSpectralWindows(const Image& im);
+  // Records where the image's lines lie in the product, and writes that.
+  int describeRaster(const Run& r, const Image& im);
+  // State vectors, corners and scene heading, when an orbit file is given.
+  int writeOrbitAndCorners(const Image& im, double lambda, DataSetInfo_Obj* info);
+  int writeRegion(const Image& im);
+  int writePolynomials(const Run& r, const Image& im);
+  int writeAttitude(const Run& r, const Image& im);
+  int writePulse(const Image& im);
   // The antenna elevation pattern of image k into its header `hdr`, when the
   // product has one for it; a record that cannot make a pattern is warned
   // about and left out.  0 or the code of the failing write.

@@ -33,6 +33,9 @@ constexpr off_t kMaxDocumentBytes = 64L * 1024 * 1024;
 constexpr int kParseOptions =
     XML_PARSE_NOBLANKS | XML_PARSE_NONET | XML_PARSE_NOERROR | XML_PARSE_NOWARNING;
 
+// The documents held in this thread, innermost first.
+thread_local HeldXmlDocument* gHeld = nullptr;
+
 const xmlChar* X(const char* s) {
   return reinterpret_cast<const xmlChar*>(s);
 }
@@ -194,16 +197,46 @@ tessalxml::~tessalxml() {
   clean();
 }
 
+HeldXmlDocument::HeldXmlDocument(const char* file) {
+  doc_.initXmlFile(file);
+  outer_ = gHeld;
+  gHeld = this;
+  holding_ = true;
+}
+
+HeldXmlDocument::~HeldXmlDocument() {
+  release();
+}
+
+void HeldXmlDocument::release() {
+  if (!holding_) return;
+  holding_ = false;
+  // Holds end in reverse order of their start; unlink wherever it stands.
+  for (HeldXmlDocument** p = &gHeld; *p != nullptr; p = &(*p)->outer_) {
+    if (*p == this) {
+      *p = outer_;
+      break;
+    }
+  }
+}
+
+int HeldXmlDocument::save() {
+  release();
+  return doc_.write();
+}
+
 void tessalxml::clean() {
-  if (doc_ != nullptr) xmlFreeDoc(doc_);
+  if (doc_ != nullptr && !borrowed_) xmlFreeDoc(doc_);
   doc_ = nullptr;
+  borrowed_ = false;
   root_ = nullptr;
   fileName_.clear();
   channels_ = 0;
 }
 
 void tessalxml::newDocument() {
-  if (doc_ != nullptr) xmlFreeDoc(doc_);
+  if (doc_ != nullptr && !borrowed_) xmlFreeDoc(doc_);
+  borrowed_ = false;
   doc_ = xmlNewDoc(X("1.0"));
   root_ = xmlNewNode(nullptr, X(kRoot));
   xmlDocSetRootElement(doc_, root_);
@@ -228,6 +261,15 @@ bool tessalxml::recognised(xmlNodePtr root) {
 int tessalxml::initXmlFile(const char* file) {
   clean();
   fileName_ = file != nullptr ? file : "";
+  for (HeldXmlDocument* held = gHeld; held != nullptr; held = held->outer_) {
+    if (!fileName_.empty() && held->doc_.fileName_ == fileName_ && held->doc_.doc_ != nullptr) {
+      doc_ = held->doc_.doc_;
+      root_ = held->doc_.root_;
+      channels_ = storedChannels();
+      borrowed_ = true;
+      return 0;
+    }
+  }
   const int saved = errno;
   struct stat st;
   const bool present = !fileName_.empty() && ::stat(fileName_.c_str(), &st) == 0 &&
@@ -261,6 +303,7 @@ int tessalxml::setDescription(const char* file, const char* text) {
 
 int tessalxml::write() {
   VLR_SCOPE("tessalxml::write", kModule);
+  if (borrowed_) return 0;  // the holder saves
   if (doc_ == nullptr) newDocument();
   const int saved = errno;
   // The failure is reported here; the parser library stays quiet.

@@ -28,7 +28,8 @@ class tessalxml {
  public:
   tessalxml() = default;
   // Loads the file, or starts a new document when it is absent or not one
-  // of ours.
+  // of ours.  A file held by a HeldXmlDocument of this thread gives the
+  // held document instead, and write() leaves the saving to the holder.
   explicit tessalxml(const char* file);
   ~tessalxml();
   tessalxml(const tessalxml&) = delete;
@@ -90,4 +91,29 @@ class tessalxml {
   std::string fileName_;
   int channels_ = 0;
   bool debug_ = false;
+  bool borrowed_ = false;  // doc_ belongs to a HeldXmlDocument
+};
+
+// Holds the document of one file in memory while it lives: every section
+// written to that file in this thread goes into it, and save() writes the
+// file once, instead of a load and a save per section.  A hold that ends
+// without save() leaves the file as it was.
+class HeldXmlDocument {
+ public:
+  explicit HeldXmlDocument(const char* file);
+  ~HeldXmlDocument();
+  HeldXmlDocument(const HeldXmlDocument&) = delete;
+  HeldXmlDocument& operator=(const HeldXmlDocument&) = delete;
+
+  // Ends the hold and saves the document: 0, or 5 when the file cannot be
+  // written.
+  int save();
+
+ private:
+  friend class tessalxml;
+  void release();
+
+  tessalxml doc_;
+  HeldXmlDocument* outer_ = nullptr;
+  bool holding_ = false;
 };

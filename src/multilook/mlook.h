@@ -106,9 +106,6 @@ class mlook {
   double fs = 0.0;
 
  private:
-  struct SwathPlan;
-  struct Burst;
-
   int readswath(int k, const char* header, bool kestova);
   int checkbursts();
   int setuprange();

@@ -238,10 +238,11 @@ int mlook::processswath(int k) {
 
   fft_plan_c forward, inverse;
   if (!plain) {
-    VLR_CALL(fft_makep_c(&forward, nfft, nfft, 1, 1, 1, 0, 1));
+    VLR_CALL(
+        fft_makep_c(&forward, nfft, nfft, 1, 1, FftDirection::kForward, FftDirection::kNone, 1));
     // Backward transform without its division by m: the division goes into
     // the power scale.
-    VLR_CALL(fft_makep_c(&inverse, m, m, 1, 1, -2, 0, 1));
+    VLR_CALL(fft_makep_c(&inverse, m, m, 1, 1, FftDirection::kBackward, FftDirection::kNone, 1));
   }
   int lookCentre[kMaxLooks] = {};
   // Spectrum bin of each look centre (negative frequencies count from the

@@ -16,6 +16,7 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/light_speed.h"
 #include "runtime/progress.h"
 #include "signal/glsf.h"
 #include "signal/polval.h"
@@ -25,7 +26,6 @@ namespace {
 constexpr const char* kModule = "mlook_v2";
 constexpr const char* kProgressTitle = "MULTILOOK SWATHS RECOMPOSITION";
 constexpr int kProgressLines = 25;
-constexpr double kHalfSpeedOfLight = 149896229.0;
 constexpr double kDefaultReferenceRange = 800000.0;  // m
 constexpr int kBufferBytes = 1 << 20;
 // Interpolation kernels of the ground-range resampling.
@@ -228,7 +228,7 @@ void mlook::gridline(int line, double* nodes) const {
 }
 
 int mlook::resampledRangeTime(int column, int line, double* range) const {
-  if (conf_->Sl2Gr == 0 || gridTimes_.empty() || column < 0 || column >= outputSamples_ ||
+  if (conf_->geometry() != OutputGeometry::kGroundRange || gridTimes_.empty() || column < 0 || column >= outputSamples_ ||
       line < 0 || line >= outputLines_)
     return vlr::kLibInconsistent;
   GroundLine axis;
@@ -286,7 +286,7 @@ int mlook::composeswaths() {
   // Ground range: the ground width of the swath changes along the scene
   // (the far edge moves by several samples over a long product), so the
   // output is as wide as the widest line; shorter lines end in zeros.
-  const bool ground = conf_->Sl2Gr != 0;
+  const bool ground = conf_->geometry() == OutputGeometry::kGroundRange;
   GroundLine axis;
   GeneralSAR* headers[kMlookSwaths];
   for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
@@ -446,7 +446,7 @@ int mlook::outputPixelTimes(double column, double row, double* azimuth, double* 
     VLR_FAIL("The output geometry is not known", vlr::kLibInconsistent);
   const double az = outputStartTime_ + row * lineInterval_;
   double rt = rangeTime_[0] + column * decimation_ / fs;
-  if (conf_->Sl2Gr != 0) {
+  if (conf_->geometry() == OutputGeometry::kGroundRange) {
     // The same chained ground axis as the resampling, at the pixel's line.
     GroundLine axis;
     GeneralSAR* headers[kMlookSwaths];

@@ -12,12 +12,12 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/light_speed.h"
 #include "time/date_text.h"
 
 namespace {
 
 constexpr const char* kModule = "mlook_v2";
-constexpr double kHalfSpeedOfLight = 149896229.0;
 constexpr double kCalibrationFactor = 1.0176;
 // "SceneHeading" where no orbit gives one.
 constexpr double kUnsetHeading = -999.0;
@@ -61,7 +61,7 @@ int mlook::writepar() {
   info.SWST_MAX = -1.0;
   info.RangeLooks = looks_;
   info.ExternalCalibrationFactor *= kCalibrationFactor;
-  const bool ground = conf_->Sl2Gr != 0;
+  const bool ground = conf_->geometry() == OutputGeometry::kGroundRange;
   info.SetType(DS_IMAGE_MULTILOOK, DS_SENSOR_ASAR, DS_ACQ_SCANSAR,
                ground ? DS_PROJECTION_GROUND_RANGE : DS_PROJECTION_SLANT_RANGE, DS_UNIT_VOLT,
                DS_REFSYS_UNDEFINED);

@@ -13,6 +13,9 @@ constexpr int kMlookSwaths = 5;
 // Value of an integer field that was never given.
 constexpr int kMlookUndefinedInt = 0x7fffffff;
 
+// Geometry of the multilook's output lines.
+enum class OutputGeometry { kSlantRange, kGroundRange };
+
 // Section "mlookConfiguration".
 class mlook_conf {
  public:
@@ -24,6 +27,12 @@ class mlook_conf {
   // GrResolution or RgWinLen is undefined or out of range (Sl2Gr 0..1,
   // GrResolution 1..1000, the others 0..1000), else 0.
   int checkpar();
+
+  // The output geometry; the parameter file keeps it as the integer Sl2Gr.
+  OutputGeometry geometry() const {
+    return Sl2Gr != 0 ? OutputGeometry::kGroundRange : OutputGeometry::kSlantRange;
+  }
+  void setGeometry(OutputGeometry g) { Sl2Gr = g == OutputGeometry::kGroundRange ? 1 : 0; }
 
   int Sl2Gr = 1;            // 1: ground-range output, 0: slant range
   int GrSamplingStep = 75;  // ground sampling step, m

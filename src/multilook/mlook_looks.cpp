@@ -6,12 +6,12 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 #include "runtime/file_utility.h"
+#include "runtime/light_speed.h"
 #include "signal/fft_lengths.h"
 
 namespace {
 
 constexpr const char* kModule = "mlook_v2";
-constexpr double kHalfSpeedOfLight = 149896229.0;
 constexpr double kDegToRad = 3.14159265358979323846 / 180.0;
 // Fraction of the range bandwidth that is processed.
 constexpr double kProcessedFraction = 0.8;

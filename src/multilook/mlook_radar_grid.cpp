@@ -116,7 +116,7 @@ int mlook::radarGrid(MlookRadarGrid* grid) {
       outputSamples_ < 1)
     VLR_FAIL("The output geometry is not known", vlr::kLibInconsistent);
   const int lookSign = headers_[0]->orbit.lookSign();
-  if (conf_->Sl2Gr == 0) {
+  if (conf_->geometry() == OutputGeometry::kSlantRange) {
     *grid = MlookRadarGrid::Slant(outputStartTime_, lineInterval_, outputLines_, outputSamples_,
                                   rangeTime_[0], decimation_ / fs, lookSign);
     return 0;

@@ -257,7 +257,7 @@ int mlook::run() {
   if (rc == 0) rc = composeswaths();
   helper_ = nullptr;
   VLR_CALL(rc);
-  if (conf_->Sl2Gr != 0) {
+  if (conf_->geometry() == OutputGeometry::kGroundRange) {
     VLR_REPORT(
         NVLR_UTILITY_Format("Samples: %d, Lines: %d\n", outputSamples_, outputLines_).c_str(),
         ARE_CHECKPOINT);

@@ -10,6 +10,7 @@
 #include "orbit/orbit_window.h"
 #include "orbit/rtbis.h"
 #include "runtime/call_scope.h"
+#include "runtime/file_handle.h"
 
 namespace {
 
@@ -20,26 +21,14 @@ constexpr const char* kModule = "interp_orb";
 constexpr double kNodeSearchSpan = 180.0;
 constexpr double kNodeAccuracy = 1e-5;
 
-// Closes the file on every return path.
-class OrbitFile {
- public:
-  explicit OrbitFile(const char* path) : f_(path != nullptr ? std::fopen(path, "rb") : nullptr) {}
-  ~OrbitFile() {
-    if (f_ != nullptr) std::fclose(f_);
-  }
-  OrbitFile(const OrbitFile&) = delete;
-  OrbitFile& operator=(const OrbitFile&) = delete;
-  std::FILE* get() const { return f_; }
-  int64_t size() const {
-    const off_t here = ftello(f_);
-    if (here < 0 || fseeko(f_, 0, SEEK_END) != 0) return -1;
-    const int64_t end = static_cast<int64_t>(ftello(f_));
-    return fseeko(f_, here, SEEK_SET) == 0 ? end : -1;
-  }
-
- private:
-  std::FILE* f_;
-};
+// Size of the open file in bytes, the position left unchanged; -1 when it
+// cannot be found.
+int64_t StreamSize(std::FILE* f) {
+  const off_t here = ftello(f);
+  if (here < 0 || fseeko(f, 0, SEEK_END) != 0) return -1;
+  const int64_t end = static_cast<int64_t>(ftello(f));
+  return fseeko(f, here, SEEK_SET) == 0 ? end : -1;
+}
 
 // The time of record j of the data set at dataSetOffset.  False when the
 // record cannot be read or its date text is malformed.
@@ -116,7 +105,7 @@ int interp_orb_l(const char* path, double tc, int n, double dt, double* pos, dou
   if (n < 0 || (n > 0 && pos == nullptr) || (n > 1 && !std::isfinite(dt)) ||
       (wantAnx == 1 && anxOut == nullptr))
     VLR_FAIL("Invalid orbit request", 1);
-  OrbitFile file(path);
+  const FileHandle file(path, "rb");
   std::FILE* f = file.get();
   if (f == nullptr) VLR_FAIL("File not opened!", 9);
 
@@ -146,7 +135,7 @@ int interp_orb_l(const char* path, double tc, int n, double dt, double* pos, dou
 
   // The record data set must lie inside the file.
   const EnvisatDataSet ds = headers.dataSet(kDorisDsdOffset);
-  const int64_t fileSize = file.size();
+  const int64_t fileSize = StreamSize(file.get());
   const int64_t available =
       ds.valid && fileSize >= ds.offset ? (fileSize - ds.offset) / kDorisRecordSize : -1;
   if (!ds.valid || (ds.dsrSize != 0 && ds.dsrSize != static_cast<int64_t>(kDorisRecordSize)) ||

@@ -234,7 +234,5 @@ void NVLR_UTILITY_SetErrorHook(VlrErrorHook hook) {
 
 void NVLR_UTILITY_ResetForTesting() {
   auto& s = suite();
-  if (s.log) std::fclose(s.log);
-  if (s.trace) std::fclose(s.trace);
   s = vlr_detail::SuiteState{};
 }

@@ -65,8 +65,8 @@ std::string stars() {
 // Writes text to the process log, then to the trace.
 void logAndTrace(const std::string& text) {
   auto& s = suite();
-  writeRecord(s.log, text);
-  if (s.traceOn) writeRecord(s.trace, text);
+  writeRecord(s.log.get(), text);
+  if (s.traceOn) writeRecord(s.trace.get(), text);
 }
 
 // Reserves an archive name in dir: head, the timestamp and tail, created
@@ -94,8 +94,7 @@ std::string reserveArchive(const std::string& dir, const char* head, const char*
 
 void closeTrace() {
   auto& s = suite();
-  if (s.trace) std::fclose(s.trace);
-  s.trace = nullptr;
+  s.trace.reset();
   s.traceOn = false;
 }
 
@@ -104,7 +103,7 @@ void closeTrace() {
 bool NVLR_UTILITY_LogPrint(const char* format, ...) {
   va_list args;
   va_start(args, format);
-  const bool ok = vprint(suite().log, format, args);
+  const bool ok = vprint(suite().log.get(), format, args);
   va_end(args);
   return ok;
 }
@@ -114,7 +113,7 @@ bool NVLR_UTILITY_TracePrint(const char* format, ...) {
   if (!s.traceOn) return true;
   va_list args;
   va_start(args, format);
-  const bool ok = vprint(s.trace, format, args);
+  const bool ok = vprint(s.trace.get(), format, args);
   va_end(args);
   return ok;
 }
@@ -125,7 +124,7 @@ bool NVLR_UTILITY_IsTraceOn() {
 
 void NVLR_UTILITY_FlushTrace() {
   auto& s = suite();
-  if (s.traceOn && s.trace) std::fflush(s.trace);
+  if (s.traceOn && s.trace) std::fflush(s.trace.get());
 }
 
 void NVLR_UTILITY_SetProcessLabel(const char* title) {
@@ -192,8 +191,8 @@ void VlrOpenProcessLog() {
   // O_APPEND: every write goes to the end of the file as it is then, also
   // when other runs append to the same log.
   const int fd = ::open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT, 0666);
-  s.log = fd >= 0 ? fdopen(fd, "a") : nullptr;
-  if (s.log == nullptr && fd >= 0) ::close(fd);
+  s.log = FileHandle(fd >= 0 ? fdopen(fd, "a") : nullptr);
+  if (!s.log && fd >= 0) ::close(fd);
 }
 
 void VlrOpenTrace(int fresh) {
@@ -201,10 +200,10 @@ void VlrOpenTrace(int fresh) {
   const std::string tracing = NVLR_UTILITY_EnvValue("VELORAN_TRACING");
   if (tracing.compare(0, 6, "ACTIVE") != 0) return;
   const std::string dir = vlr_detail::workingDir();
-  s.trace = std::fopen((dir + "Process.trace").c_str(), fresh ? "w" : "a");
-  if (s.trace == nullptr) return;
-  std::fputs("OpenTrace 1  2\n", s.trace);
-  std::fflush(s.trace);
+  s.trace = FileHandle((dir + "Process.trace").c_str(), fresh ? "w" : "a");
+  if (!s.trace) return;
+  std::fputs("OpenTrace 1  2\n", s.trace.get());
+  std::fflush(s.trace.get());
   s.traceOn = true;
   // The standard streams go to files beside the trace while it is on.
   std::fflush(stderr);
@@ -256,8 +255,7 @@ void NVLR_UTILITY_EndProcess(int code, int writeLog, int successful) {
       NVLR_UTILITY_LogPrint("\n\nSUCCESSFUL\n\n%s\n\n", NVLR_UTILITY_LocalTimeText().c_str());
     }
     NVLR_UTILITY_WriteEnd();
-    if (s.log) std::fclose(s.log);
-    s.log = nullptr;
+    s.log.reset();
     closeTrace();
     if (!dir.empty() && NVLR_UTILITY_FileExists((dir + "Process.trace_save").c_str())) {
       const std::string copy = reserveArchive(dir, "Process", ".trace");

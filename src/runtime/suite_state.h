@@ -8,6 +8,7 @@
 
 #include "runtime/environment.h"
 #include "runtime/error_catalog.h"
+#include "runtime/file_handle.h"
 
 namespace vlr_detail {
 
@@ -25,8 +26,8 @@ struct SuiteState {
   ErrorCatalog errors;
   ErrorCatalog warnings;
   VlrErrorHook hook = nullptr;
-  FILE* log = nullptr;
-  FILE* trace = nullptr;
+  FileHandle log;
+  FileHandle trace;
   // Set while the raise sequence runs, with the code it ends the process with.
   bool raising = false;
   int raisingCode = 0;

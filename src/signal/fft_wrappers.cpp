@@ -19,11 +19,6 @@ namespace {
 constexpr const char* kModule = "fft_wrappers";
 constexpr const char* kWisdomFile = "fftwf_wisdom.txt";
 
-constexpr int kDirNone = 0;
-constexpr int kDirForward = 1;
-constexpr int kDirBackwardScaled = -1;
-constexpr int kDirBackward = -2;
-
 // Engine planning result, mapped by the caller onto its dimension's code.
 constexpr int kPlanOk = 0;
 constexpr int kPlanFailed = 1;
@@ -49,12 +44,19 @@ unsigned effortFlags() {
   }
 }
 
-bool validDirection(int dir) {
-  return dir == kDirNone || dir == kDirForward || dir == kDirBackwardScaled || dir == kDirBackward;
+bool validDirection(FftDirection dir) {
+  switch (dir) {
+    case FftDirection::kNone:
+    case FftDirection::kForward:
+    case FftDirection::kBackwardScaled:
+    case FftDirection::kBackward:
+      return true;
+  }
+  return false;
 }
 
-int engineSign(int dir) {
-  return dir == kDirForward ? FFTW_FORWARD : FFTW_BACKWARD;
+int engineSign(FftDirection dir) {
+  return dir == FftDirection::kForward ? FFTW_FORWARD : FFTW_BACKWARD;
 }
 
 fftwf_complex* engineArray(fcomplex* p) {
@@ -150,11 +152,11 @@ fft_plan_c& fft_plan_c::operator=(fft_plan_c&& other) noexcept {
   rowStride_ = std::exchange(other.rowStride_, 0);
   rowLen_ = std::exchange(other.rowLen_, 0);
   rowNorm_ = std::exchange(other.rowNorm_, 0);
-  rowDir_ = std::exchange(other.rowDir_, 0);
+  rowDir_ = std::exchange(other.rowDir_, FftDirection::kNone);
   rows_ = std::exchange(other.rows_, 0);
   colLen_ = std::exchange(other.colLen_, 0);
   colNorm_ = std::exchange(other.colNorm_, 0);
-  colDir_ = std::exchange(other.colDir_, 0);
+  colDir_ = std::exchange(other.colDir_, FftDirection::kNone);
   inPlace_ = std::exchange(other.inPlace_, false);
   made_ = std::exchange(other.made_, false);
   return *this;
@@ -180,8 +182,8 @@ void fft_plan_c::normalise(fcomplex* out) const {
   }
 }
 
-int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLen, int rowDir,
-                int colDir, int inPlace) {
+int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLen,
+                FftDirection rowDir, FftDirection colDir, int inPlace) {
   VLR_SCOPE("fft_makep_c", kModule);
   if (plan == nullptr) VLR_FAIL("No FFT plan given", 1);
   fft_destp_c(plan);
@@ -191,8 +193,8 @@ int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLe
   if (rowLen < 1 || !validDirection(rowDir)) VLR_FAIL("Row FFT plan failed", 4);
   if (colLen < 1 || !validDirection(colDir)) VLR_FAIL("Column FFT plan failed", 5);
 
-  const bool rowRuns = rowDir != kDirNone && rowLen > 1;
-  const bool colRuns = colDir != kDirNone && colLen > 1;
+  const bool rowRuns = rowDir != FftDirection::kNone && rowLen > 1;
+  const bool colRuns = colDir != FftDirection::kNone && colLen > 1;
   const bool inPlaceRows = inPlace != 0;
   // After a row transform the column transform runs on the output array.
   const bool inPlaceCols = inPlace != 0 || rowRuns;
@@ -222,11 +224,11 @@ int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLe
   }
   plan->rowStride_ = rowStride;
   plan->rowLen_ = rowLen;
-  plan->rowNorm_ = rowRuns && rowDir == kDirBackwardScaled ? 1 : 0;
+  plan->rowNorm_ = rowRuns && rowDir == FftDirection::kBackwardScaled ? 1 : 0;
   plan->rowDir_ = rowDir;
   plan->rows_ = rows;
   plan->colLen_ = colLen;
-  plan->colNorm_ = colRuns && colDir == kDirBackwardScaled ? 1 : 0;
+  plan->colNorm_ = colRuns && colDir == FftDirection::kBackwardScaled ? 1 : 0;
   plan->colDir_ = colDir;
   plan->inPlace_ = inPlace != 0;
   plan->made_ = true;
@@ -259,8 +261,8 @@ int fft_destp_c(fft_plan_c* plan) {
   return 0;
 }
 
-int fft_c(int rowStride, int rowLen, int rows, int colLen, int rowDir, int colDir, fcomplex* in,
-          fcomplex* out) {
+int fft_c(int rowStride, int rowLen, int rows, int colLen, FftDirection rowDir, FftDirection colDir,
+          fcomplex* in, fcomplex* out) {
   VLR_SCOPE("fft_c", kModule);
   fft_plan_c plan;
   VLR_CALL(fft_makep_c(&plan, rowStride, rowLen, rows, colLen, rowDir, colDir, in == out));

@@ -8,10 +8,8 @@
 // along the columns (a batch of rowLen transforms of length colLen, element
 // stride rowStride, distance 1), or both, rows first.
 //
-// Directions: 0 no transform, 1 forward (exponent -2 pi i jk/n), -1 backward
-// followed by division by the length, -2 backward without division.  A
-// dimension of length 1 is never transformed (its transform is the
-// identity).
+// Directions: see FftDirection.  A dimension of length 1 is never
+// transformed (its transform is the identity).
 //
 // Threads: planning (fft_makep_c, fft_c), release (fft_destp_c, the
 // destructor) and the wisdom functions take a process-wide planner lock, as
@@ -34,6 +32,16 @@
 struct fftwf_plan_s;
 
 using fcomplex = std::complex<float>;
+
+// Direction of the transform along one dimension.  The values are those of
+// the integer direction codes used before, so a stored or converted code
+// keeps its meaning; any other value is refused when planning.
+enum class FftDirection : int {
+  kNone = 0,             // no transform
+  kForward = 1,          // exponent -2 pi i jk/n
+  kBackwardScaled = -1,  // backward (+2 pi i jk/n), then division by the length
+  kBackward = -2,        // backward without division
+};
 
 // Planning effort of the plans made after fft_set_effort.
 enum FftEffort {
@@ -84,16 +92,16 @@ class fft_plan_c {
   int rowStride() const { return rowStride_; }
   int rowLen() const { return rowLen_; }
   int rowNorm() const { return rowNorm_; }
-  int rowDir() const { return rowDir_; }
+  FftDirection rowDir() const { return rowDir_; }
   bool hasColumnTransform() const { return col_.valid(); }
   int rows() const { return rows_; }
   int colLen() const { return colLen_; }
   int colNorm() const { return colNorm_; }
-  int colDir() const { return colDir_; }
+  FftDirection colDir() const { return colDir_; }
   bool inPlace() const { return inPlace_; }
 
  private:
-  friend int fft_makep_c(fft_plan_c*, int, int, int, int, int, int, int);
+  friend int fft_makep_c(fft_plan_c*, int, int, int, int, FftDirection, FftDirection, int);
   friend int pfft_c(const fft_plan_c*, fcomplex*, fcomplex*);
   friend int fft_destp_c(fft_plan_c*);
   void copyRegion(const fcomplex* in, fcomplex* out) const;
@@ -103,12 +111,12 @@ class fft_plan_c {
   int rowStride_ = 0;
   int rowLen_ = 0;
   int rowNorm_ = 0;
-  int rowDir_ = 0;
+  FftDirection rowDir_ = FftDirection::kNone;
   FftEngine col_;
   int rows_ = 0;
   int colLen_ = 0;
   int colNorm_ = 0;
-  int colDir_ = 0;
+  FftDirection colDir_ = FftDirection::kNone;
   bool inPlace_ = false;
   bool made_ = false;
 };
@@ -119,8 +127,8 @@ class fft_plan_c {
 // unknown direction, engine failure); 5 the same for the column transform;
 // 7 no memory for the planning arrays.  A plan that held transforms is
 // released first; on failure the plan is left empty.
-int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLen, int rowDir,
-                int colDir, int inPlace);
+int fft_makep_c(fft_plan_c* plan, int rowStride, int rowLen, int rows, int colLen,
+                FftDirection rowDir, FftDirection colDir, int inPlace);
 
 // Runs the row transform (in -> out), then the column transform (from out
 // when a row transform ran, else from in, into out), then the normalisation
@@ -136,8 +144,8 @@ int fft_destp_c(fft_plan_c* plan);
 
 // Plans, runs and releases in one call, in place when in equals out.
 // Returns the planning code, or the code of pfft_c when planning succeeded.
-int fft_c(int rowStride, int rowLen, int rows, int colLen, int rowDir, int colDir, fcomplex* in,
-          fcomplex* out);
+int fft_c(int rowStride, int rowLen, int rows, int colLen, FftDirection rowDir, FftDirection colDir,
+          fcomplex* in, fcomplex* out);
 
 // Planning effort for the plans made from now on.  0; 1 unknown effort.
 int fft_set_effort(int effort);

@@ -11,6 +11,7 @@
 #include <utility>
 #include <vector>
 
+#include "runtime/file_handle.h"
 #include "suite/description_field.h"
 
 class CDescriptionHeader;
@@ -100,7 +101,7 @@ class LineReader {
   LineReader(const LineReader&) = delete;
   LineReader& operator=(const LineReader&) = delete;
 
-  bool isOpen() const { return mFile != nullptr; }
+  bool isOpen() const { return mFile.valid(); }
   // False at the end of the file or at an over-long line.
   bool next(std::string& line);
   bool overlong() const { return mOverlong; }
@@ -110,7 +111,7 @@ class LineReader {
   bool fill();
 
   std::string mPath;
-  FILE* mFile = nullptr;
+  FileHandle mFile;
   int mLineNumber = 0;
   bool mOverlong = false;
   std::vector<char> mBuffer;

@@ -11,10 +11,10 @@
 
 #include <cstdio>
 #include <cstring>
-#include <memory>
 
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
+#include "runtime/file_handle.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
 
@@ -154,7 +154,7 @@ void CDescriptionSection::defineFromKeyFile() {
 
 void CDescriptionSection::defineFromKeyFile(const std::string& keyFilePath) {
   // Closed on every path, raises included (they throw in tests).
-  std::unique_ptr<FILE, int (*)(FILE*)> file(std::fopen(keyFilePath.c_str(), "r"), std::fclose);
+  const FileHandle file(keyFilePath.c_str(), "r");
   FILE* f = file.get();
   if (f == nullptr) {
     NVLR_UTILITY_TracePrint("\nError: missing key file %s\n", keyFilePath.c_str());

@@ -62,24 +62,20 @@ std::string Trimmed(const std::string& text) {
   return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
-LineReader::LineReader(const std::string& path) : mPath(path) {
-  mFile = std::fopen(path.c_str(), "rb");
-}
+LineReader::LineReader(const std::string& path) : mPath(path), mFile(path.c_str(), "rb") {}
 
-LineReader::~LineReader() {
-  if (mFile != nullptr) std::fclose(mFile);
-}
+LineReader::~LineReader() = default;
 
 bool LineReader::fill() {
   if (mBuffer.empty()) mBuffer.resize(kLineChunkBytes);
   mPosition = 0;
-  mEnd = std::fread(mBuffer.data(), 1, mBuffer.size(), mFile);
+  mEnd = std::fread(mBuffer.data(), 1, mBuffer.size(), mFile.get());
   return mEnd > 0;
 }
 
 bool LineReader::next(std::string& line) {
   line.clear();
-  if (mFile == nullptr || mOverlong) return false;
+  if (!mFile.valid() || mOverlong) return false;
   bool any = false;
   for (;;) {
     if (mPosition >= mEnd && !fill()) break;

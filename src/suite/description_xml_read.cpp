@@ -19,6 +19,7 @@
 #include <vector>
 
 #include "runtime/error_codes.h"
+#include "runtime/file_handle.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
@@ -156,9 +157,6 @@ void XMLCALL characterData(void* data, const XML_Char* text, int length) {
 struct ParserFree {
   void operator()(XML_Parser p) const { XML_ParserFree(p); }
 };
-struct FileClose {
-  void operator()(FILE* f) const { std::fclose(f); }
-};
 
 // Feeds the stream to the parser; false on a failure, with the failure traced.
 bool feedParser(FILE* file, XML_Parser parser, ParseState& state, const std::string& path) {
@@ -249,7 +247,7 @@ void RaiseParseError(const char* module, int line, const std::string& path, cons
 XmlTree ParseXmlFile(const std::string& path) {
   ParseState state;
   {
-    std::unique_ptr<FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+    const FileHandle file(path.c_str(), "rb");
     if (!file) {
       state.fail(std::string(), "file cannot be opened");
     } else {

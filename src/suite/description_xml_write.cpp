@@ -20,6 +20,7 @@
 
 #include "runtime/environment.h"
 #include "runtime/error_codes.h"
+#include "runtime/file_handle.h"
 #include "runtime/file_utility.h"
 #include "runtime/process_log.h"
 #include "runtime/raise.h"
@@ -140,14 +141,11 @@ void XMLCALL scanEnd(void* data, const XML_Char*) {
 struct ParserFree {
   void operator()(XML_Parser p) const { XML_ParserFree(p); }
 };
-struct FileClose {
-  void operator()(FILE* f) const { std::fclose(f); }
-};
 
 // The sections of the file at path (the children of its root element).  A
 // previous file that does not parse holds nothing to carry over.
 std::vector<PreviousSection> previousSections(const std::string& path) {
-  std::unique_ptr<FILE, FileClose> file(std::fopen(path.c_str(), "rb"));
+  const FileHandle file(path.c_str(), "rb");
   if (!file) return {};
   std::unique_ptr<XML_ParserStruct, ParserFree> parser(XML_ParserCreate("ISO-8859-1"));
   if (!parser) return {};
@@ -183,8 +181,8 @@ class TemporaryFile {
     mPath = name.data();
     VlrRunOutputBegun(mPath.c_str());
     fchmod(fd, targetMode());
-    mFile = fdopen(fd, "wb");
-    if (mFile == nullptr) {
+    mFile = FileHandle(fdopen(fd, "wb"));
+    if (!mFile.valid()) {
       close(fd);
       discard();
       throw WriteFailure{std::string(), "temporary file cannot be opened"};
@@ -194,12 +192,11 @@ class TemporaryFile {
   TemporaryFile(const TemporaryFile&) = delete;
   TemporaryFile& operator=(const TemporaryFile&) = delete;
 
-  FILE* file() const { return mFile; }
+  FILE* file() const { return mFile.get(); }
 
   void commit() {
-    const bool written = std::fflush(mFile) == 0 && !std::ferror(mFile);
-    const bool closed = std::fclose(mFile) == 0;
-    mFile = nullptr;
+    const bool written = std::fflush(mFile.get()) == 0 && !std::ferror(mFile.get());
+    const bool closed = mFile.close();
     if (!written || !closed) throw WriteFailure{std::string(), "write failure"};
     if (std::rename(mPath.c_str(), mTarget.c_str()) != 0)
       throw WriteFailure{std::string(), std::strerror(errno)};
@@ -208,8 +205,7 @@ class TemporaryFile {
   }
 
   void discard() {
-    if (mFile != nullptr) std::fclose(mFile);
-    mFile = nullptr;
+    mFile.reset();
     if (!mPath.empty()) std::remove(mPath.c_str());
     if (!mPath.empty()) VlrRunOutputRemoved(mPath.c_str());
     mPath.clear();
@@ -227,7 +223,7 @@ class TemporaryFile {
 
   std::string mTarget;
   std::string mPath;
-  FILE* mFile = nullptr;
+  FileHandle mFile;
 };
 
 class XmlHeaderWriter {
@@ -356,7 +352,7 @@ class XmlHeaderWriter {
 
   // The element of the previous file as it stood, at section indentation.
   void copyPrevious(const PreviousSection& section) {
-    std::unique_ptr<FILE, FileClose> in(std::fopen(mPreviousPath.c_str(), "rb"));
+    const FileHandle in(mPreviousPath.c_str(), "rb");
     if (!in || fseeko(in.get(), static_cast<off_t>(section.begin), SEEK_SET) != 0)
       throw WriteFailure{section.name, "previous header cannot be read"};
     put(kIndent);

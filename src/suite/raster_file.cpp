@@ -149,8 +149,7 @@ CRasterFile::~CRasterFile() {
   } catch (...) {
     // A destructor must not throw; the file is released below in any case.
   }
-  if (mStream != nullptr) std::fclose(mStream);
-  mStream = nullptr;
+  mStream.reset();
   mRasterStatus = CVLR_RF_CLOSE;
 }
 
@@ -181,11 +180,10 @@ void CRasterFile::openRead(const char* fileName, CDescriptionHeader& header) {
         // The description is checked before the file is opened, so a refused
         // header leaves the object closed.
         describe(header);
-        mStream = openStream(mFileName, "rb");
+        mStream = FileHandle(openStream(mFileName, "rb"));
         mRasterStatus = CVLR_RF_READ;
-        if (fseeko(mStream, static_cast<off_t>(mHeaderLen), SEEK_SET) != 0) {
-          std::fclose(mStream);
-          mStream = nullptr;
+        if (fseeko(mStream.get(), static_cast<off_t>(mHeaderLen), SEEK_SET) != 0) {
+          mStream.reset();
           mRasterStatus = CVLR_RF_CLOSE;
           NVLR_UTILITY_RaiseError(vlr::kCodeFileWrite, kModule, __LINE__, mFileName.c_str());
         }
@@ -204,13 +202,12 @@ void CRasterFile::openWrite(const char* fileName, CDescriptionHeader& header) {
         requireClosed(mRasterStatus, name, "output");
         mFileName = name;
         describe(header);
-        mStream = openStream(mFileName, "wb");
+        mStream = FileHandle(openStream(mFileName, "wb"));
         // The header bytes are zeros: extending the empty file gives them without
         // writing them one by one.
-        if (ftruncate(fileno(mStream), static_cast<off_t>(mHeaderLen)) != 0 ||
-            fseeko(mStream, static_cast<off_t>(mHeaderLen), SEEK_SET) != 0) {
-          std::fclose(mStream);
-          mStream = nullptr;
+        if (ftruncate(fileno(mStream.get()), static_cast<off_t>(mHeaderLen)) != 0 ||
+            fseeko(mStream.get(), static_cast<off_t>(mHeaderLen), SEEK_SET) != 0) {
+          mStream.reset();
           NVLR_UTILITY_RaiseError(vlr::kCodeFileWrite, kModule, __LINE__, mFileName.c_str());
         }
         mRasterStatus = CVLR_RF_WRITE;
@@ -307,14 +304,15 @@ void CRasterFile::describe(CDescriptionHeader& header) {
 void CRasterFile::seekLinePosition(int64_t line, bool forWrite) {
   if (line == mLinePosition) return;
   const int64_t target = mHeaderLen + line * mRecordLen;
-  if (mRasterStatus == CVLR_RF_WRITE || mRasterStatus == CVLR_RF_READ_WRITE) std::fflush(mStream);
+  if (mRasterStatus == CVLR_RF_WRITE || mRasterStatus == CVLR_RF_READ_WRITE)
+    std::fflush(mStream.get());
   mStreamPositioningUsed = true;
-  if (fseeko(mStream, static_cast<off_t>(target), SEEK_SET) == 0) {
+  if (fseeko(mStream.get(), static_cast<off_t>(target), SEEK_SET) == 0) {
     mLinePosition = line;
     return;
   }
   const int error = errno;
-  const int64_t actual = static_cast<int64_t>(ftello(mStream));
+  const int64_t actual = static_cast<int64_t>(ftello(mStream.get()));
   NVLR_UTILITY_TracePrint("ERROR : _lseeki64 errno = %d\nFILE : %s\nmLinePosition : %lld\n", error,
                           mFileName.c_str(), static_cast<long long>(mLinePosition));
   NVLR_UTILITY_TracePrint("offset : %lld\nthis_pos : %lld\n", static_cast<long long>(target),
@@ -365,7 +363,7 @@ void CRasterFile::readLines(int firstLine, int lineCount, int firstColumn, int l
         unsigned char* out = static_cast<unsigned char*>(destination);
         for (int64_t line = firstLine; line <= lastLine; ++line) {
           seekLinePosition(line, false);
-          const size_t got = std::fread(mLineBuffer.data(), 1, mLineBuffer.size(), mStream);
+          const size_t got = std::fread(mLineBuffer.data(), 1, mLineBuffer.size(), mStream.get());
           if (got != mLineBuffer.size()) {
             NVLR_UTILITY_TracePrint("Read file  ERROR : STATUS %d\n", mRasterStatus);
             NVLR_UTILITY_TracePrint(
@@ -423,7 +421,7 @@ void CRasterFile::writeLines(int firstLine, int lineCount, const void* source) {
             swapValues(pixels, pixelBytes, mBytesPerPixel / mDataNbr);
           in += pixelBytes;
           seekLinePosition(line, true);
-          if (std::fwrite(mLineBuffer.data(), 1, mLineBuffer.size(), mStream) !=
+          if (std::fwrite(mLineBuffer.data(), 1, mLineBuffer.size(), mStream.get()) !=
               mLineBuffer.size()) {
             NVLR_UTILITY_TracePrint("Write file ERROR : line %lld of %s  errno = %d\n",
                                     static_cast<long long>(line), mFileName.c_str(), errno);
@@ -458,7 +456,7 @@ void CRasterFile::close() {
             std::fill(mLineBuffer.begin(), mLineBuffer.end(), 0);
             for (int64_t line = mMaxLineWritten; line < mNrOfLinesPerImage && written; ++line) {
               seekLinePosition(line, true);
-              written = std::fwrite(mLineBuffer.data(), 1, mLineBuffer.size(), mStream) ==
+              written = std::fwrite(mLineBuffer.data(), 1, mLineBuffer.size(), mStream.get()) ==
                         mLineBuffer.size();
               mLinePosition = written ? line + 1 : -1;
             }
@@ -466,14 +464,13 @@ void CRasterFile::close() {
           }
           // The footer is zeros too; extending the file gives them.
           const int64_t total = mHeaderLen + mNrOfLinesPerImage * mRecordLen + mFooterLen;
-          written = written && std::fflush(mStream) == 0;
+          written = written && std::fflush(mStream.get()) == 0;
           if (written && mFooterLen > 0) {
-            written = ftruncate(fileno(mStream), static_cast<off_t>(total)) == 0;
+            written = ftruncate(fileno(mStream.get()), static_cast<off_t>(total)) == 0;
           }
         }
         // A write-mode stream reports lost data only when it is closed.
-        written = std::fclose(mStream) == 0 && written;
-        mStream = nullptr;
+        written = mStream.close() && written;
         const int status = mRasterStatus;
         mRasterStatus = CVLR_RF_CLOSE;
         mLineBuffer.clear();

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "runtime/file_handle.h"
+
 class CDescriptionHeader;
 
 enum CVLR_RasterStatus {
@@ -66,7 +68,7 @@ class CRasterFile {
   [[noreturn]] void escaped(const char* what);
 
   std::string mFileName;
-  FILE* mStream = nullptr;
+  FileHandle mStream;
   int mRasterStatus = CVLR_RF_CLOSE;
   int mCellType = -1;
   int mDataUnits = -1;

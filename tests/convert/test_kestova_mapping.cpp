@@ -46,7 +46,7 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
   const double nearTime = value(s, "NearRangeTime"), farTime = value(s, "FarRangeTime");
   for (int i = 0; i < 3; ++i)
     EXPECT_NEAR(D(h, "SlantRange", i),
-                (nearTime + i * (farTime - nearTime) / 2) * kHalfSpeedOfLight, 0.05);
+                (nearTime + i * (farTime - nearTime) / 2) * convert_test::kHalfSpeedOfLight, 0.05);
   EXPECT_NEAR(D(h, "FastTime"), nearTime, 3e-10);
   EXPECT_NEAR(D(h, "PixelSpacingRg"), value("Scene", "RangeSpacing"), 1e-6);
   // The generator's spacing: ground distance per line at mid swath.

@@ -3,8 +3,9 @@
 #include <cstring>
 #include <vector>
 
-#include "metadata_framework/general_sar_base.h"
 #include "metadata_fixture.h"
+#include "metadata_framework/general_sar_base.h"
+#include "metadata_framework/tessal_xml.h"
 
 namespace {
 
@@ -171,6 +172,44 @@ TEST_F(SectionTest, SectionsShareAChannelAndRewritingOneLeavesTheOther) {
   EXPECT_EQ(first.value, 5.5);
   EXPECT_EQ(second.value, 2.5);
   EXPECT_EQ(other.value, 3.5);
+}
+
+// Sections written while the file is held go into one document in memory:
+// readers see them, the file is written once at save(), byte for byte as the
+// same writes one by one make it, and a hold given up leaves the file alone.
+TEST_F(SectionTest, HeldDocumentIsWrittenOnceAsTheSectionsWouldWriteIt) {
+  const std::string held = path("held.xml");
+  const std::string direct = path("direct.xml");
+  const std::string other = path("other.xml");
+  const auto writeAll = [](const std::string& f) {
+    ASSERT_EQ(Single(2.5).writeAuxiliaryFile(f.c_str(), 1, "First"), 0);
+    ASSERT_EQ(Single(3.5).writeAuxiliaryFile(f.c_str(), 2, "First"), 0);
+    ASSERT_EQ(Single(4.5).writeAuxiliaryFile(f.c_str(), 1, "Old"), 0);
+  };
+  for (const std::string& f : {held, direct})
+    ASSERT_EQ(Single(1.0).writeAuxiliaryFile(f.c_str(), 1, "Old"), 0);
+  const std::string before = slurp(held);
+  writeAll(direct);
+  {
+    HeldXmlDocument hold(held.c_str());
+    writeAll(held);
+    ASSERT_EQ(Single(9.5).writeAuxiliaryFile(other.c_str(), 1, "First"), 0);
+    EXPECT_EQ(slurp(held), before);
+    EXPECT_NE(slurp(other).find("<Value>9.5</Value>"), std::string::npos);
+    Single seen;
+    ASSERT_TRUE(seen.readAuxiliaryFile(held.c_str(), 2, "First"));
+    EXPECT_EQ(seen.value, 3.5);
+    ASSERT_EQ(hold.save(), 0);
+  }
+  EXPECT_EQ(slurp(held), slurp(direct));
+
+  {
+    HeldXmlDocument abandoned(held.c_str());
+    ASSERT_EQ(Single(7.5).writeAuxiliaryFile(held.c_str(), 1, "Old"), 0);
+  }
+  EXPECT_EQ(slurp(held), slurp(direct));
+  ASSERT_EQ(Single(8.5).writeAuxiliaryFile(held.c_str(), 1, "Old"), 0);
+  EXPECT_NE(slurp(held).find("<Value>8.5</Value>"), std::string::npos);
 }
 
 TEST_F(SectionTest, CopiesReadIntoTheirOwnMembers) {

@@ -41,6 +41,12 @@ std::vector<cd> Dft(const std::vector<cd>& x, int dir) {
   return out;
 }
 
+// The wrappers' direction from a code of the tables: 1 forward, -1 backward
+// divided by n, -2 backward, 0 none; other codes are invalid directions.
+FftDirection Dir(int code) {
+  return static_cast<FftDirection>(code);
+}
+
 Matrix Random(size_t n, unsigned seed) {
   std::mt19937 rng(seed);
   std::uniform_real_distribution<float> u(-1.0f, 1.0f);
@@ -95,9 +101,9 @@ void CheckPlan(const Geometry& g) {
   const std::vector<cd> reference = Reference(in, g);
   for (int inPlace : {1, 0}) {
     fft_plan_c plan;
-    ASSERT_EQ(
-        fft_makep_c(&plan, g.rowStride, g.rowLen, g.rows, g.colLen, g.rowDir, g.colDir, inPlace),
-        0);
+    ASSERT_EQ(fft_makep_c(&plan, g.rowStride, g.rowLen, g.rows, g.colLen, Dir(g.rowDir),
+                          Dir(g.colDir), inPlace),
+              0);
     Matrix work = in, out(in.size(), sentinel);
     ASSERT_EQ(pfft_c(&plan, work.data(), inPlace ? work.data() : out.data()), 0);
     std::vector<cd> want = reference;
@@ -132,20 +138,20 @@ TEST(FftWrappers, ArraysThatDoNotFitThePlan) {
   Matrix in = Random(32, 3), out(32), got(32);
   fft_plan_c plan;
   // A dimension of length 1 is the identity: out of place it still fills out.
-  ASSERT_EQ(fft_makep_c(&plan, 1, 1, 32, 1, 1, 0, 0), 0);
+  ASSERT_EQ(fft_makep_c(&plan, 1, 1, 32, 1, Dir(1), Dir(0), 0), 0);
   EXPECT_FALSE(plan.hasRowTransform());
   EXPECT_EQ(pfft_c(&plan, in.data(), out.data()), 0);
   EXPECT_EQ(out[0], in[0]);
   // An in-place plan given two arrays fills out and leaves the input.
   const Matrix before = in;
-  ASSERT_EQ(fft_c(32, 32, 1, 1, 1, 0, in.data(), out.data()), 0);
-  ASSERT_EQ(fft_makep_c(&plan, 32, 32, 1, 1, 1, 0, 1), 0);
+  ASSERT_EQ(fft_c(32, 32, 1, 1, Dir(1), Dir(0), in.data(), out.data()), 0);
+  ASSERT_EQ(fft_makep_c(&plan, 32, 32, 1, 1, Dir(1), Dir(0), 1), 0);
   EXPECT_EQ(pfft_c(&plan, in.data(), got.data()), 0);
   EXPECT_EQ(in, before);
   EXPECT_EQ(got, out);
   // An out-of-place plan cannot run on one array; a moved-from or released
   // plan cannot run at all.
-  ASSERT_EQ(fft_makep_c(&plan, 32, 32, 1, 1, 1, 0, 0), 0);
+  ASSERT_EQ(fft_makep_c(&plan, 32, 32, 1, 1, Dir(1), Dir(0), 0), 0);
   EXPECT_EQ(pfft_c(&plan, in.data(), in.data()), 1);
   EXPECT_EQ(pfft_c(&plan, in.data(), nullptr), 1);
   fft_plan_c moved(std::move(plan));
@@ -164,7 +170,8 @@ TEST(FftWrappers, PlanningCodes) {
                           {1, 1, 1, 1, 1, 1, 0}};
   for (const auto& c : cases) {
     fft_plan_c plan;
-    EXPECT_EQ(fft_makep_c(&plan, c[0], c[1], c[2], c[3], c[4], c[5], 0), c[6]) << c[0] << c[1];
+    EXPECT_EQ(fft_makep_c(&plan, c[0], c[1], c[2], c[3], Dir(c[4]), Dir(c[5]), 0), c[6])
+        << c[0] << c[1];
     EXPECT_EQ(plan.made(), c[6] == 0);
   }
 }
@@ -173,7 +180,7 @@ TEST(FftWrappers, OnePlanRunsFromTwoThreadsAndOnMisalignedArrays) {
   const Geometry g{2048, 2048, 8, 8, 1, 0};
   const size_t total = 2048 * 8;
   fft_plan_c plan;
-  ASSERT_EQ(fft_makep_c(&plan, g.rowStride, g.rowLen, g.rows, g.colLen, 1, 0, 1), 0);
+  ASSERT_EQ(fft_makep_c(&plan, g.rowStride, g.rowLen, g.rows, g.colLen, Dir(1), Dir(0), 1), 0);
   const Matrix startA = Random(total, 21), startB = Random(total, 22);
   Matrix wantA = startA, wantB = startB, a, b;
   ASSERT_EQ(pfft_c(&plan, wantA.data(), wantA.data()), 0);
@@ -205,7 +212,7 @@ TEST(FftWrappers, WisdomRoundTrip) {
   EXPECT_EQ(fft_import_wisdom(dir.c_str()), 0);  // nothing saved yet
   ASSERT_EQ(fft_set_effort(kFftMeasure), 0);
   fft_plan_c plan;
-  ASSERT_EQ(fft_makep_c(&plan, 96, 96, 4, 4, 1, 0, 0), 0);
+  ASSERT_EQ(fft_makep_c(&plan, 96, 96, 4, 4, Dir(1), Dir(0), 0), 0);
   ASSERT_EQ(fft_set_effort(kFftEstimate), 0);
   EXPECT_EQ(fft_set_effort(7), 1);
   EXPECT_EQ(fft_export_wisdom(dir.c_str()), 0);
