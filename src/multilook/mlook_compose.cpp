@@ -228,8 +228,8 @@ void mlook::gridline(int line, double* nodes) const {
 }
 
 int mlook::resampledRangeTime(int column, int line, double* range) const {
-  if (conf_->geometry() != OutputGeometry::kGroundRange || gridTimes_.empty() || column < 0 || column >= outputSamples_ ||
-      line < 0 || line >= outputLines_)
+  if (conf_->geometry() != OutputGeometry::kGroundRange || gridTimes_.empty() || column < 0 ||
+      column >= outputSamples_ || line < 0 || line >= outputLines_)
     return vlr::kLibInconsistent;
   GroundLine axis;
   GeneralSAR* headers[kMlookSwaths];
