@@ -166,10 +166,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   // when its header states one, else at an arbitrary time.
   const std::string path = Write("DOR_VOR_AX", data, size);
   double start = 7.0e8;
-  if (size >= kMphSize) parse_doris_time(reinterpret_cast<const char*>(data) + 352, 27, &start);
+  if (size >= kMphSize)
+    parse_doris_time(reinterpret_cast<const char*>(data) + kMphSensingStart.offset,
+                     kMphSensingStart.width, &start);
   double pos[15], vel[15], anx = 0.0;
   int orbit = 0;
-  (void)interp_orb_l(path.c_str(), start + 30.0, 5, 5.0, pos, vel, &orbit, 1, &anx);
+  for (int wantAnx : {0, 1})
+    (void)interp_orb_l(path.c_str(), start + 30.0, 5, 5.0, pos, vel, &orbit, wantAnx, &anx);
 #elif defined(VLR_FUZZ_AUX)
   // XCA (antenna patterns) and INS (droop gains) auxiliary files.
   const std::string path = Write("ASA_AUX", data, size);
