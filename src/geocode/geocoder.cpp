@@ -91,8 +91,7 @@ struct Worker {
 
 class Geocoder {
  public:
-  Geocoder(const MlookRadarGrid& grid, const MapGrid& map, const ImageFile& image)
-      : grid_(grid), map_(map), image_(image) {}
+  Geocoder(const MlookRadarGrid& grid, const ImageFile& image) : grid_(grid), image_(image) {}
 
   // The orbit's inverse geometry reports through the process-wide call
   // tree, so the nodes are solved on the calling thread only.
@@ -216,7 +215,6 @@ class Geocoder {
   }
 
   const MlookRadarGrid& grid_;
-  const MapGrid& map_;
   const ImageFile& image_;
 };
 
@@ -266,7 +264,7 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
   if (!writer.create(output, map, kGeocodeNoData, kTile, message))
     VLR_FAIL(message->c_str(), vlr::kLibWrite);
 
-  Geocoder geocoder(grid, map, file);
+  Geocoder geocoder(grid, file);
   Lattice lattice;
   lattice.columns = (map.width - 1) / kLookupStep + 2;
   std::mutex writing;
