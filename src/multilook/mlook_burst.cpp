@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <exception>
 #include <memory>
 #include <mutex>
 #include <new>
@@ -459,6 +460,7 @@ int mlook::processswaths() {
   const int total = kMlookSwaths * burstCount_;
   std::mutex mutex;
   bool failed = false;
+  std::exception_ptr raised;
   int done = 0;  // bursts finished
   // Takes the next burst for the calling thread: false when none is left
   // (or a burst failed).  Called with the mutex held.
@@ -486,10 +488,20 @@ int mlook::processswaths() {
       if (reports) {
         // Progress goes to the working file from the calling thread only.
         const int percent = static_cast<int>(100LL * done / total);
+        // A withdrawn run raises here: the burst loop stops and the raise
+        // goes on once the other thread is done with the buffers.
         lock.unlock();
-        getAndSetPerc(percentShown_, percent, kProgressTitle);
-        percentShown_ = percent;
+        try {
+          getAndSetPerc(percentShown_, percent, kProgressTitle);
+          percentShown_ = percent;
+        } catch (...) {
+          raised = std::current_exception();
+        }
         lock.lock();
+        if (raised) {
+          failed = true;
+          return;
+        }
       }
       int k = 0, b = 0;
       if (!take(&k, &b)) return;
@@ -503,16 +515,20 @@ int mlook::processswaths() {
   };
   mlook_detail::ParallelChunks(helper_, 2, 1,
                                [&worker](int, int, int thread) { worker(thread == 0); });
+  if (raised) std::rethrow_exception(raised);
   burstsDone_ = done;
   for (int k = 0; k < kMlookSwaths; ++k) {
-    SwathRun& w = *runs[k];
-    if (w.error == BurstError::kNone && !flushswath(&w, outputLines_)) w.error = BurstError::kWrite;
-    transformedLines_[k] = w.transformed;
-    if (w.error == BurstError::kRead) VLR_FAIL("File reading failed!", vlr::kLibRead);
-    if (w.error == BurstError::kWrite) VLR_FAIL("File writing failed!", vlr::kLibWrite);
-    if (w.error == BurstError::kDoppler)
+    const BurstError error = runs[k]->error;
+    if (error == BurstError::kRead) VLR_FAIL("File reading failed!", vlr::kLibRead);
+    if (error == BurstError::kWrite) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+    if (error == BurstError::kDoppler)
       VLR_FAIL("Doppler centroid over Doppler rate is not a number", vlr::kLibInconsistent);
-    if (!w.temp->close()) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+  }
+  for (int k = 0; k < kMlookSwaths; ++k) {
+    SwathRun& w = *runs[k];
+    transformedLines_[k] = w.transformed;
+    if (!flushswath(&w, outputLines_) || !w.temp->close())
+      VLR_FAIL("File writing failed!", vlr::kLibWrite);
   }
   return 0;
 }
