@@ -31,7 +31,6 @@ constexpr const char* kModule = "mlook_v2";
 constexpr const char* kProgressTitle = "MULTILOOK PROCESSING";
 constexpr int kTaperEntries = 101;
 constexpr double kPi = 3.14159265358979323846;
-constexpr int kThreads = 2;
 
 struct CosineTable {
   float value[kTaperEntries];
@@ -56,7 +55,8 @@ const P& PlainSet(const std::vector<P>& family, double az) {
 // in between are interpolated (the Doppler term varies smoothly in range).
 constexpr int kWeightStride = 32;
 
-// Everything one burst line needs; shared read-only by the threads.
+// Everything one burst line needs; set per burst by the thread processing
+// the burst.
 struct LineJob {
   const unsigned char* raw;  // first raw line read
   int firstRawLine;          // burst line of raw
@@ -83,7 +83,7 @@ struct LineJob {
   const fft_plan_c* forward;
   const fft_plan_c* inverse;
   fcomplex* block;
-  fcomplex* lookBuffer[kThreads];
+  fcomplex* lookBuffer;  // one look, inverse transformed in place
   float* ring;
   int ringLines;
   int firstRingLine;
@@ -91,7 +91,7 @@ struct LineJob {
 
 enum LineWeights { kAllZero, kAllOne, kPartly };
 
-// A raster opened for positioned reads from several threads.
+// A raster opened for positioned reads.
 class RawFile {
  public:
   explicit RawFile(const char* name) : name_(name) {}
@@ -204,7 +204,7 @@ void CopyPeriodic(const fcomplex* from, int n, int first, int count, fcomplex* t
 }
 
 // Processes line j of the burst; true when it went through the transforms.
-bool ProcessLine(const LineJob& job, int j, int thread) {
+bool ProcessLine(const LineJob& job, int j) {
   const LineWeights weights = Classify(job, j);
   if (weights == kAllZero) return false;
   fcomplex* row = job.block + static_cast<size_t>(j) * job.fftLength;
@@ -221,7 +221,7 @@ bool ProcessLine(const LineJob& job, int j, int thread) {
     return false;
   }
   pfft_c(job.forward, row, row);
-  fcomplex* look = job.lookBuffer[thread];
+  fcomplex* look = job.lookBuffer;
   const int m = job.lookLength, h = job.halfWidth, n = job.fftLength;
   for (int l = 0; l < job.looks; ++l) {
     // The sub-band around the look centre, moved to zero frequency: the
@@ -349,7 +349,7 @@ void mlook::processburst(SwathRun* w, int b) const {
     w->error = BurstError::kRead;
     return;
   }
-  for (int j = first; j < last; ++j) w->transformed += ProcessLine(job, j, 0) ? 1 : 0;
+  for (int j = first; j < last; ++j) w->transformed += ProcessLine(job, j) ? 1 : 0;
 }
 
 int mlook::setupswath(int k, SwathRun* w) {
@@ -428,7 +428,7 @@ int mlook::setupswath(int k, SwathRun* w) {
   job.forward = &w->forward;
   job.inverse = &w->inverse;
   job.block = w->block.data();
-  job.lookBuffer[0] = w->look.data();
+  job.lookBuffer = w->look.data();
   job.ring = w->ring.data();
   job.ringLines = L;
 
