@@ -461,7 +461,8 @@ int mlook::processswaths() {
   std::mutex mutex;
   bool failed = false;
   std::exception_ptr raised;
-  int done = 0;  // bursts finished
+  int done = 0;      // bursts finished
+  int reported = 0;  // bursts whose start the progress has shown
   // Takes the next burst for the calling thread: false when none is left
   // (or a burst failed).  Called with the mutex held.
   auto take = [&](int* k, int* b) {
@@ -482,14 +483,21 @@ int mlook::processswaths() {
     runs[*k]->busy = true;
     return true;
   };
+  auto busyCount = [&runs] {
+    int n = 0;
+    for (const auto& r : runs) n += r->busy ? 1 : 0;
+    return n;
+  };
   auto worker = [&](bool reports) {
     std::unique_lock<std::mutex> lock(mutex);
     for (;;) {
-      if (reports) {
-        // Progress goes to the working file from the calling thread only.
-        const int percent = static_cast<int>(100LL * done / total);
-        // A withdrawn run raises here: the burst loop stops and the raise
-        // goes on once the other thread is done with the buffers.
+      // Progress goes to the working file from the calling thread only: the
+      // share of bursts begun, for every burst begun since the last report
+      // (the other thread's too), so that no percentage is left out.  A
+      // withdrawn run raises here: the burst loop stops and the raise goes
+      // on once the other thread is done with the buffers.
+      while (reports && !raised && reported < total && reported <= done + busyCount()) {
+        const int percent = static_cast<int>(100LL * reported / total);
         lock.unlock();
         try {
           getAndSetPerc(percentShown_, percent, kProgressTitle);
@@ -498,10 +506,11 @@ int mlook::processswaths() {
           raised = std::current_exception();
         }
         lock.lock();
-        if (raised) {
-          failed = true;
-          return;
-        }
+        ++reported;
+      }
+      if (raised) {
+        failed = true;
+        return;
       }
       int k = 0, b = 0;
       if (!take(&k, &b)) return;
