@@ -108,18 +108,13 @@ class mlook {
  private:
   struct SwathPlan;
   struct Burst;
-  struct SwathRun;
-  enum class BurstError { kNone, kRead, kWrite, kDoppler };
 
   int readswath(int k, const char* header, bool kestova);
   int checkbursts();
   int setuprange();
   int readbursttimes(int k, std::vector<double>* times);
   int timing();
-  int setupswath(int k, SwathRun* w);
-  int processswaths();
-  void processburst(SwathRun* w, int b) const;
-  bool flushswath(SwathRun* w, int upTo) const;
+  int processswath(int k);
   int composeswaths();
   int groundgrid();
   void gridline(int line, double* nodes) const;

@@ -253,7 +253,7 @@ int mlook::run() {
   mlook_detail::HelperThread helper;
   helper_ = &helper;
   int rc = 0;
-  rc = processswaths();
+  for (int k = 0; k < kMlookSwaths && rc == 0; ++k) rc = processswath(k);
   if (rc == 0) rc = composeswaths();
   helper_ = nullptr;
   VLR_CALL(rc);
