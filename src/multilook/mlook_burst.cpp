@@ -29,6 +29,8 @@ constexpr int kTaperEntries = 101;
 constexpr double kPi = 3.14159265358979323846;
 constexpr int kTempBufferBytes = 1 << 20;
 constexpr int kThreads = 2;
+// Burst lines a thread reads and processes at a time.
+constexpr int kChunkLines = 4;
 
 struct CosineTable {
   float value[kTaperEntries];
@@ -359,11 +361,12 @@ int mlook::processswath(int k) {
     const int64_t offset = in.line_offset(static_cast<int64_t>(b) * L + first);
     int transformed[kThreads] = {};
     bool readFailed[kThreads] = {};
-    mlook_detail::ParallelRange(
-        helper_, last - first,
-        [&job, &transformed, &readFailed, &raster, first, offset, lineLength, &raw](int from,
-                                                                                    int to) {
-          const int thread = from == 0 ? 0 : 1;
+    // Both threads take a few lines at a time, read them and process them.
+    mlook_detail::ParallelChunks(
+        helper_, last - first, kChunkLines,
+        [&job, &transformed, &readFailed, &raster, first, offset, lineLength, &raw](
+            int from, int to, int thread) {
+          if (readFailed[thread]) return;
           if (!raster.read(raw.data() + from * lineLength, (to - from) * lineLength,
                            offset + from * lineLength)) {
             readFailed[thread] = true;

@@ -28,6 +28,11 @@ constexpr const char* kProgressTitle = "MULTILOOK SWATHS RECOMPOSITION";
 constexpr int kProgressLines = 25;
 constexpr double kDefaultReferenceRange = 800000.0;  // m
 constexpr int kBufferBytes = 1 << 20;
+// Output lines read, composed and written together; both threads compose
+// the lines of a block, a few at a time.
+constexpr int kBlockLines = 32;
+constexpr int kComposeChunk = 2;
+constexpr int kComposeThreads = 2;
 // Interpolation kernels of the ground-range resampling.
 constexpr int kKernelHalf = 6;
 constexpr int kKernelTaps = 2 * kKernelHalf + 1;
@@ -272,11 +277,14 @@ int mlook::composeswaths() {
   const double referenceTime = reference / kHalfSpeedOfLight;
   // The composite line with kKernelHalf copies of its edge samples on
   // either side, so that the kernels never leave it.
-  vlr::CkBuffer<float> spread, padded;
+  // One padded composite line per thread; the sub-swath lines of a block of
+  // output lines.
+  vlr::CkBuffer<float> spread, padded[kComposeThreads];
   vlr::CkBuffer<float> lines[kMlookSwaths];
-  bool allocated = spread.allocate(width) && padded.allocate(width + 2 * kKernelHalf);
-  float* composite = padded.data() + kKernelHalf;
-  for (int i = 0; i < kMlookSwaths; ++i) allocated = allocated && lines[i].allocate(lookLength_[i]);
+  bool allocated = spread.allocate(width);
+  for (auto& b : padded) allocated = allocated && b.allocate(width + 2 * kKernelHalf);
+  for (int i = 0; i < kMlookSwaths; ++i)
+    allocated = allocated && lines[i].allocate(static_cast<size_t>(lookLength_[i]) * kBlockLines);
   if (!allocated) VLR_FAIL("Cannot allocate the composition buffers", vlr::kLibAlloc);
   for (int k = 0; k < width; ++k) {
     const double r = (rangeTime_[0] + k * spacing) / referenceTime;
@@ -333,12 +341,14 @@ int mlook::composeswaths() {
     outputSamples_ = width;
     outputFarRangeTime_ = rangeTime_[0] + (width - 1) * spacing;
   }
-  vlr::CkBuffer<float> groundLine;
-  vlr::CkBuffer<double> lineNodes;
+  vlr::CkBuffer<float> outLines;
+  vlr::CkBuffer<double> lineNodes[kComposeThreads];
+  if (!outLines.allocate(static_cast<size_t>(outputSamples_) * kBlockLines))
+    VLR_FAIL("Cannot allocate the output lines", vlr::kLibAlloc);
   if (ground) {
     VLR_CALL(groundgrid());
-    if (!groundLine.allocate(outputSamples_) || !lineNodes.allocate(gridColumns_))
-      VLR_FAIL("Cannot allocate the ground line", vlr::kLibAlloc);
+    for (auto& b : lineNodes)
+      if (!b.allocate(gridColumns_)) VLR_FAIL("Cannot allocate the ground line", vlr::kLibAlloc);
   }
 
   for (int i = 0; i < kMlookSwaths; ++i) {
@@ -363,43 +373,38 @@ int mlook::composeswaths() {
 
   const double tolerance = kNewtonTolerance / fs;
   const int phases = static_cast<int>(kernels.size() / kKernelTaps);
-  int percent = -1;
-  for (int line = 0; line < outputLines_; ++line) {
-    if (line % kProgressLines == 0) {
-      const int now = static_cast<int>(100LL * line / outputLines_);
-      getAndSetPerc(percent, now, kProgressTitle);
-      percent = now;
-    }
+  // Output line `line` from the sub-swath lines at `row` of the block,
+  // into the block's output row.  Only computes: the two threads run it on
+  // different lines.
+  auto composeLine = [&](int line, int row, int thread) {
+    float* composite = padded[thread].data() + kKernelHalf;
+    float* out = outLines.data() + static_cast<size_t>(row) * outputSamples_;
     std::fill(composite, composite + width, 0.0f);
     for (int i = 0; i < kMlookSwaths; ++i) {
-      if (output_->swath[i].read(lines[i].data(),
-                                 static_cast<int64_t>(lookLength_[i]) * sizeof(float)) != 0)
-        VLR_FAIL("File reading failed!", vlr::kLibRead);
-      for (int k = begin[i]; k < end[i]; ++k) composite[k] = lines[i][k - offset_[i]];
+      const float* from = lines[i].data() + static_cast<size_t>(row) * lookLength_[i];
+      for (int k = begin[i]; k < end[i]; ++k) composite[k] = from[k - offset_[i]];
+    }
+    if (!ground) {
+      for (int k = 0; k < width; ++k) out[k] = std::sqrt(std::max(0.0f, composite[k]) * spread[k]);
+      return;
     }
     for (int k = 0; k < width; ++k)
       composite[k] = std::sqrt(std::max(0.0f, composite[k]) * spread[k]);
-    if (!ground) {
-      if (image.write(composite, static_cast<int64_t>(width) * sizeof(float)) != 0)
-        VLR_FAIL("File writing failed!", vlr::kLibWrite);
-      continue;
-    }
+    GroundLine axis;
     axis.set(headers, boundaryTime, outputStartTime_ + line * lineInterval_);
-    std::fill(padded.begin(), composite, composite[0]);
-    std::fill(composite + width, padded.end(), composite[width - 1]);
+    std::fill(padded[thread].begin(), composite, composite[0]);
+    std::fill(composite + width, padded[thread].end(), composite[width - 1]);
     const float* c = composite;
-    float* out = groundLine.data();
     const double step = conf_->GrSamplingStep;
     const double first = rangeTime_[0];
     const float* table = kernels.data();
     const double phaseScale = 1.0 / kKernelStep;
     // This line's range times at the grid's node columns, then between
-    // them.  One thread: handing a line of this cheap work to the helper
-    // costs more than the work.
-    gridline(line, lineNodes.data());
+    // them.
+    double* nodes = lineNodes[thread].data();
+    gridline(line, nodes);
     const int count = outputSamples_;
     const int last = count - 1;
-    const double* nodes = lineNodes.data();
     const int lastNode = gridColumns_ - 1;
     // Composite sample x resampled: the kernel of x's phase around the
     // nearest composite sample; 0 outside the composite line.
@@ -432,7 +437,30 @@ int mlook::composeswaths() {
     }
     out[last] = resample((SampleTime(nodes, lastNode, last, last, axis, step, tolerance) - first) /
                          spacing);
-    if (image.write(out, static_cast<int64_t>(outputSamples_) * sizeof(float)) != 0)
+  };
+  // Blocks of lines: read on this thread, composed on both, written here.
+  int percent = -1;
+  for (int block = 0; block < outputLines_; block += kBlockLines) {
+    const int count = std::min(kBlockLines, outputLines_ - block);
+    for (int line = block; line < block + count; ++line) {
+      if (line % kProgressLines == 0) {
+        const int now = static_cast<int>(100LL * line / outputLines_);
+        getAndSetPerc(percent, now, kProgressTitle);
+        percent = now;
+      }
+    }
+    for (int i = 0; i < kMlookSwaths; ++i) {
+      if (output_->swath[i].read(lines[i].data(),
+                                 static_cast<int64_t>(lookLength_[i]) * count * sizeof(float)) != 0)
+        VLR_FAIL("File reading failed!", vlr::kLibRead);
+    }
+    mlook_detail::ParallelChunks(helper_, count, kComposeChunk,
+                                 [&composeLine, block](int from, int to, int thread) {
+                                   for (int row = from; row < to; ++row)
+                                     composeLine(block + row, row, thread);
+                                 });
+    if (image.write(outLines.data(),
+                    static_cast<int64_t>(outputSamples_) * count * sizeof(float)) != 0)
       VLR_FAIL("File writing failed!", vlr::kLibWrite);
   }
   for (int i = 0; i < kMlookSwaths; ++i) output_->swath[i].close();

@@ -3,6 +3,7 @@
 // starting a thread each time.
 #pragma once
 
+#include <algorithm>
 #include <atomic>
 #include <condition_variable>
 #include <functional>
@@ -43,7 +44,9 @@ class HelperThread {
   HelperThread& operator=(const HelperThread&) = delete;
 
   // Runs `theirs` on the helper and `mine` on the calling thread; returns
-  // when both have finished.
+  // when both have finished.  When the helper has not taken `theirs` by the
+  // time `mine` is done (it was asleep or not scheduled), the calling thread
+  // takes it back and runs it itself rather than wait for the helper.
   void run(const std::function<void()>& theirs, const std::function<void()>& mine) {
     if (!thread_.joinable()) {
       mine();
@@ -57,7 +60,12 @@ class HelperThread {
     }
     wake_.notify_one();
     mine();
-    // The halves take about as long: wait briefly before sleeping.
+    if (task_.exchange(nullptr, std::memory_order_acq_rel) != nullptr) {
+      theirs();
+      return;
+    }
+    // The helper took the task: the halves take about as long, so wait
+    // briefly before sleeping.
     for (int i = 0; i < kSpins && !done_.load(std::memory_order_acquire); ++i) Relax();
     if (done_.load(std::memory_order_acquire)) return;
     std::unique_lock<std::mutex> lock(mutex_);
@@ -69,25 +77,28 @@ class HelperThread {
   // more than the short loops it runs.
   static constexpr int kSpins = 1 << 15;
 
+  // A task is claimed by whoever takes it out of task_ first: the helper
+  // here, or the calling thread in run() when the helper came too late.
   void loop() {
     for (;;) {
       const std::function<void()>* task = nullptr;
       for (int i = 0; i < kSpins && task == nullptr && !stop_.load(std::memory_order_acquire);
            ++i) {
-        task = task_.load(std::memory_order_acquire);
+        if (task_.load(std::memory_order_acquire) != nullptr)
+          task = task_.exchange(nullptr, std::memory_order_acq_rel);
         if (task == nullptr) Relax();
       }
-      if (task == nullptr) {
+      if (task == nullptr && !stop_.load(std::memory_order_acquire)) {
         std::unique_lock<std::mutex> lock(mutex_);
         wake_.wait(lock, [this] {
           return stop_.load(std::memory_order_acquire) ||
                  task_.load(std::memory_order_acquire) != nullptr;
         });
-        task = task_.load(std::memory_order_acquire);
+        task = task_.exchange(nullptr, std::memory_order_acq_rel);
       }
       if (stop_.load(std::memory_order_acquire)) return;
+      if (task == nullptr) continue;
       (*task)();
-      task_.store(nullptr, std::memory_order_relaxed);
       {
         std::lock_guard<std::mutex> lock(mutex_);
         done_.store(true, std::memory_order_release);
@@ -104,17 +115,26 @@ class HelperThread {
   std::thread thread_;
 };
 
-// Runs body(first, last) over [0, count), the upper half on the helper.
-// The body must only compute: no report, no call graph, no checked
-// allocation.
+// Runs body(first, last, thread) over [0, count) in pieces of `chunk`
+// items that the calling thread (thread 0) and the helper (thread 1) take in
+// turn as they become free, so that a late or slowed helper leaves its share
+// to the calling thread.  The body must only compute: no report, no call
+// graph, no checked allocation.
 template <class Body>
-void ParallelRange(HelperThread* helper, int count, const Body& body) {
-  const int half = count / 2;
-  if (half < 1 || helper == nullptr) {
-    body(0, count);
+void ParallelChunks(HelperThread* helper, int count, int chunk, const Body& body) {
+  std::atomic<int> next{0};
+  auto work = [&next, &body, count, chunk](int thread) {
+    for (;;) {
+      const int from = next.fetch_add(chunk, std::memory_order_relaxed);
+      if (from >= count) return;
+      body(from, std::min(from + chunk, count), thread);
+    }
+  };
+  if (count <= chunk || helper == nullptr) {
+    work(0);
     return;
   }
-  helper->run([&body, half, count] { body(half, count); }, [&body, half] { body(0, half); });
+  helper->run([&work] { work(1); }, [&work] { work(0); });
 }
 
 }  // namespace mlook_detail
