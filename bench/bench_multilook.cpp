@@ -150,8 +150,9 @@ int Multilook(int argc, char** argv) {
       std::fprintf(stderr, "%s\n", message.c_str());
       return 1;
     }
-    std::printf("geocode_seconds %.3f\ngeocode_map %d %d\ngeocode_exact %d\n", Since(geocodeStart),
-                map.width, map.height, figures.exactSolutions);
+    std::printf(
+        "geocode_seconds %.3f\ngeocode_map %d %d\ngeocode_exact %d\ngeocode_cog_seconds %.3f\n",
+        Since(geocodeStart), map.width, map.height, figures.exactSolutions, figures.cogSeconds);
     std::printf("geocode_start_rss_mib %.1f\ngeocode_peak_rss_mib %.1f\n", startRss,
                 StatusMib("VmHWM"));
     return 0;

@@ -8,13 +8,18 @@
 #include <ogr_spatialref.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <cmath>
 #include <mutex>
+#include <string>
 
 #include "runtime/run_outputs.h"
 
 namespace {
 
 std::once_flag gRegistered;
+// Tile size of the target COG.
+constexpr int kCogBlock = 512;
 // GDAL's block cache unless the user set one: the map's blocks pass through
 // it on their way to the file, so it bounds the memory the writing takes
 // whatever the size of the map.
@@ -83,14 +88,64 @@ bool CogWriter::create(const std::string& target, const MapGrid& map, float noDa
     discard();
     return false;
   }
+  // Overview levels halve the image until it fits one COG tile, as the COG
+  // driver's own choice does; they are made empty here and filled block by
+  // block, which spares the driver a second pass over the whole image.
+  noData_ = noData;
+  factors_.clear();
+  for (int f = 2; f <= blockSize; f *= 2) {
+    factors_.push_back(f);
+    if ((map.width + f - 1) / f <= kCogBlock && (map.height + f - 1) / f <= kCogBlock) break;
+  }
+  if (std::max(map.width, map.height) <= kCogBlock) factors_.clear();
+  if (!factors_.empty() &&
+      work_->BuildOverviews("NONE", static_cast<int>(factors_.size()), factors_.data(), 0, nullptr,
+                            nullptr, nullptr) != CE_None) {
+    *message = LastGdalError("Cannot make the overviews of the map image");
+    discard();
+    return false;
+  }
   return true;
 }
 
 bool CogWriter::write(int x, int y, int columns, int rows, const float* values) {
   if (work_ == nullptr) return false;
-  return work_->GetRasterBand(1)->RasterIO(GF_Write, x, y, columns, rows,
-                                           const_cast<float*>(values), columns, rows, GDT_Float32,
-                                           0, 0, nullptr) == CE_None;
+  GDALRasterBand* band = work_->GetRasterBand(1);
+  if (band->RasterIO(GF_Write, x, y, columns, rows, const_cast<float*>(values), columns, rows,
+                     GDT_Float32, 0, 0, nullptr) != CE_None)
+    return false;
+  for (size_t level = 0; level < factors_.size(); ++level) {
+    // Each overview pixel is the mean of the valid pixels it covers, NoData
+    // where it covers none.
+    const int f = factors_[level];
+    GDALRasterBand* overview = band->GetOverview(static_cast<int>(level));
+    if (overview == nullptr || x % f != 0 || y % f != 0) return false;
+    const int ox = x / f, oy = y / f;
+    const int oc = std::min((columns + f - 1) / f, overview->GetXSize() - ox);
+    const int orows = std::min((rows + f - 1) / f, overview->GetYSize() - oy);
+    if (oc <= 0 || orows <= 0) continue;
+    reduced_.assign(static_cast<size_t>(oc) * orows, noData_);
+    for (int j = 0; j < orows; ++j) {
+      for (int i = 0; i < oc; ++i) {
+        double sum = 0.0;
+        int count = 0;
+        for (int r = j * f; r < std::min(rows, (j + 1) * f); ++r) {
+          const float* row = values + static_cast<size_t>(r) * columns;
+          for (int c = i * f; c < std::min(columns, (i + 1) * f); ++c) {
+            if (row[c] != noData_ && !std::isnan(row[c])) {
+              sum += row[c];
+              ++count;
+            }
+          }
+        }
+        if (count > 0) reduced_[static_cast<size_t>(j) * oc + i] = static_cast<float>(sum / count);
+      }
+    }
+    if (overview->RasterIO(GF_Write, ox, oy, oc, orows, reduced_.data(), oc, orows, GDT_Float32, 0,
+                           0, nullptr) != CE_None)
+      return false;
+  }
+  return true;
 }
 
 bool CogWriter::finish(std::string* message) {
@@ -107,10 +162,10 @@ bool CogWriter::finish(std::string* message) {
   work_->FlushCache();
   CPLStringList options;
   options.SetNameValue("COMPRESS", "DEFLATE");
-  options.SetNameValue("PREDICTOR", "YES");
-  options.SetNameValue("BLOCKSIZE", "512");
-  options.SetNameValue("OVERVIEWS", "IGNORE_EXISTING");
-  options.SetNameValue("OVERVIEW_RESAMPLING", "AVERAGE");
+  options.SetNameValue("LEVEL", "1");
+  options.SetNameValue("PREDICTOR", "NO");
+  options.SetNameValue("BLOCKSIZE", std::to_string(kCogBlock).c_str());
+  options.SetNameValue("OVERVIEWS", factors_.empty() ? "NONE" : "FORCE_USE_EXISTING");
   options.SetNameValue("NUM_THREADS", "2");
   options.SetNameValue("BIGTIFF", "IF_SAFER");
   unlink(target_.c_str());

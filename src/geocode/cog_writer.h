@@ -1,10 +1,12 @@
 // Writing a float32 map image as a Cloud Optimized GeoTIFF through GDAL:
-// blocks go into a tiled working GeoTIFF beside the target, which GDAL's COG
-// driver then copies into the target with DEFLATE compression, internal
-// tiles and overviews.  The working file is removed in every case.
+// blocks go into a tiled working GeoTIFF beside the target, together with
+// their averages at every overview level, and GDAL's COG driver then copies
+// the image and those overviews into the target with DEFLATE compression.
+// The working file is removed in every case.
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "geocode/map_grid.h"
 
@@ -20,7 +22,10 @@ class CogWriter {
   // Creates the working file for `target`.  False with *message.
   bool create(const std::string& target, const MapGrid& map, float noData, int blockSize,
               std::string* message);
-  // Writes a block of columns x rows values at (x, y).  Not thread-safe.
+  // Writes a block of columns x rows values at (x, y), and its averages into
+  // the overviews.  Blocks start on multiples of the block size given to
+  // create, so that every overview pixel lies within one block.  Not
+  // thread-safe.
   bool write(int x, int y, int columns, int rows, const float* values);
   // Copies the working file into the target COG and removes the working
   // file.  False with *message (no target is left behind then).
@@ -30,6 +35,9 @@ class CogWriter {
   void discard();
 
   GDALDataset* work_ = nullptr;
+  float noData_ = 0.0f;
+  std::vector<int> factors_;  // reduction of each overview level
+  std::vector<float> reduced_;
   std::string target_;
   std::string workName_;
 };

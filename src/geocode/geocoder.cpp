@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <cmath>
 #include <memory>
 #include <mutex>
@@ -324,13 +325,16 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
     *message = std::string("Cannot write the map image ") + output;
     VLR_FAIL(message->c_str(), vlr::kLibWrite);
   }
+  const auto cogStart = std::chrono::steady_clock::now();
   const bool written = writer.finish(message);
+  const std::chrono::duration<double> cogTime = std::chrono::steady_clock::now() - cogStart;
   // GDAL leaves errno set by the files it probed.
   errno = 0;
   if (!written) VLR_FAIL(message->c_str(), vlr::kLibWrite);
   if (figures != nullptr) {
     figures->exactSolutions = exact;
     figures->validPixels = valid;
+    figures->cogSeconds = cogTime.count();
   }
   return 0;
 }

@@ -28,8 +28,9 @@ constexpr int kLookupStep = 16;
 constexpr float kGeocodeNoData = 0.0f;
 
 struct GeocodeFigures {
-  int exactSolutions = 0;  // inverse solutions computed
-  int validPixels = 0;     // map pixels that got a value
+  int exactSolutions = 0;   // inverse solutions computed
+  int validPixels = 0;      // map pixels that got a value
+  double cogSeconds = 0.0;  // time taken by the final Cloud Optimized GeoTIFF copy
 };
 
 // Geocodes the float32 raster `image` (the multilook output, described by

@@ -12,6 +12,7 @@
 #include <array>
 #include <cmath>
 #include <cstdio>
+#include <cstring>
 #include <memory>
 #include <string>
 #include <vector>
@@ -378,6 +379,31 @@ TEST_F(GeocodeProducts, CloudOptimizedGeoTiffThatGdalPlaces) {
   EXPECT_EQ(m.at(m.width - 1, 0), m.noData);
   EXPECT_EQ(m.at(0, m.height - 1), m.noData);
   EXPECT_EQ(m.at(m.width - 1, m.height - 1), m.noData);
+
+  // The first overview, as GDAL reads it: each pixel the mean of the valid
+  // pixels of its 2 x 2 block, NoData where there are none.
+  const std::string overview = work("overview.bin");
+  ASSERT_EQ(
+      synth_test::shell("gdal_translate -q -of ENVI -ovr 0 '" + g.path + "' '" + overview + "'"),
+      0);
+  const std::vector<uint8_t> bytes = synth_test::read_file(overview);
+  const int ow = (m.width + 1) / 2, oh = (m.height + 1) / 2;
+  ASSERT_EQ(bytes.size(), sizeof(float) * ow * oh);
+  size_t wrong = 0;
+  for (int j = 0; j < oh; ++j)
+    for (int i = 0; i < ow; ++i) {
+      double sum = 0.0;
+      int count = 0;
+      for (int y = 2 * j; y < std::min(m.height, 2 * j + 2); ++y)
+        for (int x = 2 * i; x < std::min(m.width, 2 * i + 2); ++x)
+          if (m.at(x, y) != m.noData) sum += m.at(x, y), ++count;
+      float got;
+      std::memcpy(&got, bytes.data() + sizeof(float) * (static_cast<size_t>(j) * ow + i),
+                  sizeof got);
+      const double want = count > 0 ? sum / count : m.noData;
+      if (std::fabs(got - want) > 1e-4 * std::max(1.0, std::fabs(want))) ++wrong;
+    }
+  EXPECT_EQ(wrong, 0u) << "overview pixels that are not the mean of their block";
 
   // The suite header holds the map grid.
   const std::string sml = synth_test::read_text(g.path + ".sml");
