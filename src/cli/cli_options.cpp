@@ -300,24 +300,24 @@ bool ParseCommandLine(int argc, const char* const* argv, Options& o, std::string
       arg.resize(eq);
       inlineValue = true;
     }
-    const OptionRow* spec = findOption(o.command, arg);
-    if (spec == nullptr) {
+    const OptionRow* row = findOption(o.command, arg);
+    if (row == nullptr) {
       error = "unknown option '" + arg + "' for '" + word + "'";
       return false;
     }
-    if (spec->value != nullptr && !inlineValue && spec->takesNext) {
-      if (i + 1 < argc && spec->takesNext(argv[i + 1])) value = argv[++i];
-    } else if (spec->value != nullptr && !inlineValue) {
+    if (row->value != nullptr && !inlineValue && row->takesNext) {
+      if (i + 1 < argc && row->takesNext(argv[i + 1])) value = argv[++i];
+    } else if (row->value != nullptr && !inlineValue) {
       if (i + 1 >= argc) {
-        error = std::string("option ") + spec->name + " needs a value (" + spec->value + ")";
+        error = std::string("option ") + row->name + " needs a value (" + row->value + ")";
         return false;
       }
       value = argv[++i];
-    } else if (spec->value == nullptr && inlineValue) {
-      error = std::string("option ") + spec->name + " takes no value";
+    } else if (row->value == nullptr && inlineValue) {
+      error = std::string("option ") + row->name + " takes no value";
       return false;
     }
-    if (!spec->apply(o, value, error)) return false;
+    if (!row->apply(o, value, error)) return false;
   }
   if (positional.empty()) {
     error = "'" + word + "' needs a PRODUCT";
