@@ -10,17 +10,23 @@
 #include "runtime/call_scope.h"
 #include "runtime/error_codes.h"
 
+// The line timing, size and look side that both geometries share.
+void MlookRadarGrid::setTiming(double firstLineTime, double lineInterval, int lines, int samples,
+                               int lookSign) {
+  firstLineTime_ = firstLineTime;
+  lineInterval_ = lineInterval;
+  lines_ = lines;
+  samples_ = samples;
+  lookSign_ = lookSign < 0 ? -1 : 1;
+}
+
 MlookRadarGrid MlookRadarGrid::Slant(double firstLineTime, double lineInterval, int lines,
                                      int samples, double nearRangeTime, double rangeTimeSpacing,
                                      int lookSign) {
   MlookRadarGrid g;
-  g.firstLineTime_ = firstLineTime;
-  g.lineInterval_ = lineInterval;
-  g.lines_ = lines;
-  g.samples_ = samples;
+  g.setTiming(firstLineTime, lineInterval, lines, samples, lookSign);
   g.nearRangeTime_ = nearRangeTime;
   g.rangeTimeSpacing_ = rangeTimeSpacing;
-  g.lookSign_ = lookSign < 0 ? -1 : 1;
   return g;
 }
 
@@ -28,15 +34,11 @@ MlookRadarGrid MlookRadarGrid::Ground(double firstLineTime, double lineInterval,
                                       int samples, double groundSpacing, int nodeStride,
                                       std::vector<GroundAxisRow> axis, int lookSign) {
   MlookRadarGrid g;
-  g.firstLineTime_ = firstLineTime;
-  g.lineInterval_ = lineInterval;
-  g.lines_ = lines;
-  g.samples_ = samples;
+  g.setTiming(firstLineTime, lineInterval, lines, samples, lookSign);
   g.ground_ = true;
   g.groundSpacing_ = groundSpacing;
   g.nodeStride_ = std::max(1, nodeStride);
   g.axis_ = std::move(axis);
-  g.lookSign_ = lookSign < 0 ? -1 : 1;
   if (!g.axis_.empty()) {
     g.nearRangeTime_ = g.axis_.front().rangeTimes.front();
     g.rangeTimeSpacing_ = 0.0;

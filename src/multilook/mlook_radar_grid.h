@@ -52,6 +52,8 @@ class MlookRadarGrid {
   double column(double rangeTime, double time) const;
 
  private:
+  void setTiming(double firstLineTime, double lineInterval, int lines, int samples, int lookSign);
+
   double rowColumn(const GroundAxisRow& row, double rangeTime) const;
   double rowRangeTime(const GroundAxisRow& row, double column) const;
   // The axis rows around `time` and the weight of the second.
