@@ -2,8 +2,8 @@
 #include <string>
 #include <vector>
 
-#include "metadata_framework/tessal_xml.h"
 #include "metadata_fixture.h"
+#include "metadata_framework/tessal_xml.h"
 
 namespace {
 

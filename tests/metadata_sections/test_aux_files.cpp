@@ -6,11 +6,11 @@
 #include <utility>
 #include <vector>
 
+#include "metadata_fixture.h"
 #include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/sensor_attitude.h"
 #include "metadata_sections/swath_info.h"
-#include "metadata_fixture.h"
 #include "raster/buffer_io.h"
 #include "synth_run.h"
 #include "time/mjd_time.h"

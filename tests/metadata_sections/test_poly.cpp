@@ -3,8 +3,8 @@
 #include <cmath>
 #include <vector>
 
-#include "metadata_sections/poly_families.h"
 #include "metadata_fixture.h"
+#include "metadata_sections/poly_families.h"
 
 namespace {
 

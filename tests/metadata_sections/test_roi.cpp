@@ -1,8 +1,8 @@
-// Regions of interest: indices, corners, intersections, stored forms.
+// Regions of interest: indices, corners, intersections and the older stored forms.
 #include <cmath>
 
-#include "metadata_sections/roi.h"
 #include "metadata_fixture.h"
+#include "metadata_sections/roi.h"
 
 namespace {
 
@@ -79,22 +79,9 @@ TEST_F(RoiTest, Intersections) {
   EXPECT_EQ(out.isNULL(), 1);
 }
 
-TEST_F(RoiTest, StoredAsXmlBlockOrParameterSection) {
-  const std::string file = path("r.hdr");
-  ROI_Obj r;
-  r.SetFastAxe(0.005, 1e-7, 1000);
-  r.SetSlowAxe(7.0e8 + 1.0 / 3.0, 1.0 / 1652.0, 12);
-  ASSERT_EQ(r.write_roi(file.c_str(), "ROI"), 0);
-  ROI_Obj in;
-  ASSERT_EQ(in.read_roi(file.c_str(), "ROI"), 0);
-  EXPECT_EQ(in.SlowStartTime, r.SlowStartTime);
-  EXPECT_EQ(in.FastTimeLength, r.FastTimeLength);
-  EXPECT_EQ(in.Lines, 12);
-  EXPECT_EQ(in.Samples, 1000);
-  const std::string xml = slurp(file);
-  EXPECT_LT(xml.find("<SlowStartTime>"), xml.find("<FastStartTime>"));
-  EXPECT_LT(xml.find("<Lines>"), xml.find("<Samples>"));
-
+// Headers of older releases hold the region as a "[ROI]" section, and the geographic region as
+// corner points.
+TEST_F(RoiTest, OlderParameterForms) {
   const std::string legacy = path("legacy.hdr");
   spit(legacy,
        "\n[ROI]\nSlowStartTime = 10.5\nFastStartTime = 0.004\nSlowTimeDelta = 0.001\n"
@@ -110,39 +97,19 @@ TEST_F(RoiTest, StoredAsXmlBlockOrParameterSection) {
   const std::string noSamples = path("nosamples.hdr");
   spit(noSamples, "\n[ROI]\nLines = 5\nSlowStartTime = 1\n");
   EXPECT_EQ(none.read_roi(noSamples.c_str(), "ROI"), 1);
-}
 
-TEST_F(RoiTest, CoordinatesBlockAndLegacyCorners) {
-  const std::string file = path("c.hdr");
-  ROI_Coords c;
-  c.SetFastAxe(45.0, 0.1, 3);  // latitude
-  c.SetSlowAxe(7.0, 0.25, 8);  // longitude
-  ASSERT_EQ(c.writehdr(file.c_str()), 0);
-  const std::string xml = slurp(file);
-  EXPECT_NE(xml.find("<Coordinates>\n      <LongitudeStart>7</LongitudeStart>"), std::string::npos)
-      << xml;
-  EXPECT_EQ(xml.find("Samples"), std::string::npos);
-  ROI_Coords in;
-  ASSERT_EQ(in.readhdr(file.c_str()), 0);
-  EXPECT_EQ(in.FastStartTime, 45.0);
-  EXPECT_EQ(in.Samples, 3);  // 0.30000000000000004 / 0.1 counts three steps
-  EXPECT_EQ(in.Lines, 8);
-
-  const std::string legacy = path("cl.hdr");
-  spit(legacy,
+  const std::string corners = path("cl.hdr");
+  spit(corners,
        "\n[Coordinates]\nUpLeft = {7.0 46.0}\nUpRight = {9.0 46.0}\nDownRight = {9.0 45.7}\n"
        "Latitude_SamplingStep = -0.1\nLongitude_SamplingStep = 0.5\n");
-  ROI_Coords old;
-  ASSERT_EQ(old.readhdr(legacy.c_str()), 0);
-  EXPECT_EQ(old.FastStartTime, 46.0);
-  EXPECT_NEAR(old.FastTimeLength, -0.3, 1e-12);
-  EXPECT_EQ(old.Lines, 4);
-  EXPECT_EQ(old.Samples, 3);
-
-  const std::string incomplete = path("ci.hdr");
-  spit(incomplete, "\n[Coordinates]\nUpLeft = {7.0 46.0}\n");
-  ROI_Coords partial;
-  EXPECT_EQ(partial.readhdr(incomplete.c_str()), 1);
+  ROI_Coords coords;
+  ASSERT_EQ(coords.readhdr(corners.c_str()), 0);
+  EXPECT_EQ(coords.FastStartTime, 46.0);
+  EXPECT_NEAR(coords.FastTimeLength, -0.3, 1e-12);
+  EXPECT_EQ(coords.Lines, 4);
+  EXPECT_EQ(coords.Samples, 3);
+  spit(path("ci.hdr"), "\n[Coordinates]\nUpLeft = {7.0 46.0}\n");
+  EXPECT_EQ(ROI_Coords().readhdr(path("ci.hdr").c_str()), 1);
 }
 
 }  // namespace

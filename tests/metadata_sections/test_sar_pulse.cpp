@@ -2,8 +2,8 @@
 #include <cmath>
 #include <vector>
 
-#include "metadata_sections/sar_pulse.h"
 #include "metadata_fixture.h"
+#include "metadata_sections/sar_pulse.h"
 #include "raster/data_file.h"
 
 namespace {

@@ -39,88 +39,38 @@ class BufferFileTest : public ScratchDir {
   }
 };
 
-// A window goes into an existing raster only through an open file, and in
-// update mode every byte outside it stays, whatever the buffer.
-TEST_F(BufferFileTest, WindowWrittenIntoAnExistingRasterKeepsTheRest) {
+// A window goes into an existing raster only through an open file; in update mode every byte
+// outside it stays, whatever the buffer, the object sees its writes before they are flushed, and a
+// copy made then holds them too.
+TEST_F(BufferFileTest, WindowsWrittenInUpdateModeKeepTheRestAndReachTheCopy) {
   BufferFile bf;
   const std::string bytes = MakeShortComplex(&bf);
-  std::vector<fcomplex> window;
+  // Lines 2-4 take the values of lines 4-6; line 6 a new prefix.
   std::string expected = bytes;
-  const int64_t line = kPrefix + kPixels * 4;
-  for (int k = 2; k < 4; ++k) {
-    for (int s = 5; s < 10; ++s) window.emplace_back(Re(k + 100, s), Im(k + 100, s));
-    expected.replace(static_cast<size_t>(kOffset + k * line + kPrefix + 5 * 4), 5 * 4,
-                     Samples(CT_SHORT_COMPLEX, true, k + 100, 5, 5));
+  std::vector<fcomplex> in;
+  for (int k = 4; k <= 6; ++k) {
+    for (int s = 0; s < kPixels; ++s) in.emplace_back(Re(k, s), Im(k, s));
+    expected.replace(kOffset + (k - 2) * (kPrefix + 4 * kPixels) + kPrefix, 4 * kPixels,
+                     Samples(CT_SHORT_COMPLEX, true, k, 0, kPixels));
   }
-  // Closed: refused, the file untouched.
-  EXPECT_EQ(bf.writebuffer(window.data(), 2, 2, 5, 5), 9);
+  expected.replace(kOffset + 6 * (kPrefix + 4 * kPixels), kPrefix, kPrefix, '#');
+  EXPECT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 9);  // closed: refused
   EXPECT_EQ(ReadFile(Path("sc")), bytes);
   for (int buffer : {0, 7, 50, 1 << 16}) {
     SCOPED_TRACE("buffer " + std::to_string(buffer));
     WriteFile(Path("sc"), bytes);
     ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
-    ASSERT_EQ(bf.initbuffer(buffer, 0), 0);
-    ASSERT_EQ(bf.writebuffer(window.data(), 2, 2, 5, 5), 0);
+    ASSERT_EQ(bf.initbuffer(buffer, 20), 0);
+    ASSERT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 0);
+    ASSERT_EQ(bf.writeprefix(std::string(kPrefix, '#').c_str(), 6, 1), 0);
+    std::vector<fcomplex> back(kPixels * 3);
+    ASSERT_EQ(bf.readbuffer(back.data(), 2, 3, 0, 0), 0);
+    EXPECT_EQ(back, in);
+    ASSERT_EQ(bf.copy(Path("copy").c_str(), 100), 0);
     ASSERT_EQ(bf.close(), 0);
     EXPECT_EQ(ReadFile(Path("sc")), expected);
+    EXPECT_EQ(ReadFile(Path("copy")), expected);
   }
-}
-
-TEST_F(BufferFileTest, BufferSmallerThanALineReadsTheSameBytes) {
-  BufferFile bf;
-  const std::string bytes = MakeShortComplex(&bf);
-  std::vector<fcomplex> expected;
-  for (int k = 0; k < kLines; ++k) {
-    for (int s = 0; s < kPixels; ++s) expected.emplace_back(Re(k, s), Im(k, s));
-  }
-  // Raw reads in odd pieces, then whole windows converted to FLOAT_COMPLEX.
-  for (int buffer : {0, 1, 7, 50, 1 << 16}) {
-    for (int history : {0, 5, 1000}) {
-      SCOPED_TRACE("buffer " + std::to_string(buffer) + " history " + std::to_string(history));
-      ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
-      ASSERT_EQ(bf.initbuffer(buffer, history), 0);
-      std::string got;
-      char piece[13];
-      for (int64_t n; (n = bf.read(piece, sizeof piece)) > 0;) got.append(piece, n);
-      EXPECT_EQ(got, bytes);
-      std::vector<fcomplex> window(kPixels * kLines);
-      ASSERT_EQ(bf.readbuffer(window.data(), 0, kLines, 0, 0), 0);
-      EXPECT_EQ(window, expected);
-      std::string prefixes(kPrefix * 2, ' ');
-      ASSERT_EQ(bf.readprefix(&prefixes[0], 5, 2), 0);
-      EXPECT_EQ(prefixes, std::string(kPrefix, 'F') + std::string(kPrefix, 'G'));
-      ASSERT_EQ(bf.close(), 0);
-    }
-  }
-}
-
-TEST_F(BufferFileTest, BackwardSeeksInsideTheHistoryStayInMemory) {
-  std::string bytes(300, '\0');
-  for (size_t i = 0; i < bytes.size(); ++i) bytes[i] = static_cast<char>(i);
-  const std::string name = Path("h");
-  WriteFile(name, bytes);
-  BufferFile bf;
-  bf.setFilename(name.c_str());
-  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
-  ASSERT_EQ(bf.initbuffer(64, 16), 0);
-  char out[64];
-  ASSERT_EQ(bf.read(out, 30), 30);
-  ASSERT_EQ(bf.read(out, 50), 50);  // refills at 64, keeping 48..63
-  EXPECT_EQ(std::string(out, 50), bytes.substr(30, 50));
-  // Change the file behind the object: what is still in memory stays old.
-  std::string changed = bytes;
-  for (int i = 40; i < 120; ++i) changed[i] = 'X';
-  WriteFile(name, changed);
-  ASSERT_EQ(bf.seek(-32, BufferFile::kSeekCurrent), 0);  // 48: the oldest byte kept
-  EXPECT_EQ(bf.tell(), 48);
-  ASSERT_EQ(bf.read(out, 20), 20);
-  EXPECT_EQ(std::string(out, 20), bytes.substr(48, 20));
-  ASSERT_EQ(bf.seek(47, BufferFile::kSeekSet), 0);  // one byte further: from the disk
-  ASSERT_EQ(bf.read(out, 2), 2);
-  EXPECT_EQ(std::string(out, 2), "XX");
-  ASSERT_EQ(bf.seek(-10, BufferFile::kSeekEnd), 0);
-  EXPECT_EQ(bf.read(out, 64), 10);  // the end of the file ends the request
-  EXPECT_EQ(std::string(out, 10), bytes.substr(290));
 }
 
 // Any mix of seeks, reads and writes in update mode behaves like the same
@@ -168,87 +118,6 @@ TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
       EXPECT_EQ(ReadFile(name), model);
     }
   }
-}
-
-TEST_F(BufferFileTest, WindowsWrittenInUpdateModeReachTheFileAndItsCopy) {
-  BufferFile bf;
-  std::string expected = MakeShortComplex(&bf);
-  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
-  ASSERT_EQ(bf.initbuffer(50, 20), 0);  // smaller than one line
-  // Lines 2-4 take the values of lines 4-6; line 6 a new prefix.
-  std::vector<fcomplex> in;
-  for (int k = 4; k <= 6; ++k) {
-    for (int s = 0; s < kPixels; ++s) in.emplace_back(Re(k, s), Im(k, s));
-    expected.replace(kOffset + (k - 2) * (kPrefix + 4 * kPixels) + kPrefix, 4 * kPixels,
-                     Samples(CT_SHORT_COMPLEX, true, k, 0, kPixels));
-  }
-  expected.replace(kOffset + 6 * (kPrefix + 4 * kPixels), kPrefix, kPrefix, '#');
-  ASSERT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 0);
-  ASSERT_EQ(bf.writeprefix(std::string(kPrefix, '#').c_str(), 6, 1), 0);
-  // The same object sees its writes before anything is flushed, and a copy
-  // made now holds them too.
-  std::vector<fcomplex> back(kPixels * 3);
-  ASSERT_EQ(bf.readbuffer(back.data(), 2, 3, 0, 0), 0);
-  EXPECT_EQ(back, in);
-  ASSERT_EQ(bf.copy(Path("copy").c_str(), 100), 0);
-  ASSERT_EQ(bf.close(), 0);
-  EXPECT_EQ(ReadFile(Path("sc")), expected);
-  EXPECT_EQ(ReadFile(Path("copy")), expected);
-}
-
-// A full disk: every way out of the buffer reports the failure.
-TEST_F(BufferFileTest, FailingDiskWritesAreReported) {
-  if (!std::ifstream("/dev/full")) GTEST_SKIP() << "no /dev/full";
-  BufferFile bf;
-  bf.setFilename("/dev/full");
-  ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
-  const char data[100] = {1};
-  EXPECT_EQ(bf.write(data, 10), 0);  // unbuffered: nothing accepted
-  ASSERT_EQ(bf.initbuffer(64, 8), 0);
-  EXPECT_EQ(bf.write(data, 10), 10);
-  EXPECT_EQ(bf.flush(), 5);
-  EXPECT_EQ(bf.seek(1000, BufferFile::kSeekSet), 5);
-  EXPECT_EQ(bf.write(data, 100), 0);  // would go past the buffer to the disk
-  EXPECT_EQ(bf.write(data, 20), 20);
-  EXPECT_EQ(bf.write(data, 40), 34);  // the rest needs the disk
-  EXPECT_EQ(bf.close(), 5);
-}
-
-TEST_F(BufferFileTest, NewFileWithHeaderBytesAndPrefixes) {
-  const std::string name = Path("new");
-  BufferFile bf;
-  bf.setFilename(name.c_str());
-  bf.setLines(kLines);
-  bf.setSamples(kPixels);
-  bf.setRowPrefix(kPrefix);
-  bf.setType(CT_INT16);
-  bf.setFileEndian(1);
-  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
-  ASSERT_EQ(bf.initbuffer(100, 50), 0);
-  ASSERT_EQ(bf.writeOffset("HEAD", 4), 0);
-  std::vector<short> line(kPixels);
-  for (int k = kLines - 1; k >= 0; --k) {  // backwards, to move the buffer around
-    for (int s = 0; s < kPixels; ++s) line[s] = static_cast<short>(-k * 1000 - s);
-    ASSERT_EQ(bf.writebuffer(line.data(), k, 1, 0, 0), 0);
-    ASSERT_EQ(bf.writeprefix(std::string(kPrefix, 'A' + k).c_str(), k, 1), 0);
-  }
-  EXPECT_EQ(bf.read(line.data(), 2), 0);  // write mode does not read
-  ASSERT_EQ(bf.close(), 0);
-  ASSERT_EQ(bf.writehdr(), 0);
-
-  const std::string bytes = ReadFile(name);
-  ASSERT_EQ(bytes.size(), 4u + kLines * (kPrefix + 2u * kPixels));
-  EXPECT_EQ(bytes.substr(0, 4), "HEAD");
-  BufferFile check;
-  ASSERT_EQ(check.readhdr((name + ".hdr").c_str()), 0);
-  EXPECT_EQ(check.getOffsetSize(), 4);
-  ASSERT_EQ(check.open(BufferFile::kOpRead), 0);
-  EXPECT_EQ(check.readShort(5, 7), -5007);  // swapped from the big-endian file
-  EXPECT_EQ(check.readInt(5, 7), 0);        // not an INT32 file
-  EXPECT_EQ(check.readShort(kLines, 0), 0);
-  std::string prefix(kPrefix, ' ');
-  ASSERT_EQ(check.readprefix(&prefix[0], 3, 1), 0);
-  EXPECT_EQ(prefix, std::string(kPrefix, 'D'));
 }
 
 TEST_F(BufferFileTest, TypedConversionsRoundHalfAwayFromZero) {
@@ -339,43 +208,6 @@ TEST_F(BufferFileTest, HostileSizesAreRefused) {
   // Header names (damaged headers: with those of DataFile).
   EXPECT_EQ(BufferFile().readhdr("a.h"), 1);
   EXPECT_EQ(BufferFile().readhdr(Path("missing.hdr").c_str()), 1);
-}
-
-// The older parameter-file header rewritten as the XML block, and a sparse
-// file updated beyond 4 GiB through a clone of what that block describes.
-TEST_F(BufferFileTest, HeaderFormsAndOffsetsBeyondFourGiB) {
-  WriteFile(Path("far.hdr"),
-            "[RasterInfo]\nHeaderOffset = 5000000000\nRowPrefix = 3\nNrOfPixelsPerLine = 4\n"
-            "NrOfLinesPerImage = 2\nCellType = INT32\nByteOrder = LSBFirst\n");
-  BufferFile legacy;
-  ASSERT_EQ(legacy.readhdr(Path("far.hdr").c_str()), 0);
-  EXPECT_EQ(legacy.filename(), Path("far"));
-  ASSERT_EQ(legacy.writehdr(Path("xml.hdr").c_str()), 0);
-  BufferFile bf;
-  ASSERT_EQ(bf.readhdr(), 1);  // no name yet
-  ASSERT_EQ(bf.readhdr(Path("xml.hdr").c_str()), 0);
-  EXPECT_EQ(bf.getOffsetSize(), 5000000000LL);
-  BufferFile copy;
-  bf.clone(&copy);
-  const std::string name = Path("xml");
-  EXPECT_EQ(copy.filename(), name);
-
-  WriteFile(name, "");
-  std::filesystem::resize_file(name, 5000000000LL + 2 * 19);  // sparse
-  ASSERT_EQ(copy.open(BufferFile::kOpUpdate), 0);
-  EXPECT_TRUE(copy.is_writing());
-  ASSERT_EQ(copy.initbuffer(32, 8), 0);
-  const int line[4] = {1, -2, 3, -4};
-  ASSERT_EQ(copy.writebuffer(line, 1, 1, 0, 0), 0);
-  EXPECT_EQ(copy.readInt(1, 3), -4);
-  ASSERT_EQ(copy.close(), 0);
-  DataFile df;
-  ASSERT_EQ(df.read_hdr(name.c_str()), 0);
-  ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
-  int back[4];
-  ASSERT_EQ(df.seek(5000000000LL + 19 + 3, DataFile::kSeekSet), 0);
-  ASSERT_EQ(df.read(back, sizeof back), 0);
-  EXPECT_EQ(std::vector<int>(back, back + 4), std::vector<int>(line, line + 4));
 }
 
 }  // namespace

@@ -139,43 +139,6 @@ TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
   EXPECT_EQ(ReadFile(Path("new")), std::string(kOffset + kPrefix, '\0') + samples);
 }
 
-TEST_F(BufferIOTest, PrefixWindowOf17Bytes) {
-  const std::string raster = MakeRaster(CT_SHORT_COMPLEX, true, kLines, kPixels);
-  WriteFile(Path("p"), raster);
-  DataFile df;
-  Describe(&df, Path("p"), CT_SHORT_COMPLEX, true, kLines, kPixels);
-  BufferIO io(&df);
-  io.first_line = 1;
-  io.num_lines = 2;
-  char prefixes[2 * kPrefix];
-  ASSERT_EQ(io.readprefix(prefixes), 0);
-  EXPECT_TRUE(df.is_buffered());  // opened by the read, with a read buffer
-  EXPECT_EQ(std::string(prefixes, 2 * kPrefix),
-            std::string(kPrefix, 'B') + std::string(kPrefix, 'C'));
-
-  // Whole lines, and the first sample of the window right after the prefix.
-  io.first_line = 0;
-  io.num_lines = kLines;
-  io.num_samples = 1;
-  io.output_type = CT_FLOAT_COMPLEX;
-  float first[2 * kLines];
-  ASSERT_EQ(io.readbuffer(reinterpret_cast<char*>(first)), 0);
-  for (int k = 0; k < kLines; ++k) {
-    EXPECT_EQ(first[2 * k], Re(k, 0));
-    EXPECT_EQ(first[2 * k + 1], Im(k, 0));
-  }
-  EXPECT_EQ(df.close(), 0);
-
-  // Prefixes written back land before the samples and leave them intact.
-  ASSERT_EQ(df.open(DataFile::kOpenUpdate), 0);
-  const std::string fresh(kPrefix * kLines, 'z');
-  ASSERT_EQ(io.writeprefix(fresh.data()), 0);
-  ASSERT_EQ(df.close(), 0);
-  std::string expected = raster;
-  for (int k = 0; k < kLines; ++k) expected.replace(df.line_offset(k), kPrefix, kPrefix, 'z');
-  EXPECT_EQ(ReadFile(Path("p")), expected);
-}
-
 TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   WriteFile(Path("w"), MakeRaster(CT_INT16, false, kLines, kPixels));
   DataFile df;

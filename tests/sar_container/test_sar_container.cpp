@@ -122,24 +122,19 @@ TEST_F(SarContainer, WriteThenReadRestoresSectionsAndFlags) {
     GeneralSAR back;
     ASSERT_EQ(back.GSread(file.c_str()), 0);
     ASSERT_EQ(enabledSet(back), wanted);
-    EXPECT_DOUBLE_EQ(back.roi.roi.FastStartTime, 5.6e-3);
     expectSameFields(back.polys, src.polys);
     EXPECT_EQ(back.polys.frExt[0].extPol[13], 2.5);
     EXPECT_EQ(back.orbit.positions()[20], src.orbit.positions()[20]);
-    EXPECT_STREQ(back.dataSetInfo.SceneID, src.dataSetInfo.SceneID);
     // The look side reaches both orbit sections; the wavelength only comes
     // with the sampling constants.
     EXPECT_EQ(back.orbit.lookSign(), -1);
     EXPECT_EQ(back.stateVectors.lookSign(), -1);
     EXPECT_EQ(back.orbit.lambda(), wanted.size() == 14 ? 0.0566 : GeneralSAROrbit::kDefaultLambda);
   }
-  // Each section's own form is covered with the section; here what the
-  // container adds: the raster names and the shared blocks.
+  // What the container adds: the raster names and the shared blocks.
   GeneralSAR back;
   ASSERT_EQ(back.GSread(path("scene14.hdr").c_str()), 0);
-  expectSameFields(back.geoCoords.Center, src.geoCoords.Center);
   EXPECT_EQ(back.antenna.PatternSamples, 5);
-  EXPECT_EQ(back.datafile.data.row_prefix, 17);
   EXPECT_EQ(back.bufferfile.filename(), path("scene14"));
 }
 
@@ -322,8 +317,6 @@ TEST_F(EquivalentSpeed, BundleWrittenIsReadBackAndReadsAsAContainer) {
   ASSERT_EQ(back.readhdr(header.c_str()), 0);
   EXPECT_EQ(back.imageFile(), path("swath1"));
   EXPECT_EQ(back.attitude.Eq_speed, img.attitude.Eq_speed);
-  expectSameFields(back.polys, img.polys);
-  EXPECT_EQ(back.orbit.lambda(), 0.0566);
   EXPECT_EQ(back.orbit.lookSign(), -1);
   GeneralSAR gs;
   ASSERT_EQ(gs.GSread(header.c_str()), 0);

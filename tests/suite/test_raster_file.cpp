@@ -260,19 +260,4 @@ TEST_F(RasterFileTest, WrittenLinesReadBackAndMissingLinesBecomeZeros) {
   EXPECT_EQ(vlr_test::ReadFile(work("unfinished")), std::string(5 + 4 * record, '\0'));
 }
 
-TEST_F(RasterFileTest, HeaderFileOnDiskDescribesTheRaster) {
-  const Layout l{2, 2, "INT", 0, 0, 0, "LSBF"};
-  const std::string path = work("ondisk");
-  vlr_test::WriteFile(path, fileBytes(l, false));
-  CDescriptionHeader h = header(l);
-  writeXML(h, (path + ".sml").c_str());
-  CRasterFile raster;
-  raster.openRead(path.c_str());
-  int32_t got[4] = {};
-  raster.readLines(0, 2, 0, 1, got);
-  const auto want = expected(0, 2, 0, 1, 1, 4);
-  EXPECT_EQ(std::memcmp(got, want.data(), want.size()), 0);
-  raster.close();
-}
-
 }  // namespace
