@@ -191,30 +191,6 @@ TEST_F(EnviHeaderTest, GdalReadsTheMapInformation) {
   }
 }
 
-TEST_F(EnviHeaderTest, ClassificationProductsListTheirClasses) {
-  CDescriptionHeader h = raster(2, 2, "UNSIGNED_BYTE", 0, 0, "LSBF");
-  setString(getField(h, "RasterInfo.DataUnits"), "CLASSIFICATION");
-  CDescriptionField* names = getField(h, "RasterInfo.ClassificationName");
-  setNumberOfElements(names, 2);
-  setString(names, 0, "Water");
-  setString(names, 1, "Forest");
-  const int rgb[3][3] = {{0, 0, 0}, {0, 0, 255}, {0, 128, 0}};
-  const char* tables[3] = {"RasterInfo.TiffLUTRed", "RasterInfo.TiffLUTGreen",
-                           "RasterInfo.TiffLUTBlue"};
-  for (int c = 0; c < 3; ++c) {
-    setNumberOfElements(getField(h, tables[c]), 3);
-    for (int i = 0; i < 3; ++i) setInteger(getField(h, tables[c]), i, rgb[i][c]);
-  }
-  NVLR_UTILITY_WriteEnviHeader(h, work("classes_hdr").c_str());
-  const std::string text = ReadFile(work("classes.hdr"));
-  EXPECT_NE(text.find("file type = ENVI Classification\n"), std::string::npos) << text;
-  EXPECT_EQ(text.find("ENVI Standard"), std::string::npos) << text;
-  EXPECT_NE(text.find("classes = 3\nclass lookup = {0, 0, 0, 0, 0, 255, 0, 128, 0}\n"
-                      "class names = {No classified, Water, Forest}\n"),
-            std::string::npos)
-      << text;
-}
-
 TEST_F(EnviHeaderTest, WhenNothingIsWrittenAndWhenWritingFails) {
   CDescriptionHeader h = raster(2, 2, "FLOAT", 0, 0, "LSBF");
   NVLR_UTILITY_WriteEnviHeader(h, work("export.tif_hdr").c_str());
