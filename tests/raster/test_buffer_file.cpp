@@ -39,40 +39,6 @@ class BufferFileTest : public ScratchDir {
   }
 };
 
-// A window goes into an existing raster only through an open file; in update mode every byte
-// outside it stays, whatever the buffer, the object sees its writes before they are flushed, and a
-// copy made then holds them too.
-TEST_F(BufferFileTest, WindowsWrittenInUpdateModeKeepTheRestAndReachTheCopy) {
-  BufferFile bf;
-  const std::string bytes = MakeShortComplex(&bf);
-  // Lines 2-4 take the values of lines 4-6; line 6 a new prefix.
-  std::string expected = bytes;
-  std::vector<fcomplex> in;
-  for (int k = 4; k <= 6; ++k) {
-    for (int s = 0; s < kPixels; ++s) in.emplace_back(Re(k, s), Im(k, s));
-    expected.replace(kOffset + (k - 2) * (kPrefix + 4 * kPixels) + kPrefix, 4 * kPixels,
-                     Samples(CT_SHORT_COMPLEX, true, k, 0, kPixels));
-  }
-  expected.replace(kOffset + 6 * (kPrefix + 4 * kPixels), kPrefix, kPrefix, '#');
-  EXPECT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 9);  // closed: refused
-  EXPECT_EQ(ReadFile(Path("sc")), bytes);
-  for (int buffer : {0, 7, 50, 1 << 16}) {
-    SCOPED_TRACE("buffer " + std::to_string(buffer));
-    WriteFile(Path("sc"), bytes);
-    ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
-    ASSERT_EQ(bf.initbuffer(buffer, 20), 0);
-    ASSERT_EQ(bf.writebuffer(in.data(), 2, 3, 0, 0), 0);
-    ASSERT_EQ(bf.writeprefix(std::string(kPrefix, '#').c_str(), 6, 1), 0);
-    std::vector<fcomplex> back(kPixels * 3);
-    ASSERT_EQ(bf.readbuffer(back.data(), 2, 3, 0, 0), 0);
-    EXPECT_EQ(back, in);
-    ASSERT_EQ(bf.copy(Path("copy").c_str(), 100), 0);
-    ASSERT_EQ(bf.close(), 0);
-    EXPECT_EQ(ReadFile(Path("sc")), expected);
-    EXPECT_EQ(ReadFile(Path("copy")), expected);
-  }
-}
-
 // Any mix of seeks, reads and writes in update mode behaves like the same
 // operations on the file's bytes in memory, and every byte written reaches
 // the disk.
@@ -118,58 +84,6 @@ TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
       EXPECT_EQ(ReadFile(name), model);
     }
   }
-}
-
-TEST_F(BufferFileTest, TypedConversionsRoundHalfAwayFromZero) {
-  const float nan = std::numeric_limits<float>::quiet_NaN();
-  const std::vector<float> values = {2.5f,  -2.5f, 1.5f, -0.5f, 0.49999997f,
-                                     3.49f, 1e10f, nan,  1e6f,  -1e6f};
-  const std::vector<int> ints = {3, -3, 2, -1, 0, 3, INT_MAX, 0, 1000000, -1000000};
-  const std::vector<short> shorts = {3, -3, 2, -1, 0, 3, 32767, 0, 32767, -32768};
-  const int n = static_cast<int>(values.size());
-  BufferFile bf;
-  bf.setFilename(Path("f").c_str());
-  bf.setLines(1);
-  bf.setSamples(n);
-  bf.setType(CT_FLOAT32);
-  bf.setFileEndian(1);
-  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
-  ASSERT_EQ(bf.writebuffer(values.data(), 0, 1, 0, n), 0);
-  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
-  std::vector<int> i(n);
-  std::vector<short> s(n);
-  ASSERT_EQ(bf.readbuffer(i.data(), 0, 1, 0, n), 0);
-  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
-  EXPECT_EQ(i, ints);
-  EXPECT_EQ(s, shorts);
-  EXPECT_FLOAT_EQ(bf.readFloat(0, 0), 2.5f);
-  // Complex windows take complex files only; the output stays untouched.
-  std::vector<fcomplex> c(n, fcomplex(7, 7));
-  EXPECT_EQ(bf.readbuffer(c.data(), 0, 1, 0, n), 1);
-  EXPECT_EQ(c[0], fcomplex(7, 7));
-
-  // Doubles into an INT16 file, and a SHORT_COMPLEX file into doubles.
-  bf.setType(CT_INT16);
-  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
-  const std::vector<double> halves = {-1.5, 1.5, 0.5, -0.5, 2.4999, 40000, -7, 0, -4e4, 1e300};
-  ASSERT_EQ(bf.writebuffer(halves.data(), 0, 1, 0, n), 0);
-  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
-  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
-  EXPECT_EQ(s, (std::vector<short>{-2, 2, 1, -1, 2, 32767, -7, 0, -32768, 32767}));
-  bf.setType(CT_SHORT_COMPLEX);
-  bf.setSamples(n / 2);
-  std::vector<dcomplex> dc(n / 2);
-  ASSERT_EQ(bf.readbuffer(dc.data(), 0, 1, 1, 2), 0);
-  EXPECT_EQ(dc[0], dcomplex(1, -1));
-  EXPECT_EQ(dc[1], dcomplex(2, 32767));
-  // Integers narrowed: saturated.
-  bf.setType(CT_INT32);
-  bf.setSamples(n);
-  ASSERT_EQ(bf.open(BufferFile::kOpWrite), 0);
-  ASSERT_EQ(bf.writebuffer(ints.data(), 0, 1, 0, n), 0);
-  ASSERT_EQ(bf.open(BufferFile::kOpRead), 0);
-  ASSERT_EQ(bf.readbuffer(s.data(), 0, 1, 0, n), 0);
-  EXPECT_EQ(s, shorts);
 }
 
 TEST_F(BufferFileTest, HostileSizesAreRefused) {

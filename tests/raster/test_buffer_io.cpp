@@ -2,10 +2,13 @@
 
 #include <cstdint>
 #include <filesystem>
+#include <limits>
 #include <string>
+#include <vector>
 
 #include "raster/buffer_io.h"
 #include "raster/cell_type.h"
+#include "raster/sample_convert.h"
 #include "raster_fixture.h"
 
 namespace {
@@ -185,6 +188,42 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
   writer.num_lines = 1;
   writer.output_type = CT_FLOAT32;
   EXPECT_EQ(writer.readbuffer(reinterpret_cast<char*>(out)), 1);
+}
+
+// Seven repetitions of `values`: long enough for the vectorised loops and their tails.
+template <class T>
+std::vector<T> Repeated(const std::vector<T>& values) {
+  std::vector<T> out;
+  for (int k = 0; k < 7; ++k) out.insert(out.end(), values.begin(), values.end());
+  return out;
+}
+
+// Conversions by value: floating point to integer rounded half away from zero, values beyond the
+// destination's range saturated, NaN as 0; byte-swapped input reversed first.
+TEST(SampleConvert, RoundsHalfAwayFromZeroSaturatesAndSwaps) {
+  const float nan = std::numeric_limits<float>::quiet_NaN();
+  const auto floats =
+      Repeated<float>({2.5f, -2.5f, 1.5f, -0.5f, 0.49999997f, 3.49f, 1e10f, nan, 1e6f, -1e6f});
+  const auto ints = Repeated<int32_t>({3, -3, 2, -1, 0, 3, INT32_MAX, 0, 1000000, -1000000});
+  const auto shorts = Repeated<int16_t>({3, -3, 2, -1, 0, 3, 32767, 0, 32767, -32768});
+  const size_t n = floats.size();
+  std::vector<int32_t> i(n);
+  std::vector<int16_t> s(n);
+  convert_samples(floats.data(), CT_FLOAT32, false, i.data(), CT_INT32, n);
+  EXPECT_EQ(i, ints);
+  convert_samples(floats.data(), CT_FLOAT32, false, s.data(), CT_INT16, n);
+  EXPECT_EQ(s, shorts);
+  convert_samples(ints.data(), CT_INT32, false, s.data(), CT_INT16, n);
+  EXPECT_EQ(s, shorts);
+  const auto doubles = Repeated<double>({-1.5, 1.5, 0.5, -0.5, 2.4999, 40000, -7, 0, -4e4, 1e300});
+  convert_samples(doubles.data(), CT_FLOAT64, false, s.data(), CT_INT16, n);
+  EXPECT_EQ(s, Repeated<int16_t>({-2, 2, 1, -1, 2, 32767, -7, 0, -32768, 32767}));
+  std::vector<int32_t> swapped = ints;
+  swap_samples(swapped.data(), CT_INT32, n);
+  std::vector<float> back(n);
+  convert_samples(swapped.data(), CT_INT32, true, back.data(), CT_FLOAT32, n);
+  EXPECT_EQ(back[6], static_cast<float>(INT32_MAX));
+  EXPECT_EQ(back[n - 1], -1e6f);
 }
 
 }  // namespace

@@ -39,18 +39,21 @@ void enableOnly(GeneralSAR& gs, const std::set<int>& on) {
                 : gs.GSdisable(static_cast<GS::GSObject>(i));
 }
 
-// Seven vectors 10 s apart from t = 1000 on an inclined circular orbit.
+// Position and velocity at time t on an inclined circular orbit.
+void circularOrbit(double t, double* p, double* v) {
+  const double r = 7.07e6, w = 7500.0 / r, inc = 98.5 * M_PI / 180.0;
+  const double a = 0.3 + w * (t - 1000.0), c = std::cos(inc), s = std::sin(inc);
+  const double pv[6] = {r * std::cos(a),      r * std::sin(a) * c,     r * std::sin(a) * s,
+                        -r * w * std::sin(a), r * w * std::cos(a) * c, r * w * std::cos(a) * s};
+  for (int k = 0; k < 3; ++k) p[k] = pv[k], v[k] = pv[3 + k];
+}
+
+// Seven vectors 10 s apart from t = 1000.
 template <class Orbit>
 void fillVectors(Orbit& o) {
   ASSERT_EQ(o.SVCreate(1000.0, 10.0, 7), 0);
-  const double r = 7.07e6, w = 7500.0 / r, inc = 98.5 * M_PI / 180.0;
-  for (int i = 0; i < 7; ++i) {
-    const double a = 0.3 + w * 10.0 * i, c = std::cos(inc), s = std::sin(inc);
-    const double pv[6] = {r * std::cos(a),      r * std::sin(a) * c,     r * std::sin(a) * s,
-                          -r * w * std::sin(a), r * w * std::cos(a) * c, r * w * std::cos(a) * s};
-    for (int k = 0; k < 3; ++k)
-      o.positions()[3 * i + k] = pv[k], o.velocities()[3 * i + k] = pv[3 + k];
-  }
+  for (int i = 0; i < 7; ++i)
+    circularOrbit(1000.0 + 10.0 * i, o.positions() + 3 * i, o.velocities() + 3 * i);
 }
 
 void fillOrbit(GeneralSAROrbit& o) {
@@ -199,22 +202,15 @@ TEST_F(SarContainer, MissingDamagedAndHostileHeaders) {
 // container copies them whole, its orbit model follows the orbit, and no
 // single polynomial is fitted through them all.
 TEST_F(SarContainer, LongOrbitsCloneWhole) {
-  const double r = 7.07e6, w = 7500.0 / r, inc = 98.5 * M_PI / 180.0;
-  const auto at = [&](double t, double* p, double* v) {
-    const double a = 0.3 + w * (t - 1000.0), c = std::cos(inc), s = std::sin(inc);
-    const double pv[6] = {r * std::cos(a),      r * std::sin(a) * c,     r * std::sin(a) * s,
-                          -r * w * std::sin(a), r * w * std::cos(a) * c, r * w * std::cos(a) * s};
-    for (int k = 0; k < 3; ++k) p[k] = pv[k], v[k] = pv[3 + k];
-  };
   const int n = kMaxStateVectors;
   const double dt = 5.0;
   GeneralSAR src;
   ASSERT_EQ(src.orbit.SVCreate(1000.0, dt, n), 0);
   ASSERT_EQ(src.stateVectors.SVCreate(1000.0, dt, n), 0);
   for (int i = 0; i < n; ++i) {
-    at(1000.0 + i * dt, src.orbit.positions() + 3 * i, src.orbit.velocities() + 3 * i);
-    at(1000.0 + i * dt, src.stateVectors.positions() + 3 * i,
-       src.stateVectors.velocities() + 3 * i);
+    circularOrbit(1000.0 + i * dt, src.orbit.positions() + 3 * i, src.orbit.velocities() + 3 * i);
+    circularOrbit(1000.0 + i * dt, src.stateVectors.positions() + 3 * i,
+                  src.stateVectors.velocities() + 3 * i);
   }
   ASSERT_EQ(src.orbit.computeApproximateSV(), 0);
   enableOnly(src, {GS::GS_STATEVECTORS, GS::GS_ORBIT});
@@ -231,7 +227,7 @@ TEST_F(SarContainer, LongOrbitsCloneWhole) {
   for (double t : {1002.5, 251234.5, 1000.0 + (n - 1) * dt - 0.3}) {
     double p[3], truth[3], v[3];
     ASSERT_EQ(copy.orbit.SVGetPos(t, p), 0) << t;
-    at(t, truth, v);
+    circularOrbit(t, truth, v);
     for (int k = 0; k < 3; ++k) EXPECT_NEAR(p[k], truth[k], 1e-3) << t;
   }
 }
