@@ -1,17 +1,13 @@
-// Helpers of the raster tests: a scratch directory and an independent
-// encoder of sample values and whole rasters in either byte order.
+// Helpers of the raster tests: an independent encoder of sample values and
+// whole rasters in either byte order.
 #pragma once
 
 #include <gtest/gtest.h>
-#include <stdlib.h>
-#include <unistd.h>
 
 #include <cstdint>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <string>
 
+#include "metadata_fixture.h"
 #include "raster/data_file.h"
 
 namespace raster_test {
@@ -19,28 +15,8 @@ namespace raster_test {
 constexpr int kPrefix = 17;  // the line header of ENVISAT image lines
 constexpr int kOffset = 11;  // header bytes before the first line
 
-class ScratchDir : public ::testing::Test {
- protected:
-  void SetUp() override {
-    char pattern[] = "/tmp/vlr_raster_XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    dir_ = pattern;
-  }
-  void TearDown() override { std::filesystem::remove_all(dir_); }
-  std::string Path(const std::string& name) const { return dir_ + "/" + name; }
-
-  std::string dir_;
-};
-
-inline void WriteFile(const std::string& path, const std::string& bytes) {
-  std::ofstream f(path, std::ios::binary);
-  f.write(bytes.data(), static_cast<std::streamsize>(bytes.size()));
-}
-
-inline std::string ReadFile(const std::string& path) {
-  std::ifstream f(path, std::ios::binary);
-  return std::string(std::istreambuf_iterator<char>(f), std::istreambuf_iterator<char>());
-}
+// A scratch directory per test, with slurp/spit for whole files.
+using ScratchDir = MetadataTest;
 
 // Sets the description of *df.
 inline void Describe(DataFile* df, const std::string& name, int type, bool big, int lines,

@@ -28,12 +28,12 @@ class BufferFileTest : public ScratchDir {
   // parameter-file header.
   std::string MakeShortComplex(BufferFile* bf) {
     const std::string bytes = MakeRaster(CT_SHORT_COMPLEX, true, kLines, kPixels);
-    WriteFile(Path("sc"), bytes);
-    WriteFile(Path("sc.hdr"),
-              "[RasterInfo]\nHeaderOffset = 11\nRowPrefix = 17\n"
-              "NrOfPixelsPerLine = 37\nNrOfLinesPerImage = 7\n"
-              "CellType = SHORT_COMPLEX\nByteOrder = MSBFirst\n");
-    bf->setFilename(Path("sc").c_str());
+    spit(path("sc"), bytes);
+    spit(path("sc.hdr"),
+         "[RasterInfo]\nHeaderOffset = 11\nRowPrefix = 17\n"
+         "NrOfPixelsPerLine = 37\nNrOfLinesPerImage = 7\n"
+         "CellType = SHORT_COMPLEX\nByteOrder = MSBFirst\n");
+    bf->setFilename(path("sc").c_str());
     EXPECT_EQ(bf->readhdr(), 0);
     return bytes;
   }
@@ -49,8 +49,8 @@ TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
       std::mt19937 rng(static_cast<unsigned>(buffer * 131 + history));
       std::string model(500, '\0');
       for (char& c : model) c = static_cast<char>(rng());
-      const std::string name = Path("u");
-      WriteFile(name, model);
+      const std::string name = path("u");
+      spit(name, model);
       BufferFile bf;
       bf.setFilename(name.c_str());
       ASSERT_EQ(bf.open(BufferFile::kOpUpdate), 0);
@@ -81,7 +81,7 @@ TEST_F(BufferFileTest, UpdateModeMatchesAPlainFileAndKeepsEveryByte) {
         ASSERT_EQ(bf.tell(), pos) << "step " << step;
       }
       ASSERT_EQ(bf.close(), 0);
-      EXPECT_EQ(ReadFile(name), model);
+      EXPECT_EQ(slurp(name), model);
     }
   }
 }
@@ -113,15 +113,15 @@ TEST_F(BufferFileTest, HostileSizesAreRefused) {
   EXPECT_EQ(bf.readbuffer(out.data(), 0, 1, 0, 1), 9);
   EXPECT_EQ(bf.open(0), 1);
   BufferFile missing;
-  missing.setFilename(Path("nothing").c_str());
+  missing.setFilename(path("nothing").c_str());
   EXPECT_EQ(missing.open(BufferFile::kOpRead), 9);
   char shortName[8];
   EXPECT_EQ(bf.getFilename(shortName, sizeof shortName), 1);  // cut, terminated
-  EXPECT_EQ(std::string(shortName), Path("sc").substr(0, 7));
+  EXPECT_EQ(std::string(shortName), path("sc").substr(0, 7));
 
   // Header names (damaged headers: with those of DataFile).
   EXPECT_EQ(BufferFile().readhdr("a.h"), 1);
-  EXPECT_EQ(BufferFile().readhdr(Path("missing.hdr").c_str()), 1);
+  EXPECT_EQ(BufferFile().readhdr(path("missing.hdr").c_str()), 1);
 }
 
 }  // namespace

@@ -26,12 +26,12 @@ class BufferIOTest : public ScratchDir {};
 TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
   for (int big = 0; big <= 1; ++big) {
     for (int file = 0; file <= 7; ++file) {
-      WriteFile(Path("in"), MakeRaster(file, big, kLines, kPixels));
+      spit(path("in"), MakeRaster(file, big, kLines, kPixels));
       for (int mem = 0; mem <= 7; ++mem) {
         SCOPED_TRACE("file type " + std::to_string(file) + ", memory type " + std::to_string(mem) +
                      (big ? ", big-endian" : ", little-endian"));
         DataFile df;
-        Describe(&df, Path("in"), file, big, kLines, kPixels);
+        Describe(&df, path("in"), file, big, kLines, kPixels);
         BufferIO io(&df);
         io.first_sample = 1;
         io.num_samples = 3;
@@ -50,9 +50,9 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
         }
 
         // Each file type has its own size: the raster is written afresh.
-        std::filesystem::remove(Path("out"));
+        std::filesystem::remove(path("out"));
         DataFile target;
-        Describe(&target, Path("out"), file, big, kLines, kPixels);
+        Describe(&target, path("out"), file, big, kLines, kPixels);
         BufferIO writer(&target);
         writer.num_samples = kPixels;
         writer.num_lines = kLines;
@@ -65,7 +65,7 @@ TEST_F(BufferIOTest, EveryConversionPairInBothByteOrders) {
         }
         ASSERT_EQ(writer.writebuffer(samples.data()), 0);
         ASSERT_EQ(target.close(), 0);
-        EXPECT_EQ(ReadFile(Path("out")),
+        EXPECT_EQ(slurp(path("out")),
                   MakeRaster(file, big, kLines, kPixels, true, Components(mem) == 1));
       }
     }
@@ -96,9 +96,9 @@ TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
   for (const auto& c : cases) {
     SCOPED_TRACE("type " + std::to_string(c.type) + " buffer " + std::to_string(c.buffer) +
                  (c.prefixes ? " prefixes" : " samples"));
-    const std::string path = Path("raster");
+    const std::string file = path("raster");
     std::string expected = MakeRaster(c.type, c.big, kWideLines, kWidePixels);
-    WriteFile(path, expected);
+    spit(file, expected);
     const int64_t size = cell_type_size(c.type);
     const int64_t line = kPrefix + kWidePixels * size;
     std::string window;
@@ -116,7 +116,7 @@ TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
     }
 
     DataFile df;
-    Describe(&df, path, c.type, c.big, kWideLines, kWidePixels);
+    Describe(&df, file, c.type, c.big, kWideLines, kWidePixels);
     df.set_buffer_size(c.buffer);
     BufferIO io(&df);
     io.first_line = c.firstLine;
@@ -127,11 +127,11 @@ TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
     ASSERT_FALSE(df.is_open());
     ASSERT_EQ(c.prefixes ? io.writeprefix(window.data()) : io.writebuffer(window.data()), 0);
     ASSERT_EQ(df.close(), 0);
-    EXPECT_EQ(ReadFile(path), expected);
+    EXPECT_EQ(slurp(file), expected);
   }
   // A raster that does not exist yet is created.
   DataFile df;
-  Describe(&df, Path("new"), CT_INT16, false, 1, 2);
+  Describe(&df, path("new"), CT_INT16, false, 1, 2);
   BufferIO io(&df);
   io.num_lines = 1;
   io.num_samples = 2;
@@ -139,13 +139,13 @@ TEST_F(BufferIOTest, WindowWrittenIntoAClosedRasterKeepsTheRest) {
   const std::string samples = Samples(CT_INT16, false, 0, 0, 2);
   ASSERT_EQ(io.writebuffer(samples.data()), 0);
   ASSERT_EQ(df.close(), 0);
-  EXPECT_EQ(ReadFile(Path("new")), std::string(kOffset + kPrefix, '\0') + samples);
+  EXPECT_EQ(slurp(path("new")), std::string(kOffset + kPrefix, '\0') + samples);
 }
 
 TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
-  WriteFile(Path("w"), MakeRaster(CT_INT16, false, kLines, kPixels));
+  spit(path("w"), MakeRaster(CT_INT16, false, kLines, kPixels));
   DataFile df;
-  Describe(&df, Path("w"), CT_INT16, false, kLines, kPixels);
+  Describe(&df, path("w"), CT_INT16, false, kLines, kPixels);
   BufferIO io(&df);
   float out[kPixels + 1] = {0};
   struct Window {
@@ -181,7 +181,7 @@ TEST_F(BufferIOTest, RefusesBadWindowsAndTypes) {
 
   // A file opened for writing only cannot be read.
   DataFile created;
-  Describe(&created, Path("new"), CT_INT16, false, kLines, kPixels);
+  Describe(&created, path("new"), CT_INT16, false, kLines, kPixels);
   ASSERT_EQ(created.open(DataFile::kOpenCreate), 0);
   BufferIO writer(&created);
   writer.num_samples = 1;

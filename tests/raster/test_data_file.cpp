@@ -31,7 +31,7 @@ TEST_F(DataFileTest, BufferedAndUnbufferedTransfersGiveTheSameBytes) {
   const int64_t size = static_cast<int64_t>(data.size());
   const int64_t half = size / 2;
   DataFile df;
-  df.set_name(Path("r").c_str());
+  df.set_name(path("r").c_str());
   for (int buffer : {0, 1, 7, 1000, 65536, 300000}) {
     SCOPED_TRACE(buffer);
     df.set_buffer_size(buffer);
@@ -48,7 +48,7 @@ TEST_F(DataFileTest, BufferedAndUnbufferedTransfersGiveTheSameBytes) {
     char c;
     EXPECT_EQ(df.read(&c, 1), 1);  // open for writing
     ASSERT_EQ(df.close(), 0);
-    ASSERT_EQ(ReadFile(Path("r")), data);
+    ASSERT_EQ(slurp(path("r")), data);
 
     df.set_buffer_size(buffer);
     ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
@@ -85,13 +85,13 @@ TEST_F(DataFileTest, BufferedAndUnbufferedTransfersGiveTheSameBytes) {
 }
 
 TEST_F(DataFileTest, FailuresGiveTheirCodes) {
-  WriteFile(Path("f"), "0123456789");
+  spit(path("f"), "0123456789");
   DataFile df;
-  df.set_name(Path("missing").c_str());
+  df.set_name(path("missing").c_str());
   EXPECT_FALSE(df.exists());
   EXPECT_EQ(df.open(DataFile::kOpenRead), 9);
   EXPECT_EQ(df.open(DataFile::kOpenUpdate), 9);
-  df.set_name(Path("f").c_str());
+  df.set_name(path("f").c_str());
   EXPECT_TRUE(df.exists());
   EXPECT_EQ(df.open(7), 1);
   char buf[16];
@@ -119,7 +119,7 @@ TEST_F(DataFileTest, FailuresGiveTheirCodes) {
 TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
   // A sparse raster of 600000 lines of 1024 FLOAT_COMPLEX samples (4.9 GB).
   DataFile df;
-  Describe(&df, Path("big"), CT_FLOAT_COMPLEX, false, 600000, 1024, kPrefix, 0);
+  Describe(&df, path("big"), CT_FLOAT_COMPLEX, false, 600000, 1024, kPrefix, 0);
   const int64_t line = 590001;
   ASSERT_GT(df.line_offset(line), int64_t{1} << 32);
   std::vector<float> in(2048);
@@ -135,7 +135,7 @@ TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
   ASSERT_EQ(io.writebuffer(reinterpret_cast<const char*>(in.data())), 0);
   EXPECT_EQ(df.tell(), df.line_offset(line + 1));
   ASSERT_EQ(df.close(), 0);
-  EXPECT_EQ(static_cast<int64_t>(std::filesystem::file_size(Path("big"))), df.data_size());
+  EXPECT_EQ(static_cast<int64_t>(std::filesystem::file_size(path("big"))), df.data_size());
 
   for (int buffered = 0; buffered <= 1; ++buffered) {
     df.set_buffer_size(buffered ? 65536 : 0);
@@ -145,38 +145,38 @@ TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
     EXPECT_EQ(out, in);
     ASSERT_EQ(df.close(), 0);
   }
-  std::filesystem::remove(Path("big"));
+  std::filesystem::remove(path("big"));
 }
 
 TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   DataFile df;
-  Describe(&df, Path("src"), CT_INT16, true, 3, 4, 2, 6);
+  Describe(&df, path("src"), CT_INT16, true, 3, 4, 2, 6);
   const std::string data = RandomBytes(static_cast<size_t>(df.data_size()), 3);  // 36 bytes
   EXPECT_FALSE(df.holds_data());
-  WriteFile(Path("src"), data + "trailing bytes are not raster data");
+  spit(path("src"), data + "trailing bytes are not raster data");
   EXPECT_TRUE(df.holds_data());
-  ASSERT_EQ(df.copy(Path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
-  EXPECT_EQ(ReadFile(Path("dst")), data);
+  ASSERT_EQ(df.copy(path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
+  EXPECT_EQ(slurp(path("dst")), data);
   DataFile copied;  // the header as well
-  ASSERT_EQ(copied.read_hdr(Path("dst").c_str()), 0);
+  ASSERT_EQ(copied.read_hdr(path("dst").c_str()), 0);
   EXPECT_EQ(copied.header_offset, 6);
 
-  EXPECT_EQ(df.copy(Path("x").c_str(), 0), 1);
-  EXPECT_EQ(df.copy(Path("src").c_str(), 10), 1);  // onto itself: refused, source intact
-  EXPECT_EQ(ReadFile(Path("src")).substr(0, data.size()), data);
+  EXPECT_EQ(df.copy(path("x").c_str(), 0), 1);
+  EXPECT_EQ(df.copy(path("src").c_str(), 10), 1);  // onto itself: refused, source intact
+  EXPECT_EQ(slurp(path("src")).substr(0, data.size()), data);
   df.lines_per_image = 10;  // longer than the file
   EXPECT_FALSE(df.holds_data());
-  EXPECT_EQ(df.copy(Path("dst").c_str(), 10), 4);
+  EXPECT_EQ(df.copy(path("dst").c_str(), 10), 4);
 
   // A copy of an open file is closed and writes its header like the original.
   ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
   DataFile copy = df;
   EXPECT_FALSE(copy.is_open());
   EXPECT_EQ(copy.name(), df.name());
-  copy.set_name(Path("copy").c_str());
+  copy.set_name(path("copy").c_str());
   copy.lines_per_image = 11;
   ASSERT_EQ(copy.write_hdr(), 0);
-  ASSERT_EQ(copied.read_hdr(Path("copy").c_str()), 0);
+  ASSERT_EQ(copied.read_hdr(path("copy").c_str()), 0);
   EXPECT_EQ(copied.header_offset, 6);
   EXPECT_EQ(copied.lines_per_image, 11);
 }

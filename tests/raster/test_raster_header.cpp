@@ -11,9 +11,6 @@
 
 namespace {
 
-using raster_test::ReadFile;
-using raster_test::WriteFile;
-
 class RasterHeaderTest : public raster_test::ScratchDir {
  protected:
   // A header document whose "RasterInfo" block holds `fields` in order.
@@ -41,8 +38,8 @@ class RasterHeaderTest : public raster_test::ScratchDir {
   // read_hdr of a header file with the given text; BufferFile's reader
   // must come to the same verdict.
   int ReadHeader(const std::string& text, DataFile* df) {
-    const std::string name = Path("h" + std::to_string(++count_));
-    WriteFile(name + ".hdr", text);
+    const std::string name = path("h" + std::to_string(++count_));
+    spit(name + ".hdr", text);
     const int result = df->read_hdr(name.c_str());
     EXPECT_EQ(BufferFile().readhdr((name + ".hdr").c_str()), result);
     return result;
@@ -51,18 +48,18 @@ class RasterHeaderTest : public raster_test::ScratchDir {
 };
 
 TEST_F(RasterHeaderTest, XmlHeaderRoundTripKeepsOtherBlocks) {
-  const std::string name = Path("scene");
-  WriteFile(name + ".hdr",
-            "<?xml version=\"1.0\"?>\n<TessalXmlDoc><NumberOfChannels>1</NumberOfChannels>"
-            "<Description>My description</Description><Channel Number=\"1\"><Other><A>5</A>"
-            "</Other></Channel></TessalXmlDoc>\n");
+  const std::string name = path("scene");
+  spit(name + ".hdr",
+       "<?xml version=\"1.0\"?>\n<TessalXmlDoc><NumberOfChannels>1</NumberOfChannels>"
+       "<Description>My description</Description><Channel Number=\"1\"><Other><A>5</A>"
+       "</Other></Channel></TessalXmlDoc>\n");
   DataFile df;
   // A header offset beyond 2 GiB: product data sets start there.
   raster_test::Describe(&df, name, CT_SHORT_COMPLEX, true, 42, 5000, 17, 3000000000LL);
   ASSERT_EQ(df.write_hdr(), 0);
   ASSERT_EQ(df.write_hdr(), 0);  // rewriting keeps one block
 
-  const std::string text = ReadFile(name + ".hdr");
+  const std::string text = slurp(name + ".hdr");
   EXPECT_NE(text.find("<HeaderOffset>3000000000</HeaderOffset>"), std::string::npos);
   EXPECT_NE(text.find("<A>5</A>"), std::string::npos);
   EXPECT_EQ(text.find("<RasterInfo>"), text.rfind("<RasterInfo>"));
@@ -128,11 +125,11 @@ TEST_F(RasterHeaderTest, HostileHeadersAreRefused) {
   // Not a header at all, and no header.
   EXPECT_EQ(ReadHeader(std::string("\x01\xff<Tessal\0[Raster", 17), &df), 1);
   EXPECT_EQ(ReadHeader("", &df), 1);
-  EXPECT_EQ(df.read_hdr(Path("absent").c_str()), 1);
+  EXPECT_EQ(df.read_hdr(path("absent").c_str()), 1);
   EXPECT_EQ(df.read_hdr(nullptr), 1);
 
   // A description that no reader would accept is not written either.
-  df.set_name(Path("bad").c_str());
+  df.set_name(path("bad").c_str());
   df.pixels_per_line = -1;
   EXPECT_EQ(df.write_hdr(), 1);
 }
