@@ -1,5 +1,5 @@
-// The metadata sections of a SAR data set: their blocks, their older
-// parameter-file form, failing and optional keys, and hostile headers.
+// The metadata sections of a SAR data set: their older parameter-file form,
+// failing and optional keys, shared headers and hostile headers.
 #include <functional>
 #include <memory>
 

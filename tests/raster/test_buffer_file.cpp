@@ -3,15 +3,11 @@
 #include <algorithm>
 #include <climits>
 #include <cstdint>
-#include <filesystem>
-#include <fstream>
-#include <limits>
 #include <random>
 #include <string>
 #include <vector>
 
 #include "raster/buffer_file.h"
-#include "raster/buffer_io.h"
 #include "raster/data_file.h"
 #include "raster_fixture.h"
 
