@@ -10,10 +10,9 @@
 
 #include "metadata_sections/geo_coords.h"
 #include "metadata_sections/gs_roi.h"
-#include "orbit/earth_constants.h"
 #include "orbit/general_sar_orbit.h"
-#include "orbit/geodetic.h"
 #include "synth_run.h"
+#include "truth_math.h"
 
 namespace {
 
@@ -29,15 +28,9 @@ double Value(const SynthRun& run, const std::string& section, const std::string&
   return std::atof(Text(run, section, key).c_str());
 }
 
-// Earth-fixed point of a latitude and longitude (degrees) on the ellipsoid.
-void Cartesian(double lat, double lon, double out[3]) {
-  const double llh[3] = {lat / kRadToDeg, lon / kRadToDeg, 0.0};
-  geo2cart(out, llh);
-}
-
-double Distance(const double a[3], const double b[3]) {
-  return std::sqrt((a[0] - b[0]) * (a[0] - b[0]) + (a[1] - b[1]) * (a[1] - b[1]) +
-                   (a[2] - b[2]) * (a[2] - b[2]));
+// Earth-fixed point of a truth corner.
+truth::Vec3 Corner(const SynthRun& run, const std::string& swath, const std::string& name) {
+  return truth::EarthFixed(Value(run, swath, name + "Lat"), Value(run, swath, name + "Lon"));
 }
 
 // One truth point of a sub-swath.
@@ -88,14 +81,14 @@ TEST_P(SynthTruth, GroundPointsOfEverySubSwath) {
     for (const TruthPoint& p : kPoints) {
       const double t = Value(*run_, Swath(k), p.time);
       const double tau = Value(*run_, Swath(k), p.range);
-      double truth[3], g[3], lat = 0.0, lon = 0.0, h[3];
-      Cartesian(Value(*run_, Swath(k), std::string(p.name) + "Lat"),
-                Value(*run_, Swath(k), std::string(p.name) + "Lon"), truth);
-      ASSERT_EQ(orbit_.sat2earth(t, tau, g), 0);
-      EXPECT_LT(Distance(g, truth), 0.1) << Swath(k) << " " << p.name;
+      const truth::Vec3 want = Corner(*run_, Swath(k), p.name);
+      truth::Vec3 g;
+      double lat = 0.0, lon = 0.0;
+      ASSERT_EQ(orbit_.sat2earth(t, tau, g.data()), 0);
+      EXPECT_LT(truth::Distance(g, want), 0.1) << Swath(k) << " " << p.name;
       ASSERT_EQ(orbit_.SVGetLatLon(t, tau, &lat, &lon), 0);
-      Cartesian(lat, lon, h);
-      EXPECT_LT(Distance(h, truth), 0.1) << Swath(k) << " " << p.name;
+      EXPECT_LT(truth::Distance(truth::EarthFixed(lat, lon), want), 0.1)
+          << Swath(k) << " " << p.name;
     }
     // The look angle from the geocentric nadir, as the generator measures it.
     double inc = 0.0, look = 0.0;
@@ -129,11 +122,9 @@ TEST_P(SynthTruth, CornersOfEverySubSwath) {
                    {&gc.SouthEast, ascending ? "FirstFar" : "LastNear"},
                    {&gc.Center, "Centre"}};
     for (const auto& c : corners) {
-      double truth[3], got[3];
-      Cartesian(Value(*run_, Swath(k), std::string(c.truth) + "Lat"),
-                Value(*run_, Swath(k), std::string(c.truth) + "Lon"), truth);
-      Cartesian(c.point->latitude, c.point->longitude, got);
-      EXPECT_LT(Distance(got, truth), 1.0) << Swath(k) << " " << c.truth;
+      const truth::Vec3 got = truth::EarthFixed(c.point->latitude, c.point->longitude);
+      EXPECT_LT(truth::Distance(got, Corner(*run_, Swath(k), c.truth)), 1.0)
+          << Swath(k) << " " << c.truth;
     }
   }
 }

@@ -6,7 +6,6 @@
 #include <vector>
 
 #include "orbit/earth_constants.h"
-#include "orbit/geodetic.h"
 #include "orbit/state_vectors.h"
 #include "orbit_test_files.h"
 
@@ -21,7 +20,7 @@ TEST(StateVectors, ClosedFormOrbitWithinAMillimetre) {
   const struct {
     int n;
     double dt;
-  } grids[] = {{5, 5.0}, {7, 5.0}, {11, 5.0}, {5, 10.0}};
+  } grids[] = {{5, 5.0}, {11, 5.0}, {5, 10.0}};
   for (const auto& g : grids) {
     for (double start : {orbit.tNode - 300.0, orbit.tNode + 1500.0}) {
       SAROrbitStateVectors_Obj sv;
@@ -54,9 +53,8 @@ TEST(StateVectors, GroundPointOfTheFirstFiveVectors) {
     sv.setLookSign(sign);
     for (double t : {t0 - 0.5 * dt, t0 + 7.3, t0 + 4.5 * dt}) {
       ASSERT_EQ(sv.SVGetLatLon(t, tau, lambda, &lat, &lon), 0);
-      const double llh[3] = {lat / kRadToDeg, lon / kRadToDeg, 0.0};
-      double g[3], p[3], v[3];
-      geo2cart(g, llh);
+      const truth::Vec3 g = truth::EarthFixed(lat, lon);
+      double p[3], v[3];
       orbit.at(t, p, v);
       const double d[3] = {p[0] - g[0], p[1] - g[1], p[2] - g[2]};
       const double r = std::sqrt(d[0] * d[0] + d[1] * d[1] + d[2] * d[2]);
@@ -156,7 +154,7 @@ TEST_F(StateVectorHeaders, LongOrbitsAreKeptButNotFittedByOnePolynomial) {
     EXPECT_LT(worstP, 0.2);
     EXPECT_LT(worstV, 2e-4);
   }
-  for (int n : {kMaxFitStateVectors + 1, 1500, kMaxStateVectors}) {
+  for (int n : {kMaxFitStateVectors + 1, kMaxStateVectors}) {
     SAROrbitStateVectors_Obj written;
     Sample(orbit, t0, dt, n, &written);
     // The longest is built in memory only: its header would be large.
