@@ -49,7 +49,7 @@ class BadDoris : public ScratchTest {
   DorisText vor_;
 };
 
-TEST_F(BadDoris, HostileFilesGive4) {
+TEST_F(BadDoris, HostileFilesGiveTheirCodes) {
   const auto swap = [](int a) {
     return [a](Doris* d) { std::swap(d->records[a], d->records[a + 1]); };
   };
@@ -107,6 +107,18 @@ TEST_F(BadDoris, HostileFilesGive4) {
   EXPECT_EQ(Read(path("empty"), time(20)), 4);
   // Nine records are enough.
   EXPECT_EQ(Read(Write([](Doris* d) { d->records.resize(9); }), time(4)), 0);
+  // Only the four orbit products are read.
+  const struct {
+    const char* name;
+    int code;
+  } names[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
+               {"DOR_NL__AX", 12}, {"ASA_WSS_1P", 12}, {"dor_vor_ax", 12}, {"DOR_VOR_1P", 12}};
+  for (const auto& c : names) {
+    const std::string file = Write([&c](Doris* d) { d->header.replace(9, 10, c.name); });
+    EXPECT_EQ(Read(file, time(20)), c.code) << c.name;
+  }
+  EXPECT_EQ(Read(kXca, time(20)), 12);
+  EXPECT_EQ(Read(path("absent"), time(20)), 9);
 }
 
 // Every vector of a long grid reads the records around its own time, so
@@ -128,20 +140,6 @@ TEST_F(BadDoris, DamageWithinTheGridsReachGives4) {
     EXPECT_EQ(Read(file, time(20), 41, 30.0), 4) << c.what;
     EXPECT_EQ(Read(file, time(20)), 0) << c.what;
   }
-}
-
-TEST_F(BadDoris, OnlyTheFourOrbitProductNamesAreRead) {
-  const struct {
-    const char* name;
-    int code;
-  } cases[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
-               {"DOR_NL__AX", 12}, {"ASA_WSS_1P", 12}, {"dor_vor_ax", 12}, {"DOR_VOR_1P", 12}};
-  for (const auto& c : cases) {
-    const std::string file = Write([&c](Doris* d) { d->header.replace(9, 10, c.name); });
-    EXPECT_EQ(Read(file, time(20)), c.code) << c.name;
-  }
-  EXPECT_EQ(Read(kXca, time(20)), 12);
-  EXPECT_EQ(Read(path("absent"), time(20)), 9);
 }
 
 TEST_F(BadDoris, InvalidRequestsGive1) {
