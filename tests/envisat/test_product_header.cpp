@@ -32,24 +32,14 @@ double truth(const SynthRun& r, const char* s, const char* k) {
   return std::stod(r.truth.at(s).at(k));
 }
 
-class GeneratedProduct : public ::testing::Test {
- protected:
-  static void SetUpTestSuite() {
-    run_ = new SynthRun(run_synth("--orbit kepler --polarisation VV --pass ascending"));
-  }
-  static void TearDownTestSuite() {
-    remove_run(*run_);
-    delete run_;
-  }
-  static SynthRun* run_;
-};
-SynthRun* GeneratedProduct::run_ = nullptr;
-
-TEST_F(GeneratedProduct, HeaderValuesAtTheirOffsets) {
-  ASSERT_EQ(run_->exit_code, 0);
+// The header values and descriptors of a generated product, as its truth
+// states them.
+TEST(ProductHeader, GeneratedProductAsItsTruthStates) {
+  const SynthRun run = run_synth("--orbit kepler --polarisation VV --pass ascending");
+  ASSERT_EQ(run.exit_code, 0);
   EnvisatHeaders h;
-  ASSERT_EQ(read_envisat_headers(run_->product.c_str(), &h), 0);
-  const auto& scene = run_->truth.at("Scene");
+  ASSERT_EQ(read_envisat_headers(run.product.c_str(), &h), 0);
+  const auto& scene = run.truth.at("Scene");
   EXPECT_EQ(h.product, scene.at("Product"));
   EXPECT_EQ(h.productType, "WSS");
   EXPECT_TRUE(h.wss);
@@ -67,16 +57,10 @@ TEST_F(GeneratedProduct, HeaderValuesAtTheirOffsets) {
   EXPECT_EQ(h.mds1Polar, "V/V");
   EXPECT_EQ(h.dataType, "SWOR");
   ASSERT_TRUE(h.spacingsValid);
-  EXPECT_NEAR(h.rangeSpacing, truth(*run_, "Scene", "RangeSpacing"), 1e-6);
-  EXPECT_NEAR(h.lineTimeInterval, truth(*run_, "Scene", "LineTimeInterval"), 1e-9);
-  EXPECT_NEAR(h.azimuthSpacing, truth(*run_, "Scene", "AzimuthSpacing"), 1e-4);
-  EXPECT_EQ(h.fileSize, truth(*run_, "Scene", "TotalSize"));
-}
-
-TEST_F(GeneratedProduct, WideSwathDescriptors) {
-  ASSERT_EQ(run_->exit_code, 0);
-  EnvisatHeaders h;
-  ASSERT_EQ(read_envisat_headers(run_->product.c_str(), &h), 0);
+  EXPECT_NEAR(h.rangeSpacing, truth(run, "Scene", "RangeSpacing"), 1e-6);
+  EXPECT_NEAR(h.lineTimeInterval, truth(run, "Scene", "LineTimeInterval"), 1e-9);
+  EXPECT_NEAR(h.azimuthSpacing, truth(run, "Scene", "AzimuthSpacing"), 1e-4);
+  EXPECT_EQ(h.fileSize, truth(run, "Scene", "TotalSize"));
   const EnvisatDsdLayout& l = h.layout();
   EXPECT_EQ(l.mainProcessing, 1339u);
   const struct {
@@ -99,11 +83,12 @@ TEST_F(GeneratedProduct, WideSwathDescriptors) {
   ASSERT_EQ(h.imageDataSets(mds), 5);
   for (int k = 0; k < 5; ++k) {
     const std::string s = "SubSwath" + std::to_string(k + 1);
-    EXPECT_EQ(mds[k].offset, truth(*run_, s.c_str(), "MdsOffset"));
-    EXPECT_EQ(mds[k].dsrSize, truth(*run_, s.c_str(), "RecordSize"));
-    EXPECT_EQ(mds[k].numDsr, truth(*run_, s.c_str(), "Records"));
+    EXPECT_EQ(mds[k].offset, truth(run, s.c_str(), "MdsOffset"));
+    EXPECT_EQ(mds[k].dsrSize, truth(run, s.c_str(), "RecordSize"));
+    EXPECT_EQ(mds[k].numDsr, truth(run, s.c_str(), "Records"));
     EXPECT_TRUE(mds[k].fitsIn(h.fileSize));
   }
+  remove_run(run);
 }
 
 // A product of headers only, encoded here from the published layout: MPH
