@@ -6,15 +6,10 @@
 #include <string>
 
 #include "envisat/envisat_types.h"
-#include "synth_run.h"
-
-using synth_test::remove_run;
-using synth_test::run_synth;
-using synth_test::SynthRun;
+#include "sample_files.h"
 
 namespace {
 
-const std::string kData = vlr_test::kSampleDir;
 const std::string kVor = vlr_test::kSampleVor;
 const std::string kPor = vlr_test::kSamplePor;
 const std::string kXca = vlr_test::kSampleXca;
@@ -87,93 +82,56 @@ TEST(EnvisatTypes, UnreadableFilesAreNoType) {
   EXPECT_EQ(EnvisatTypes::check_dorvor(empty.c_str(), kVor.c_str()), 0);
 }
 
-// Generated products against the real precise orbit, valid from
-// 01-MAR-2008 21:55:27 to 03-MAR-2008 00:23:27: the product's sensing start
-// must lie strictly inside.
-TEST(EnvisatTypes, CheckDorvorAgainstTheRealOrbitValidity) {
-  struct Case {
-    const char* start;
-    int expected;
-  };
-  const Case cases[] = {
-      {"02-MAR-2008 10:00:00", 1},        {"01-MAR-2008 21:55:27", 0},
-      {"01-MAR-2008 21:55:27.000001", 1}, {"03-MAR-2008 00:23:26.999999", 1},
-      {"03-MAR-2008 00:23:27", 0},        {"01-MAR-2008 21:00:00", 0},
-      {"04-MAR-2008 10:00:00", 0},
-  };
-  for (const Case& c : cases) {
-    const SynthRun r = run_synth(std::string("--orbit kepler --start \"") + c.start + "\"");
-    ASSERT_EQ(r.exit_code, 0) << c.start;
-    EXPECT_EQ(r.truth.at("Scene").at("SensingStartText").substr(0, 20),
-              std::string(c.start).substr(0, 20));
-    EXPECT_EQ(EnvisatTypes::check_dorvor(r.product.c_str(), kVor.c_str()), c.expected) << c.start;
-    // The generated orbit file around the scene covers it.
-    const std::string own = r.dir + r.truth.at("Scene").at("OrbitFile");
-    EXPECT_EQ(EnvisatTypes::check_dorvor(r.product.c_str(), own.c_str()), 1) << c.start;
-    remove_run(r);
-  }
-}
-
-// A sensing time that is not a date never counts as 1-JAN-1985: the orbit
-// file is not taken as valid.
-TEST(EnvisatTypes, CheckDorvorRefusesTimesThatAreNotDates) {
+// Products against the real orbit files: the precise one is valid from
+// 01-MAR-2008 21:55:27 to 03-MAR-2008 00:23:27 and the product's sensing
+// start must lie strictly inside; a sensing time that is not a date never
+// counts as 1-JAN-1985.
+TEST(EnvisatTypes, CheckDorvorWantsAnAsarProductInsideTheOrbitsValidity) {
   std::ifstream in(kVor, std::ios::binary);
   const std::string vor((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
   ASSERT_EQ(vor.substr(351, 20), "01-MAR-2008 21:55:27");
+  const std::string inside = "02-MAR-2008 10:00:00.000000";
   const struct {
-    const char* what;
-    const char* productStart;
+    const char* type;  // first ten characters of the product name
+    std::string start;
+    const std::string* orbitFile;
     size_t orbitAt;  // 0: orbit file unchanged
     const char* orbitText;
     int expected;
   } cases[] = {
-      {"valid times", "02-MAR-2008 10:00:00.000000", 0, "", 1},
-      {"orbit start not a date", "02-MAR-2008 10:00:00.000000", 351, "xx-MAR-2008 21:55:27.000000",
-       0},
-      {"orbit start blank", "02-MAR-2008 10:00:00.000000", 351, "                           ", 0},
-      {"orbit stop not a date", "02-MAR-2008 10:00:00.000000", 394, "03-XXX-2008 00:23:27.000000",
-       0},
-      {"product start not a date", "02-MAR-2008 10:99:00.000000", 0, "", 0},
-      {"product start blank", "                           ", 0, "", 0},
+      {"ASA_WSS_1P", inside, &kVor, 0, "", 1},
+      {"ASA_WSS_1P", "01-MAR-2008 21:55:27.000000", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", "01-MAR-2008 21:55:27.000001", &kVor, 0, "", 1},
+      {"ASA_WSS_1P", "03-MAR-2008 00:23:26.999999", &kVor, 0, "", 1},
+      {"ASA_WSS_1P", "03-MAR-2008 00:23:27.000000", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", "01-MAR-2008 21:00:00.000000", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", "04-MAR-2008 10:00:00.000000", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", "02-MAR-2008 10:99:00.000000", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", "                           ", &kVor, 0, "", 0},
+      {"ASA_WSS_1P", inside, &kVor, 351, "xx-MAR-2008 21:55:27.000000", 0},
+      {"ASA_WSS_1P", inside, &kVor, 351, "                           ", 0},
+      {"ASA_WSS_1P", inside, &kVor, 394, "03-XXX-2008 00:23:27.000000", 0},
+      // Any ASAR type counts; the preliminary orbit is a month later.
+      {"ASA_IMS_1P", inside, &kVor, 0, "", 1},
+      {"SAR_IMS_1P", inside, &kVor, 0, "", 0},
+      {"ASA_WSS_1P", inside, &kPor, 0, "", 0},
   };
+  const std::string product = testing::TempDir() + "dates_product";
+  const std::string orbit = testing::TempDir() + "dates_orbit";
   for (const auto& c : cases) {
-    SCOPED_TRACE(c.what);
-    const std::string product = testing::TempDir() + "dates_product";
+    SCOPED_TRACE(std::string(c.type) + " " + c.start + " " + c.orbitText);
     std::ofstream(product, std::ios::binary)
-        << "PRODUCT=\"ASA_WSS_1PNPDK20080302_100000\"" << std::string(312, ' ') << c.productStart
+        << "PRODUCT=\"" << c.type << "NPDK20080302_100000\"" << std::string(312, ' ') << c.start
         << std::string(1000, ' ');
     std::string orbitText = vor;
     if (c.orbitAt != 0) orbitText.replace(c.orbitAt, 27, c.orbitText);
-    const std::string orbit = testing::TempDir() + "dates_orbit";
-    std::ofstream(orbit, std::ios::binary) << orbitText;
-    EXPECT_EQ(EnvisatTypes::check_dorvor(product.c_str(), orbit.c_str()), c.expected);
+    std::ofstream(orbit, std::ios::binary) << (c.orbitFile == &kVor ? orbitText : "");
+    const std::string& file = c.orbitAt == 0 ? *c.orbitFile : orbit;
+    EXPECT_EQ(EnvisatTypes::check_dorvor(product.c_str(), file.c_str()), c.expected);
   }
-}
-
-TEST(EnvisatTypes, CheckDorvorWantsAnAsarProductAndAReadableOrbit) {
-  const SynthRun r = run_synth("--orbit kepler --start \"02-MAR-2008 10:00:00\"");
-  ASSERT_EQ(r.exit_code, 0);
-  EXPECT_EQ(EnvisatTypes::find_type(r.product.c_str()), kEnvisatAsaWss);
-  EXPECT_EQ(EnvisatTypes::check_dorvor(r.product.c_str(), "/nonexistent/DOR_VOR"), 0);
+  EXPECT_EQ(EnvisatTypes::check_dorvor(product.c_str(), "/nonexistent/DOR_VOR"), 0);
   // Not an ASAR product: the orbit file tested against itself.
   EXPECT_EQ(EnvisatTypes::check_dorvor(kVor.c_str(), kVor.c_str()), 0);
-  // A preliminary orbit serves as well; this one is a month later.
-  EXPECT_EQ(EnvisatTypes::check_dorvor(r.product.c_str(), kPor.c_str()), 0);
-  remove_run(r);
-  // Any ASAR type counts, an image-mode product as well as a wide-swath one.
-  const SynthRun ims = run_synth(
-      "--orbit kepler --start \"02-MAR-2008 10:00:00\" "
-      "--wrong-type ASA_IMS_1P");
-  ASSERT_EQ(ims.exit_code, 0);
-  EXPECT_EQ(EnvisatTypes::find_type(ims.product.c_str()), kEnvisatAsaIms);
-  EXPECT_EQ(EnvisatTypes::check_dorvor(ims.product.c_str(), kVor.c_str()), 1);
-  remove_run(ims);
-  const SynthRun other = run_synth(
-      "--orbit kepler --start \"02-MAR-2008 10:00:00\" "
-      "--wrong-type SAR_IMS_1P");
-  ASSERT_EQ(other.exit_code, 0);
-  EXPECT_EQ(EnvisatTypes::check_dorvor(other.product.c_str(), kVor.c_str()), 0);
-  remove_run(other);
 }
 
 }  // namespace

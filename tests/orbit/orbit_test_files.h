@@ -5,20 +5,21 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <cctype>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
+#include <ctime>
 #include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
 
 #include "sample_files.h"
-#include "time/date_text.h"
+#include "truth_math.h"
 
 namespace orbit_test {
 
-const std::string kData = vlr_test::kSampleDir;
 const std::string kVor = vlr_test::kSampleVor;
 const std::string kPor = vlr_test::kSamplePor;
 const std::string kXca = vlr_test::kSampleXca;
@@ -47,7 +48,7 @@ struct Record {
 
 inline Record ParseRecord(const std::string& r) {
   Record x;
-  x.t = ascii2sec85(r.substr(0, 27).c_str());
+  x.t = truth::Sec85(r.substr(0, 27));
   x.orbit = std::stoi(r.substr(37, 6));
   for (int a = 0; a < 3; ++a) {
     x.p[a] = std::stod(r.substr(44 + 13 * a, 12));
@@ -82,6 +83,19 @@ inline std::string CountText(long long n) {
   char b[32];
   std::snprintf(b, sizeof b, "%+011lld", n);
   return b;
+}
+
+// "DD-MMM-YYYY HH:MM:SS.ffffff" of seconds since 1985, by the C library.
+inline std::string DateText(double t) {
+  constexpr time_t kUnixAt1985 = 473385600;
+  const double whole = std::floor(t);
+  const time_t unix = kUnixAt1985 + static_cast<time_t>(whole);
+  char text[40];
+  std::strftime(text, sizeof text, "%d-%b-%Y %H:%M:%S", std::gmtime(&unix));
+  for (char* c = text + 3; c < text + 6; ++c) *c = static_cast<char>(std::toupper(*c));
+  std::snprintf(text + 20, sizeof text - 20, ".%06d",
+                static_cast<int>(std::lround((t - whole) * 1e6)));
+  return text;
 }
 
 // A circular orbit of radius r and inclination incl, seen from the rotating

@@ -2,6 +2,7 @@
 // none makes the reader read past the end of the file.
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -12,167 +13,137 @@ using namespace orbit_test;
 
 namespace {
 
+// A file built from the real header and its first 40 records, then damaged.
+struct Doris {
+  std::string header;
+  std::vector<std::string> records;
+  long long count = -1;  // the record count written, -1: the true one
+  std::string text;      // when not empty, the file's whole content
+};
+
 class BadDoris : public ScratchTest {
  protected:
   void SetUp() override {
     ScratchTest::SetUp();
     vor_ = SplitDoris(kVor);
-    records_.assign(vor_.records.begin(), vor_.records.begin() + 40);
   }
   double time(int i) const { return ParseRecord(vor_.records[i]).t; }
-  int read(const std::string& file, double tc, int wantAnx = 0) {
-    double p[9], v[9], anx = 0.0;
-    int orbit = 0;
-    return interp_orb_l(file.c_str(), tc, 3, 10.0, p, v, &orbit, wantAnx, &anx);
+  std::string Write(const std::function<void(Doris*)>& damage) {
+    Doris d;
+    d.header = vor_.header;
+    d.records.assign(vor_.records.begin(), vor_.records.begin() + 40);
+    damage(&d);
+    if (d.text.empty()) return WriteDoris("damaged", d.header, d.records, d.count);
+    Spit(path("damaged"), d.text);
+    return path("damaged");
+  }
+  // Reads n vectors dt apart around time tc.
+  static int Read(const std::string& file, double tc, int n = 3, double dt = 10.0) {
+    std::vector<double> p(3 * n + 3), v(3 * n + 3);
+    return interp_orb_l(file.c_str(), tc, n, dt, p.data(), v.data(), nullptr, 0, nullptr);
+  }
+  static void Damage(Doris* d, int record, size_t offset, const std::string& text) {
+    d->records[record].replace(offset, text.size(), text);
   }
 
   DorisText vor_;
-  std::vector<std::string> records_;
 };
 
-TEST_F(BadDoris, OnlyTheFourOrbitProductNamesAreRead) {
+TEST_F(BadDoris, HostileFilesGiveTheirCodes) {
+  const auto swap = [](int a) {
+    return [a](Doris* d) { std::swap(d->records[a], d->records[a + 1]); };
+  };
+  // The last record cut short, the count still claiming it.
+  const auto cut = [](Doris* d) {
+    d->records.back().resize(100);
+    d->count = 40;
+  };
+  const auto header = [](const char* key, const char* value) {
+    return [key, value](Doris* d) {
+      SetHeaderValue(&d->header, "NUM_DSR", CountText(static_cast<long long>(d->records.size())));
+      SetHeaderValue(&d->header, key, value);
+      d->text = d->header;
+      for (const std::string& r : d->records) d->text += r;
+    };
+  };
+  const struct {
+    const char* what;
+    std::function<void(Doris*)> damage;
+    int at;  // record of the real file at the requested time
+  } cases[] = {
+      {"no records", [](Doris* d) { d->records.clear(); }, 0},
+      {"one record", [](Doris* d) { d->records.resize(1); }, 0},
+      {"eight records", [](Doris* d) { d->records.resize(8); }, 0},
+      {"x position", [](Doris* d) { Damage(d, 10, 44, "+649x931.106"); }, 20},
+      {"a blank inside z", [](Doris* d) { Damage(d, 23, 75, " "); }, 20},
+      {"vz", [](Doris* d) { Damage(d, 10, 109, "++692.698996"); }, 20},
+      {"orbit number", [](Doris* d) { Damage(d, 23, 37, "+3l388"); }, 20},
+      {"day of the date", [](Doris* d) { Damage(d, 10, 0, "3X"); }, 20},
+      {"month of the date", [](Doris* d) { Damage(d, 23, 3, "XYZ"); }, 20},
+      {"empty vx", [](Doris* d) { Damage(d, 10, 83, "            "); }, 20},
+      {"records swapped", swap(15), 20},
+      {"records swapped after tc", swap(22), 20},
+      {"a record repeated", [](Doris* d) { d->records[12] = d->records[11]; }, 20},
+      {"a gap", [](Doris* d) { d->records.erase(d->records.begin() + 19); }, 18},
+      {"last record cut", cut, 20},
+      {"last record cut, early tc", cut, 2},
+      {"count 41", [](Doris* d) { d->count = 41; }, 20},
+      {"count 1589", [](Doris* d) { d->count = 1589; }, 20},
+      {"count 2^31 - 1", [](Doris* d) { d->count = 2147483647LL; }, 20},
+      {"count 9999999999", [](Doris* d) { d->count = 9999999999LL; }, 20},
+      {"records end before tc", [](Doris*) {}, 100},
+      {"header cut in the MPH", [](Doris* d) { d->text = d->header.substr(0, 1000); }, 20},
+      {"header cut in the SPH", [](Doris* d) { d->text = d->header.substr(0, 1400); }, 20},
+      {"negative count", header("NUM_DSR", "-0000000005"), 20},
+      {"count not a number", header("NUM_DSR", "+00000x0040"), 20},
+      {"blank count", header("NUM_DSR", "           "), 20},
+      {"offset beyond the file", header("DS_OFFSET", "+00000000000099999999"), 20},
+      {"sensing start not a date", header("SENSING_START", "\"xx-MAR-2008"), 20},
+      {"blank sensing stop", header("SENSING_STOP", "\"                           "), 20},
+  };
+  for (const auto& c : cases) EXPECT_EQ(Read(Write(c.damage), time(c.at)), 4) << c.what;
+  // An empty file.
+  Spit(path("empty"), "");
+  EXPECT_EQ(Read(path("empty"), time(20)), 4);
+  // Nine records are enough.
+  EXPECT_EQ(Read(Write([](Doris* d) { d->records.resize(9); }), time(4)), 0);
+  // Only the four orbit products are read.
   const struct {
     const char* name;
     int code;
-  } cases[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
+  } names[] = {{"DOR_VOR_AX", 0},  {"DOR_POR_AX", 0},  {"AUX_FRO_AX", 0},  {"AUX_FPO_AX", 0},
                {"DOR_NL__AX", 12}, {"ASA_WSS_1P", 12}, {"dor_vor_ax", 12}, {"DOR_VOR_1P", 12}};
-  for (const auto& c : cases) {
-    std::string header = vor_.header;
-    header.replace(9, 10, c.name);
-    EXPECT_EQ(read(WriteDoris(c.name, header, records_), time(20)), c.code) << c.name;
+  for (const auto& c : names) {
+    const std::string file = Write([&c](Doris* d) { d->header.replace(9, 10, c.name); });
+    EXPECT_EQ(Read(file, time(20)), c.code) << c.name;
   }
-  EXPECT_EQ(read(kXca, time(20)), 12);
-  EXPECT_EQ(read(path("absent"), time(20)), 9);
-}
-
-TEST_F(BadDoris, FewerThanNineRecordsGive4) {
-  for (int n : {0, 1, 8}) {
-    const std::vector<std::string> few(records_.begin(), records_.begin() + n);
-    EXPECT_EQ(read(WriteDoris("few" + std::to_string(n), vor_.header, few), time(0)), 4) << n;
-  }
-  const std::vector<std::string> nine(records_.begin(), records_.begin() + 9);
-  EXPECT_EQ(read(WriteDoris("nine", vor_.header, nine), time(4)), 0);
-}
-
-TEST_F(BadDoris, MalformedNumbersGive4) {
-  struct Damage {
-    size_t offset;
-    std::string text;
-  };
-  const Damage damages[] = {
-      {44, "+649x931.106"},   // x position
-      {75, " "},              // a blank inside z
-      {109, "++692.698996"},  // vz
-      {37, "+3l388"},         // orbit number
-      {0, "3X"},              // day of the date
-      {3, "XYZ"},             // month of the date
-      {83, "            "},   // empty vx
-  };
-  for (const Damage& d : damages) {
-    // In the scanned part and in the part only the window reaches.
-    for (int at : {10, 23}) {
-      std::vector<std::string> damaged = records_;
-      damaged[at].replace(d.offset, d.text.size(), d.text);
-      const std::string file = WriteDoris("damaged", vor_.header, damaged);
-      EXPECT_EQ(read(file, time(20)), 4) << d.text << " in record " << at;
-    }
-  }
-}
-
-TEST_F(BadDoris, RecordsOutOfTimeOrderGive4) {
-  std::vector<std::string> swapped = records_;
-  std::swap(swapped[15], swapped[16]);
-  EXPECT_EQ(read(WriteDoris("swapped", vor_.header, swapped), time(20)), 4);
-  // Out of order only inside the window after tc.
-  swapped = records_;
-  std::swap(swapped[22], swapped[23]);
-  EXPECT_EQ(read(WriteDoris("swapped_late", vor_.header, swapped), time(20)), 4);
-  // A record repeated.
-  std::vector<std::string> repeated = records_;
-  repeated[12] = repeated[11];
-  EXPECT_EQ(read(WriteDoris("repeated", vor_.header, repeated), time(20)), 4);
-  // A gap: the window is no longer equally spaced.
-  std::vector<std::string> gap = records_;
-  gap.erase(gap.begin() + 19);
-  EXPECT_EQ(read(WriteDoris("gap", vor_.header, gap), time(18)), 4);
+  EXPECT_EQ(Read(kXca, time(20)), 12);
+  EXPECT_EQ(Read(path("absent"), time(20)), 9);
 }
 
 // Every vector of a long grid reads the records around its own time, so
 // damage there is found, while a short grid around the same time does not
 // reach it.
 TEST_F(BadDoris, DamageWithinTheGridsReachGives4) {
-  struct Damage {
-    const char* what;
-    int record;
-    size_t offset;
-    std::string text;
-  };
-  const Damage damages[] = {
-      {"a date", 33, 0, "3X"},
-      {"a position", 27, 44, "+649x931.106"},
-      {"a velocity", 31, 109, "++692.698996"},
-  };
-  for (const Damage& d : damages) {
-    std::vector<std::string> damaged = records_;
-    damaged[d.record].replace(d.offset, d.text.size(), d.text);
-    const std::string file = WriteDoris("damaged", vor_.header, damaged);
-    // 41 vectors 30 s apart span records 10 to 30 around record 20.
-    double p[3 * 41], v[3 * 41];
-    EXPECT_EQ(interp_orb_l(file.c_str(), time(20), 41, 30.0, p, v, nullptr, 0, nullptr), 4)
-        << d.what;
-    EXPECT_EQ(read(file, time(20)), 0) << d.what;
-  }
-  // Records out of order after the requested time.
-  std::vector<std::string> swapped = records_;
-  std::swap(swapped[28], swapped[29]);
-  const std::string file = WriteDoris("swapped", vor_.header, swapped);
-  double p[3 * 41];
-  EXPECT_EQ(interp_orb_l(file.c_str(), time(20), 41, 30.0, p, nullptr, nullptr, 0, nullptr), 4);
-  EXPECT_EQ(read(file, time(20)), 0);
-}
-
-TEST_F(BadDoris, TruncatedFilesAndOverstatedCountsGive4) {
-  // The last record cut short, the count still claiming it.
-  std::vector<std::string> cut = records_;
-  cut.back().resize(100);
-  EXPECT_EQ(read(WriteDoris("cut", vor_.header, cut, 40), time(20)), 4);
-  EXPECT_EQ(read(WriteDoris("cut_early", vor_.header, cut, 40), time(2)), 4);
-  // A count larger than the file, small and huge.
-  for (long long count : {41LL, 1589LL, 2147483647LL, 9999999999LL}) {
-    EXPECT_EQ(read(WriteDoris("over", vor_.header, records_, count), time(20)), 4) << count;
-  }
-  // Records that end before the requested time, which the header's validity
-  // still covers.
-  EXPECT_EQ(read(WriteDoris("short", vor_.header, records_), time(100)), 4);
-  // Headers cut short: empty, inside the MPH, inside the SPH.
-  for (size_t size : {0, 1000, 1400}) {
-    Spit(path("short_header"), vor_.header.substr(0, size));
-    EXPECT_EQ(read(path("short_header"), time(20)), 4) << size;
-  }
-}
-
-TEST_F(BadDoris, MalformedHeaderValuesGive4) {
   const struct {
-    const char* key;
-    const char* value;
-  } cases[] = {{"NUM_DSR", "-0000000005"},
-               {"NUM_DSR", "+00000x0040"},
-               {"NUM_DSR", "           "},
-               {"DS_OFFSET", "+00000000000099999999"},  // beyond the file
-               {"SENSING_START", "\"xx-MAR-2008"},
-               {"SENSING_STOP", "\"                           "}};
+    const char* what;
+    std::function<void(Doris*)> damage;
+  } cases[] = {
+      {"a date", [](Doris* d) { Damage(d, 33, 0, "3X"); }},
+      {"a position", [](Doris* d) { Damage(d, 27, 44, "+649x931.106"); }},
+      {"a velocity", [](Doris* d) { Damage(d, 31, 109, "++692.698996"); }},
+      {"records out of order", [](Doris* d) { std::swap(d->records[28], d->records[29]); }},
+  };
   for (const auto& c : cases) {
-    std::string header = vor_.header;
-    SetHeaderValue(&header, "NUM_DSR", CountText(static_cast<long long>(records_.size())));
-    SetHeaderValue(&header, c.key, c.value);
-    for (const std::string& r : records_) header += r;
-    Spit(path("bad_header"), header);
-    EXPECT_EQ(read(path("bad_header"), time(20)), 4) << c.key << c.value;
+    const std::string file = Write(c.damage);
+    // 41 vectors 30 s apart span records 10 to 30 around record 20.
+    EXPECT_EQ(Read(file, time(20), 41, 30.0), 4) << c.what;
+    EXPECT_EQ(Read(file, time(20)), 0) << c.what;
   }
 }
 
 TEST_F(BadDoris, InvalidRequestsGive1) {
-  const std::string file = WriteDoris("good", vor_.header, records_);
+  const std::string file = Write([](Doris*) {});
   double p[3];
   EXPECT_EQ(interp_orb_l(file.c_str(), time(20), -1, 5.0, p, nullptr, nullptr, 0, nullptr), 1);
   EXPECT_EQ(interp_orb_l(file.c_str(), time(20), 1, 5.0, nullptr, nullptr, nullptr, 0, nullptr), 1);

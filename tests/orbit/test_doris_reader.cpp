@@ -1,3 +1,5 @@
+// The DORIS reader on the real orbit files and on DORIS files written from a
+// closed-form orbit.
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -14,66 +16,20 @@ using namespace orbit_test;
 
 namespace {
 
-// Value and derivative at t of the Hermite polynomial through values f and
-// derivatives d at the nodes x (divided differences on doubled nodes).
-void Hermite(const std::vector<double>& x, const std::vector<double>& f,
-             const std::vector<double>& d, double t, double* value, double* deriv) {
-  const size_t m = 2 * x.size();
-  std::vector<double> z(m);
-  std::vector<std::vector<double>> q(m, std::vector<double>(m, 0.0));
-  for (size_t i = 0; i < m; ++i) {
-    z[i] = x[i / 2];
-    q[i][0] = f[i / 2];
-  }
-  for (size_t i = 1; i < m; ++i)
-    q[i][1] = i % 2 == 1 ? d[i / 2] : (q[i][0] - q[i - 1][0]) / (z[i] - z[i - 1]);
-  for (size_t j = 2; j < m; ++j)
-    for (size_t i = j; i < m; ++i) q[i][j] = (q[i][j - 1] - q[i - 1][j - 1]) / (z[i] - z[i - j]);
-  double p = q[m - 1][m - 1], dp = 0.0;
-  for (size_t j = m - 1; j-- > 0;) {
-    dp = dp * (t - z[j]) + p;
-    p = p * (t - z[j]) + q[j][j];
-  }
-  *value = p;
-  *deriv = dp;
+// The records of the real file, read once.
+const std::vector<Record>& RealRecords() {
+  static const std::vector<Record> all = [] {
+    std::vector<Record> r;
+    for (const std::string& text : SplitDoris(kVor).records) r.push_back(ParseRecord(text));
+    return r;
+  }();
+  return all;
 }
 
-class RealOrbit : public ::testing::Test {
- protected:
-  // The records of the real file, read once.
-  static const std::vector<Record>& records() {
-    static const std::vector<Record> all = [] {
-      std::vector<Record> r;
-      for (const std::string& text : SplitDoris(kVor).records) r.push_back(ParseRecord(text));
-      return r;
-    }();
-    return all;
-  }
-
-  // Independent reference: Hermite on positions and velocities of the two
-  // records on each side of t.
-  static void Reference(double t, double p[3], double v[3]) {
-    const std::vector<Record>& r = records();
-    size_t j = 0;
-    while (j + 1 < r.size() && r[j + 1].t <= t) ++j;
-    size_t first = j >= 1 ? j - 1 : 0;
-    if (first + 4 > r.size()) first = r.size() - 4;
-    const double base = r[first].t;
-    std::vector<double> x, f(4), d(4);
-    for (size_t i = 0; i < 4; ++i) x.push_back(r[first + i].t - base);
-    for (int a = 0; a < 3; ++a) {
-      for (size_t i = 0; i < 4; ++i) {
-        f[i] = r[first + i].p[a];
-        d[i] = r[first + i].v[a];
-      }
-      Hermite(x, f, d, t - base, &p[a], &v[a]);
-    }
-  }
-};
-
-TEST_F(RealOrbit, RecordTimesGiveTheRecordsUnchanged) {
-  for (size_t i : {size_t(0), size_t(3), size_t(700), records().size() - 3, records().size() - 1}) {
-    const Record& r = records()[i];
+TEST(RealOrbit, RecordTimesGiveTheRecordsUnchanged) {
+  const std::vector<Record>& records = RealRecords();
+  for (size_t i : {size_t(0), size_t(3), size_t(700), records.size() - 3, records.size() - 1}) {
+    const Record& r = records[i];
     double p[3], v[3];
     int orbit = 0;
     ASSERT_EQ(interp_orb_l(kVor.c_str(), r.t, 1, 60.0, p, v, &orbit, 0, nullptr), 0) << i;
@@ -90,196 +46,79 @@ TEST_F(RealOrbit, RecordTimesGiveTheRecordsUnchanged) {
   EXPECT_EQ(p[2], por.p[2]);
 }
 
-TEST_F(RealOrbit, BetweenRecordsAgreesWithHermiteInterpolation) {
-  const double start = records().front().t, stop = records().back().t;
-  double worstP = 0.0, worstV = 0.0;
-  // Near both ends the window is not centred on the request.
-  std::vector<double> times;
-  for (double s = 0.5; s < 600.0; s += 37.3) times.push_back(start + s);
-  for (double s = 0.5; s < 600.0; s += 37.3) times.push_back(stop - s);
-  for (double s = 0.0; s < 86400.0; s += 997.7) times.push_back(start + 3000.0 + s);
-  for (double t : times) {
-    double p[3], v[3], rp[3], rv[3];
-    ASSERT_EQ(interp_orb_l(kVor.c_str(), t, 1, 0.0, p, v, nullptr, 0, nullptr), 0);
-    Reference(t, rp, rv);
-    for (int a = 0; a < 3; ++a) {
-      worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
-      worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
-    }
-  }
-  EXPECT_LT(worstP, 0.01);
-  // The reference velocity is the derivative of positions given to the
-  // millimetre, good to a few 1e-4 m/s.
-  EXPECT_LT(worstV, 1e-3);
-}
-
-TEST_F(RealOrbit, OrbitNumberOfTheNearerRecord) {
+TEST(RealOrbit, OrbitNumberOfTheNearerRecord) {
+  const std::vector<Record>& records = RealRecords();
   size_t j = 1;
-  while (records()[j].orbit == records()[j - 1].orbit) ++j;
-  const Record& before = records()[j - 1];
-  const Record& after = records()[j];
-  ASSERT_EQ(after.orbit, before.orbit + 1);
+  while (records[j].orbit == records[j - 1].orbit) ++j;
+  const Record& before = records[j - 1];
+  ASSERT_EQ(records[j].orbit, before.orbit + 1);
   // Half way (30 s) counts as the later record.
   for (double s : {29.9, 30.0, 30.1}) {
     double p[3];
     int orbit = 0;
     ASSERT_EQ(interp_orb_l(kVor.c_str(), before.t + s, 1, 0.0, p, nullptr, &orbit, 0, nullptr), 0);
-    EXPECT_EQ(orbit, s < 30.0 ? before.orbit : after.orbit) << s;
+    EXPECT_EQ(orbit, s < 30.0 ? before.orbit : before.orbit + 1) << s;
   }
 }
 
-TEST_F(RealOrbit, AscendingNodeLiesWhereZChangesSign) {
-  const double tc = records()[1000].t + 10.0;
-  size_t crossing = 0;
-  for (size_t j = 1; j <= 1001; ++j)
-    if (records()[j - 1].p[2] <= 0.0 && records()[j].p[2] > 0.0) crossing = j;
-  ASSERT_GT(crossing, 0u);
-  double p[3], anx = -1.0;
-  ASSERT_EQ(interp_orb_l(kVor.c_str(), tc, 1, 0.0, p, nullptr, nullptr, 1, &anx), 0);
-  EXPECT_GT(anx, records()[crossing - 1].t);
-  EXPECT_LE(anx, records()[crossing].t);
-  double rp[3], rv[3];
-  Reference(anx, rp, rv);
-  EXPECT_LT(std::fabs(rp[2]), 0.5);
-  // Before the first crossing of the file there is no node: code 1, but the
-  // vectors are there.
-  const Record& early = records()[3];
-  anx = -1.0;
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), early.t, 1, 0.0, p, nullptr, nullptr, 1, &anx), 1);
-  EXPECT_EQ(anx, 0.0);
-  EXPECT_EQ(p[0], early.p[0]);
-}
-
-TEST_F(RealOrbit, TimesOutsideTheValidityGive13) {
-  const double start = ascii2sec85("01-MAR-2008 21:55:27.000000");
-  const double stop = ascii2sec85("03-MAR-2008 00:23:27.000000");
+TEST(RealOrbit, TimesOutsideTheValidityGive13) {
+  const double start = truth::Sec85(2008, 3, 1, 21, 55, 27),
+               stop = truth::Sec85(2008, 3, 3, 0, 23, 27);
   double p[3];
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), start, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 0);
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), stop, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 0);
-  EXPECT_EQ(p[0], records().back().p[0]);
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), start - 0.001, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 13);
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), stop + 0.001, 1, 0.0, p, nullptr, nullptr, 0, nullptr), 13);
-  EXPECT_EQ(interp_orb_l(kVor.c_str(), std::numeric_limits<double>::quiet_NaN(), 1, 0.0, p, nullptr,
-                         nullptr, 0, nullptr),
-            13);
-}
-
-TEST_F(RealOrbit, StateVectorObjectFromTheOrbitFile) {
-  // Early in the file, before its first ascending node: the vectors do not
-  // depend on the node.
-  const double t0 = records().front().t + 60.0;
-  SAROrbitStateVectors_Obj sv;
-  ASSERT_EQ(GetStateVectorsENVI(kVor.c_str(), t0, 5.0, 9, &sv), 0);
-  ASSERT_EQ(sv.n(), 9);
-  EXPECT_EQ(sv.t0(), t0);
-  EXPECT_TRUE(sv.isFitted());
-  for (int i = 0; i < 9; ++i) {
-    double rp[3], rv[3];
-    Reference(t0 + 5.0 * i, rp, rv);
-    for (int a = 0; a < 3; ++a) EXPECT_NEAR(sv.positions()[3 * i + a], rp[a], 0.01);
-  }
-  EXPECT_EQ(GetStateVectorsENVI(kVor.c_str(), records().front().t - 100.0, 5.0, 9, &sv), 13);
-}
-
-// The vectors of a scene's grid, 5 s apart, each come from the records
-// around their own time: a vector at a record's time is that record, the
-// others agree with the independent interpolation, over scenes of a minute
-// to half an hour and where the grid reaches the first or last record.
-TEST_F(RealOrbit, SceneGridsFollowTheRecordsOverTheirWholeLength) {
-  const double first = records().front().t, last = records().back().t;
-  const double middle = records()[700].t;
-  const struct {
-    const char* what;
-    double duration;
-    double t0;     // first vector of the grid, or
-    double tLast;  // last vector of the grid when t0 is 0
-  } scenes[] = {
-      {"one minute", 60.0, middle, 0.0},
-      {"ten minutes", 600.0, middle, 0.0},
-      {"half an hour", 1800.0, middle, 0.0},
-      {"half an hour from the first record", 1800.0, first, 0.0},
-      {"half an hour up to the last record", 1800.0, 0.0, last},
+  const auto read = [&p](double t) {
+    return interp_orb_l(kVor.c_str(), t, 1, 0.0, p, nullptr, nullptr, 0, nullptr);
   };
-  for (const auto& s : scenes) {
-    double unused = 0.0, dt = 0.0;
-    int n = 0;
-    ASSERT_EQ(StateVectorGridENVI(0.0, s.duration, &unused, &dt, &n), 0);
-    // The grid starts 0.2 duration before the scene.
-    const double t0 = s.t0 != 0.0 ? s.t0 : s.tLast - (n - 1) * dt;
-    GeneralSAROrbit o;
-    ASSERT_EQ(o.GetStateVectorsENVI(kVor.c_str(), t0 + 0.2 * s.duration, s.duration), 0) << s.what;
-    ASSERT_EQ(o.n(), n) << s.what;
-    ASSERT_EQ(o.t0(), t0) << s.what;
-    double worstP = 0.0, worstV = 0.0;
-    int onRecords = 0;
-    for (int i = 0; i < n; ++i) {
-      const double t = t0 + i * dt;
-      const double* p = o.positions() + 3 * i;
-      const double* v = o.velocities() + 3 * i;
-      const Record* on = nullptr;
-      for (const Record& r : records())
-        if (r.t == t) on = &r;
-      if (on != nullptr) {
-        ++onRecords;
-        for (int a = 0; a < 3; ++a) {
-          EXPECT_EQ(p[a], on->p[a]) << s.what << ", vector " << i;
-          EXPECT_EQ(v[a], on->v[a]) << s.what << ", vector " << i;
-        }
-        continue;
-      }
-      double rp[3], rv[3];
-      Reference(t, rp, rv);
-      for (int a = 0; a < 3; ++a) {
-        worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
-        worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
-      }
-    }
-    EXPECT_GE(onRecords, (n - 1) / 12) << s.what;
-    EXPECT_LT(worstP, 0.01) << s.what;
-    EXPECT_LT(worstV, 1e-3) << s.what;
-  }
+  EXPECT_EQ(read(start), 0);
+  EXPECT_EQ(read(stop), 0);
+  EXPECT_EQ(p[0], RealRecords().back().p[0]);
+  EXPECT_EQ(read(start - 0.001), 13);
+  EXPECT_EQ(read(stop + 0.001), 13);
+  EXPECT_EQ(read(std::numeric_limits<double>::quiet_NaN()), 13);
 }
 
-// DORIS files written from the closed-form orbit with records at chosen
-// times.
+// DORIS files written from the closed-form orbit: 120 records 60 s apart
+// from the sensing start of the real header, the ascending node after the
+// 25th.
 class ClosedFormDoris : public ScratchTest {
  protected:
+  static constexpr int kRecords = 120;
   void SetUp() override {
     ScratchTest::SetUp();
     real_ = SplitDoris(kVor);
     const size_t at = real_.header.find("SENSING_START=\"");
     ASSERT_NE(at, std::string::npos);
-    start_ = ascii2sec85(real_.header.substr(at + 15, 27).c_str());
-    orbit_.tNode = start_ - 1000.0;
+    start_ = truth::Sec85(real_.header.substr(at + 15, 27));
+    orbit_.tNode = start_ + 1510.0;
   }
 
-  // Record i of 40, 60 s apart from the sensing start, `late` seconds off
-  // its nominal time; its state vector is the orbit's at the time it
-  // states (positions to the millimetre, velocities to the micrometre per
-  // second, as the real records).
+  // Record i `late` seconds off its nominal time; its state vector is the
+  // orbit's at the time it states (positions to the millimetre, velocities
+  // to the micrometre per second, as the real records).
   std::string WriteRecords(const std::string& name, const std::vector<double>& late) {
-    std::vector<std::string> records;
-    for (int i = 0; i < 40; ++i) {
+    std::vector<std::string> texts;
+    records_.clear();
+    for (int i = 0; i < kRecords; ++i) {
       const double t = start_ + 60.0 * i + late[i];
       std::string r = real_.records[0];
-      char text[32];
-      EXPECT_EQ(sec852myascii(t, text), 0);
-      r.replace(0, 27, text);
+      r.replace(0, 27, DateText(t));
       double p[3], v[3];
       orbit_.at(t, p, v);
+      char text[32];
       for (int a = 0; a < 3; ++a) {
         std::snprintf(text, sizeof text, "%+012.3f", p[a]);
         r.replace(44 + 13 * a, 12, text);
         std::snprintf(text, sizeof text, "%+012.6f", v[a]);
         r.replace(83 + 13 * a, 12, text);
       }
-      EXPECT_EQ(ParseRecord(r).t, t);
-      records.push_back(r);
+      records_.push_back(ParseRecord(r));
+      EXPECT_EQ(records_.back().t, t);
+      texts.push_back(r);
     }
-    return WriteDoris(name, real_.header, records);
+    return WriteDoris(name, real_.header, texts);
   }
 
   DorisText real_;
+  std::vector<Record> records_;
   double start_ = 0.0;
   CircularOrbit orbit_;
 };
@@ -298,12 +137,12 @@ TEST_F(ClosedFormDoris, RecordsOffTheirNominalTimesAreWeightedWhereTheyLie) {
       {"two records two seconds off", {{18, 2.0}, {21, -2.0}}},
   };
   for (const auto& f : files) {
-    std::vector<double> late(40, 0.0);
+    std::vector<double> late(kRecords, 0.0);
     for (const auto& l : f.late) late[l.first] = l.second;
     const std::string file = WriteRecords("closed_form", late);
-    double worstP = 0.0, worstV = 0.0;
     std::vector<double> times = {start_ + 60.0 * 20 + late[20]};
     for (double t = start_ + 60.0 * 14; t <= start_ + 60.0 * 26; t += 6.1) times.push_back(t);
+    double worstP = 0.0, worstV = 0.0;
     for (double t : times) {
       double p[3], v[3], rp[3], rv[3];
       ASSERT_EQ(interp_orb_l(file.c_str(), t, 1, 0.0, p, v, nullptr, 0, nullptr), 0) << f.what;
@@ -317,6 +156,83 @@ TEST_F(ClosedFormDoris, RecordsOffTheirNominalTimesAreWeightedWhereTheyLie) {
     EXPECT_LT(worstP, 3e-3) << f.what;
     EXPECT_LT(worstV, 3e-6) << f.what;
   }
+}
+
+TEST_F(ClosedFormDoris, AscendingNodeOfTheOrbit) {
+  const std::string file = WriteRecords("node", std::vector<double>(kRecords, 0.0));
+  double p[3], anx = -1.0;
+  ASSERT_EQ(interp_orb_l(file.c_str(), start_ + 3000.0, 1, 0.0, p, nullptr, nullptr, 1, &anx), 0);
+  EXPECT_NEAR(anx, orbit_.tNode, 1e-3);
+  // Before the first node of the file there is none: code 1, but the
+  // vectors are there.
+  anx = -1.0;
+  EXPECT_EQ(interp_orb_l(file.c_str(), records_[3].t, 1, 0.0, p, nullptr, nullptr, 1, &anx), 1);
+  EXPECT_EQ(anx, 0.0);
+  EXPECT_EQ(p[0], records_[3].p[0]);
+}
+
+// The vectors of a scene's grid, 5 s apart, each come from the records
+// around their own time: a vector at a record's time is that record, the
+// others follow the orbit, over scenes of a minute to half an hour and
+// where the grid reaches the first or last record.
+TEST_F(ClosedFormDoris, SceneGridsFollowTheOrbitOverTheirWholeLength) {
+  const std::string file = WriteRecords("grid", std::vector<double>(kRecords, 0.0));
+  const double first = records_.front().t, last = records_.back().t, middle = records_[60].t;
+  const struct {
+    const char* what;
+    double duration;
+    double t0;     // first vector of the grid, or
+    double tLast;  // last vector of the grid when t0 is 0
+  } scenes[] = {
+      {"one minute", 60.0, middle, 0.0},
+      {"ten minutes", 600.0, middle, 0.0},
+      {"half an hour from the first record", 1800.0, first, 0.0},
+      {"half an hour up to the last record", 1800.0, 0.0, last},
+  };
+  for (const auto& s : scenes) {
+    double unused = 0.0, dt = 0.0;
+    int n = 0;
+    ASSERT_EQ(StateVectorGridENVI(0.0, s.duration, &unused, &dt, &n), 0);
+    // The grid starts 0.2 duration before the scene.
+    const double t0 = s.t0 != 0.0 ? s.t0 : s.tLast - (n - 1) * dt;
+    GeneralSAROrbit o;
+    ASSERT_EQ(o.GetStateVectorsENVI(file.c_str(), t0 + 0.2 * s.duration, s.duration), 0) << s.what;
+    ASSERT_EQ(o.n(), n) << s.what;
+    ASSERT_EQ(o.t0(), t0) << s.what;
+    double worstP = 0.0, worstV = 0.0;
+    int onRecords = 0;
+    for (int i = 0; i < n; ++i) {
+      const double t = t0 + i * dt;
+      const double* p = o.positions() + 3 * i;
+      const double* v = o.velocities() + 3 * i;
+      double rp[3], rv[3];
+      orbit_.at(t, rp, rv);
+      for (const Record& r : records_) {
+        if (r.t != t) continue;
+        ++onRecords;
+        for (int a = 0; a < 3; ++a) {
+          EXPECT_EQ(p[a], r.p[a]) << s.what << ", vector " << i;
+          EXPECT_EQ(v[a], r.v[a]) << s.what << ", vector " << i;
+        }
+      }
+      for (int a = 0; a < 3; ++a) {
+        worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
+        worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+      }
+    }
+    EXPECT_GE(onRecords, (n - 1) / 12) << s.what;
+    EXPECT_LT(worstP, 3e-3) << s.what;
+    EXPECT_LT(worstV, 3e-6) << s.what;
+  }
+  // The state-vector object of nine vectors, and none before the file.
+  SAROrbitStateVectors_Obj sv;
+  ASSERT_EQ(GetStateVectorsENVI(file.c_str(), first + 62.5, 5.0, 9, &sv), 0);
+  ASSERT_EQ(sv.n(), 9);
+  EXPECT_TRUE(sv.isFitted());
+  double rp[3], rv[3];
+  orbit_.at(first + 62.5 + 5.0 * 8, rp, rv);
+  EXPECT_NEAR(sv.positions()[3 * 8 + 2], rp[2], 3e-3);
+  EXPECT_EQ(GetStateVectorsENVI(kVor.c_str(), RealRecords().front().t - 100.0, 5.0, 9, &sv), 13);
 }
 
 // Scenes shorter than three spacings get the five vectors centred on them.
