@@ -364,7 +364,9 @@ TEST_F(Import, EveryFailureEndsWithItsCodeInTheRecords) {
     std::string extra, logText;
   } cases[] = {
       {"no product", {{kProduct, kNotOK}}, 456962, "ASA_XXX\n", "\nINPUT ASA : [ NotOK ]"},
-      {"a product that does not open", {{kProduct, dir + "missing.N1"}}, 9, "", "File not opened!"},
+      // "NotOK" is compared whole: a longer text is a file name, here one
+      // that does not exist.
+      {"a product that does not open", {{kProduct, "NotOKay"}}, 9, "", "File not opened!"},
       {"a calibration file as product",
        {{kProduct, xca}, {kXca, xca}, {kIns, xca}},
        456962,

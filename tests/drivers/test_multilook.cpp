@@ -665,6 +665,7 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
   unknownPolarisation[unknownPolarisation.find("MDS1_TX_RX_POLAR=\"") + 18] = 'X';
   const std::string orbitFolder = folder("failures");
   const Case cases[] = {
+      {"no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]", argument(kProduct, kNotOK)},
       {"a calibration file as product", 456962, "WSS\n", "INVALID INPUT", argument(kProduct, xca)},
       {"no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
        argument(kRoot, kNotOK)},
