@@ -201,11 +201,10 @@ TEST_F(CommandLineRuns, CommandsWithDefaultsOptionsAndWrongInputs) {
     }
   }
   // The list file of the import names the five rasters.
-  const std::string list = ReadFile(folder("import_every_option") + "R");
-  EXPECT_EQ(list, folder("import_every_option") + "R1_slc\n" + folder("import_every_option") +
-                      "R2_slc\n" + folder("import_every_option") + "R3_slc\n" +
-                      folder("import_every_option") + "R4_slc\n" + folder("import_every_option") +
-                      "R5_slc\n");
+  const std::string dir = folder("import_every_option");
+  std::string list;
+  for (int k = 1; k <= 5; ++k) list += dir + "R" + std::to_string(k) + "_slc\n";
+  EXPECT_EQ(ReadFile(dir + "R"), list);
 }
 
 // The summary's sizes and corners against the generator's truth.
