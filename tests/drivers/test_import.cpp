@@ -456,76 +456,65 @@ TEST_F(Import, AnOutputFolderThatCannotBeWrittenFailsWithoutAList) {
 TEST_F(Import, RunsSideBySideMatchRunsOneAfterAnother) {
   useAuxiliaryListOf(descending());
   constexpr int kRuns = 4;
-  struct Run {
-    std::vector<std::string> args;
-    bool commandLine;
-    std::string work;  // the host run's own working folder
-  };
-  std::vector<Run> runs;
+  std::vector<std::vector<std::string>> runs;
   for (int i = 0; i < kRuns; ++i) {
     const SynthRun& product = i % 2 == 0 ? descending() : ascending();
-    Run r{i % 2 == 0 ? descendingRun().args : ascendingRun().args, i >= 2,
-          folder("side_work_" + std::to_string(i))};
-    r.args[kRoot] = folder("side_" + std::to_string(i)) + "R";
-    if (r.commandLine) {
-      r.args[kXca] = product.dir + Truth(product, "Scene", "XcaFile");
-      r.args[kIns] = product.dir + Truth(product, "Scene", "InsFile");
-    }
-    runs.push_back(r);
+    runs.push_back(i % 2 == 0 ? descendingRun().args : ascendingRun().args);
+    runs[i][kRoot] = folder("side_" + std::to_string(i)) + "R";
+    runs[i][kXca] = product.dir + Truth(product, "Scene", "XcaFile");
+    runs[i][kIns] = product.dir + Truth(product, "Scene", "InsFile");
   }
-  // The outcome holds the run's whole process log.
-  auto start = [](const Run& r) {
+  // The outcome holds the run's whole process log; runs 2 and 3 use the
+  // command line.
+  auto start = [](const std::vector<std::string>& a, int i) {
     Outcome o;
-    if (r.commandLine) {
-      o.status = vlr_test::RunProgram(
-                     {vlr_test::ToolPath(), "import", r.args[kProduct], "-o", r.args[kRoot],
-                      "--orbit", r.args[kDoris], "--xca", r.args[kXca], "--ins", r.args[kIns]},
-                     {{"VELORAN_INIT_DIR", ""}}, true)
+    const std::string work = folder("side_work_" + std::to_string(i));
+    if (i >= 2) {
+      o.status = vlr_test::RunProgram({vlr_test::ToolPath(), "import", a[kProduct], "-o", a[kRoot],
+                                       "--orbit", a[kDoris], "--xca", a[kXca], "--ins", a[kIns]},
+                                      {{"VELORAN_INIT_DIR", ""}}, true)
                      .status;
-      o.log = ReadFile(r.args[kRoot] + ".log");
+      o.log = ReadFile(a[kRoot] + ".log");
       return o;
     }
-    const std::string working = r.work + "Process.working";
+    const std::string working = work + "Process.working";
     WriteFile(working, "0\nStarting\n");
     WriteFile(working + "_batch_ok", "");
-    std::remove((r.work + "Process.log").c_str());
-    std::string content = "ARGUMENTS\n";
-    for (const std::string& a : r.args) content += a + "\n";
-    WriteFile(r.work + "args.txt", content);
+    std::remove((work + "Process.log").c_str());
     o.status = inst()
-                   .run(std::string(kImport) + r.work + "args.txt",
-                        {{"VELORAN_WORKING_DIR", r.work}, {"VELORAN_WORKING_FILE", working}})
+                   .run(std::string(kImport) + inst().writeArguments(a, "side" + std::to_string(i)),
+                        {{"VELORAN_WORKING_DIR", work}, {"VELORAN_WORKING_FILE", working}})
                    .status;
-    o.log = ReadFile(r.work + "Process.log");
+    o.log = ReadFile(work + "Process.log");
     o.error = ReadFile(working + "_error");
     o.workingFileLeft = Exists(working);
     return o;
   };
   // The outputs, without the command line's log, which holds local times.
-  auto outputs = [](const Run& r) {
-    auto files = vlr_test::FolderFiles(std::filesystem::path(r.args[kRoot]).parent_path());
+  auto outputs = [](const std::vector<std::string>& a) {
+    const std::string dir = std::filesystem::path(a[kRoot]).parent_path().string();
+    auto files = vlr_test::FolderFiles(dir);
     files.erase("R.log");
-    return files;
-  };
-
-  std::vector<std::map<std::string, std::string>> oneAfterAnother;
-  for (const Run& r : runs) {
-    ExpectSuccess(start(r), r.args);
-    oneAfterAnother.push_back(outputs(r));
-    const auto dir = std::filesystem::path(r.args[kRoot]).parent_path();
     std::filesystem::remove_all(dir);
     std::filesystem::create_directories(dir);
+    return files;
+  };
+  std::vector<std::map<std::string, std::string>> oneAfterAnother;
+  for (int i = 0; i < kRuns; ++i) {
+    ExpectSuccess(start(runs[i], i), runs[i]);
+    oneAfterAnother.push_back(outputs(runs[i]));
   }
   std::vector<std::future<Outcome>> started;
-  for (const Run& r : runs) started.push_back(std::async(std::launch::async, start, r));
+  for (int i = 0; i < kRuns; ++i)
+    started.push_back(std::async(std::launch::async, start, runs[i], i));
   for (int i = 0; i < kRuns; ++i) {
     SCOPED_TRACE("run " + std::to_string(i));
     const Outcome o = started[i].get();
-    ExpectSuccess(o, runs[i].args);
+    ExpectSuccess(o, runs[i]);
     EXPECT_EQ(o.log.find("\nSTART : "), o.log.rfind("\nSTART : ")) << o.log;
     for (int j = 0; j < kRuns; ++j) {
       if (j != i) {
-        EXPECT_EQ(o.log.find(runs[j].args[kRoot]), std::string::npos) << o.log;
+        EXPECT_EQ(o.log.find(runs[j][kRoot]), std::string::npos) << o.log;
       }
     }
     EXPECT_TRUE(outputs(runs[i]) == oneAfterAnother[i]) << "differs from the run one after another";
