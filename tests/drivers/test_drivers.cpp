@@ -96,41 +96,26 @@ TEST_F(AuxList, EntriesThatCannotBeUsedFailTheSearch) {
   }
 }
 
-TEST_F(AuxList, AProductWithoutASensingStartDateFails) {
+// A list or product that cannot be opened, a list beyond the size limit and
+// a product without a readable sensing start date fail without a result.
+TEST_F(AuxList, UnreadableListsAndProductsFail) {
   const std::string list = section(0, "01-JAN-1980", "01-JAN-2020", "FileName = ASA_XCA_good\n");
+  std::string result = "unset";
+  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 9);
+  WriteFile(dir_ + "ASA_AUX_list.dat", list);
+  EXPECT_EQ(find_aux((dir_ + "missing").c_str(), dir_.c_str(), "ASA_XCA", result), 9);
+  std::filesystem::resize_file(dir_ + "ASA_AUX_list.dat", kProfileMaxFileSize + 1);
+  FreeProfile();
+  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 4);
   for (const char* start : {"                           ", "xx-MAR-2008 10:00:00.000000",
                             "02-MAR-2008 99:00:00.000000"}) {
     SCOPED_TRACE(start);
     product_ = product(start);
-    std::string result = "unset";
     EXPECT_EQ(find(list, &result), 4);
-    EXPECT_EQ(result, "unset");
   }
-}
-
-TEST_F(AuxList, AMissingListOrProductIsNotOpened) {
-  std::string result = "unset";
-  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 9);
-  FreeProfile();
-  WriteFile(dir_ + "ASA_AUX_list.dat",
-            section(0, "01-JAN-2008", "01-JAN-2009", "FileName = ASA_XCA_good\n"));
-  EXPECT_EQ(find_aux((dir_ + "missing").c_str(), dir_.c_str(), "ASA_XCA", result), 9);
   // A product too short to hold its sensing start.
-  FreeProfile();
   WriteFile(product_, std::string(360, 'x'));
-  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 4);
-  EXPECT_EQ(result, "unset");
-}
-
-TEST_F(AuxList, AListBeyondTheSizeLimitIsNotRead) {
-  const std::string list =
-      section(0, "01-JAN-2008", "01-JAN-2009", "FileName = ASA_XCA_good\n") + "\n";
-  FreeProfile();
-  FreeProfile();
-  WriteFile(dir_ + "ASA_AUX_list.dat", list);
-  std::filesystem::resize_file(dir_ + "ASA_AUX_list.dat", kProfileMaxFileSize + 1);
-  std::string result = "unset";
-  EXPECT_EQ(find_aux(product_.c_str(), dir_.c_str(), "ASA_XCA", result), 4);
+  EXPECT_EQ(find(list, &result), 4);
   EXPECT_EQ(result, "unset");
 }
 

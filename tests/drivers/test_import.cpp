@@ -383,6 +383,7 @@ TEST_F(Import, EveryFailureEndsWithItsCodeInTheRecords) {
        4,
        "",
        "file : images_v2"},
+      {"an output folder that is a file", {{kRoot, xca + "/R"}}, 9, "", "File not opened!"},
       {"the conversion: a polarisation it does not know",
        {{kProduct, dir + "polarisation.N1"}},
        1,
@@ -426,27 +427,6 @@ TEST_F(Import, ASecondImportOverTheSameRootReplacesEverything) {
   failing[kProduct] = folder("twice_bad") + "bad.N1";
   WriteWithUnknownPolarisation(second.product, failing[kProduct]);
   ExpectFailure(runTool(failing), 1, "", "Wrong Polarization Type", root, false);
-}
-
-TEST_F(Import, AnOutputFolderThatCannotBeWrittenFailsWithoutAList) {
-  useAuxiliaryListOf(descending());
-  // A folder without write permission, or, where permissions do not bind
-  // (root), a "folder" that is a regular file.
-  const std::string locked = folder("locked");
-  ASSERT_EQ(chmod(locked.c_str(), 0555), 0);
-  std::string root = locked + "R";
-  if (access(locked.c_str(), W_OK) == 0) {
-    WriteFile(folder("plain") + "file", "not a folder");
-    root = folder("plain") + "file/R";
-  }
-  const Outcome o = runTool(arguments(descending(), orbitOf(descending()), root));
-  chmod(locked.c_str(), 0755);
-  EXPECT_NE(o.status, 0);
-  EXPECT_NE(o.error.find("[EC : "), std::string::npos) << o.error;
-  EXPECT_EQ(o.log.find("SUCCESSFUL"), std::string::npos) << o.log;
-  EXPECT_NE(o.log.find("[ERROR ID : "), std::string::npos) << o.log;
-  EXPECT_FALSE(Exists(root));
-  EXPECT_TRUE(std::filesystem::is_empty(locked));
 }
 
 // Two host runs, each with its own working folder and working file, and two
