@@ -60,22 +60,34 @@ class TracedHostPaths : public HostPaths {
   TracedHostPaths() : HostPaths(/*trace=*/true) {}
 };
 
-TEST_F(HostPaths, WarningsAreRecordedAndProcessingGoesOn) {
-  init();
+TEST_F(TracedHostPaths, WarningsAreRecordedAndProcessingGoesOn) {
   inst_.hostFiles(12, "Extracting");
-  NVLR_UTILITY_WriteStart({}, "Import ESA Products", "");
-  NVLR_UTILITY_RaiseWarning(vlr::kCodeRasterNotComplete, "vlr_raster", 77, "/data/R1_slc");
-  // A text the warning catalog does not hold.
-  NVLR_UTILITY_RaiseWarning(2 * vlr::kGroupSize + 5, "vlr_raster", 78, nullptr);
-  EXPECT_NE(log().find("\n\nWARNING : [ERROR ID : 130561] PROCESSING WARNING [A raster file was "
-                       "closed before all its lines were written; the missing lines hold no "
-                       "data]\n  /data/R1_slc \n\n"),
+  EXPECT_EXIT(
+      {
+        init();
+        NVLR_UTILITY_WriteStart({}, "Import ESA Products", "");
+        errno = 0;
+        NVLR_UTILITY_RaiseWarning(vlr::kCodeRasterNotComplete, "vlr_raster", 77, "/data/R1_slc");
+        // A text the warning catalog does not hold.
+        NVLR_UTILITY_RaiseWarning(2 * vlr::kGroupSize + 5, "vlr_raster", 78, nullptr);
+        std::_Exit(0);
+      },
+      ::testing::ExitedWithCode(0), "");
+  const std::string text =
+      "A raster file was closed before all its lines were written; the missing lines hold no data";
+  EXPECT_NE(log().find("\n\nWARNING : [ERROR ID : 130561] PROCESSING WARNING [" + text +
+                       "]\n  /data/R1_slc \n\n"),
             std::string::npos)
       << log();
   EXPECT_NE(log().find("\n\nWARNING : [ERROR ID : 130565] PROCESSING WARNING [GENERIC ERROR WRONG "
                        "CODE]\n   \n\n"),
             std::string::npos)
       << log();
+  EXPECT_NE(trace().find("\nWARNING : PROCESSING WARNING [" + text +
+                         "] (/data/R1_slc) \n  Import ESA Products   " + kId +
+                         "\n    FILE=vlr_raster   LINE=77  (errno = 0)"),
+            std::string::npos)
+      << trace();
   // A warning is no error: the host's files keep their state.
   EXPECT_EQ(log().find("[ERROR ID : 130561]\n"), std::string::npos);
   EXPECT_EQ(working(), "12\nExtracting\n");
