@@ -130,20 +130,6 @@ void ExpectSuccess(const Outcome& o, const std::vector<std::string>& args) {
                                      " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] + " ]");
 }
 
-// A failed run: its code as exit status (255 for codes beyond a byte), the
-// error file naming the code and `extra`, the ERROR record, no SUCCESSFUL,
-// and no list file at the output root.  Over a `fresh` root (no earlier
-// run's outputs) nothing named after the root is left at all.
-void ExpectFailure(const Outcome& o, int code, const std::string& extra, const std::string& logText,
-                   const std::string& root, bool fresh = true) {
-  vlr_test::ExpectFailureRecords(o, code, extra, "Import ESA Products", logText);
-  EXPECT_FALSE(Exists(root)) << root;
-  if (!fresh) return;
-  const std::filesystem::path r(root);
-  for (const std::string& name : vlr_test::FolderNames(r.parent_path().string()))
-    EXPECT_NE(name.rfind(r.filename().string(), 0), 0u) << name << " left beside " << root;
-}
-
 // The two-way elevation pattern of sub-swath section `s` in its suite
 // header: gains 10^(dB/20) at 0.05-degree steps about the reference angle,
 // against the parabola in dB that the generator wrote into the product's
@@ -344,60 +330,6 @@ TEST_F(Import, GdalReadsTheProductSamplesThroughTheVirtualRasters) {
   ExpectGdalReadsTheProductSamples(ascending(), ascendingRun().args[kRoot], folder("gdal"));
 }
 
-// One run per way the import ends early: the code, the error file, the
-// record in Process.log, and nothing named after the output root.
-TEST_F(Import, EveryFailureEndsWithItsCodeInTheRecords) {
-  const SynthRun& run = descending();
-  useAuxiliaryListOf(run);
-  const std::string dir = folder("failures");
-  const std::string xca = run.dir + Truth(run, "Scene", "XcaFile");
-  const std::string missing = dir + "DOR_VOR_AXVF-P_missing";
-  std::filesystem::create_directories(dir + "orbit_folder");
-  const std::string truncated = dir + "truncated.N1";
-  WriteFile(truncated,
-            ReadFile(run.product).substr(0, std::stoul(Truth(run, SubSwath(3), "MdsOffset"))));
-  WriteWithUnknownPolarisation(run.product, dir + "polarisation.N1");
-  const struct {
-    const char* what;
-    std::vector<std::pair<size_t, std::string>> edits;
-    int code;
-    std::string extra, logText;
-  } cases[] = {
-      {"no product", {{kProduct, kNotOK}}, 456962, "ASA_XXX\n", "\nINPUT ASA : [ NotOK ]"},
-      // "NotOK" is compared whole: a longer text is a file name, here one
-      // that does not exist.
-      {"a product that does not open", {{kProduct, "NotOKay"}}, 9, "", "File not opened!"},
-      {"a calibration file as product",
-       {{kProduct, xca}, {kXca, xca}, {kIns, xca}},
-       456962,
-       "WSS\n",
-       "Input file is not a ASA_WSS dataset"},
-      {"a missing orbit file", {{kDoris, missing}}, 9, "", "Orbit file " + missing + ": "},
-      {"an orbit file that is a folder",
-       {{kDoris, dir + "orbit_folder"}},
-       4,
-       "",
-       "Orbit file " + dir + "orbit_folder: "},
-      {"the extraction: a product cut inside its third sub-swath",
-       {{kProduct, truncated}},
-       4,
-       "",
-       "file : images_v2"},
-      {"an output folder that is a file", {{kRoot, xca + "/R"}}, 9, "", "File not opened!"},
-      {"the conversion: a polarisation it does not know",
-       {{kProduct, dir + "polarisation.N1"}},
-       1,
-       "",
-       "Wrong Polarization Type"},
-  };
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.what);
-    std::vector<std::string> a = arguments(run, orbitOf(run), dir + "R");
-    for (const auto& [at, value] : c.edits) a[at] = value;
-    ExpectFailure(runTool(a), c.code, c.extra, c.logText, a[kRoot]);
-  }
-}
-
 TEST_F(Import, ASecondImportOverTheSameRootReplacesEverything) {
   const SynthRun& first = descending();
   const SynthRun& second = scene("--size small --seed 4");
@@ -426,7 +358,9 @@ TEST_F(Import, ASecondImportOverTheSameRootReplacesEverything) {
   std::vector<std::string> failing = args;
   failing[kProduct] = folder("twice_bad") + "bad.N1";
   WriteWithUnknownPolarisation(second.product, failing[kProduct]);
-  ExpectFailure(runTool(failing), 1, "", "Wrong Polarization Type", root, false);
+  vlr_test::ExpectFailureRecords(runTool(failing), 1, "", "Import ESA Products",
+                                 "Wrong Polarization Type");
+  EXPECT_FALSE(Exists(root));
 }
 
 // Two host runs, each with its own working folder and working file, and two

@@ -37,6 +37,10 @@ using Fields = vlr_test::SmlFields;
 namespace {
 
 constexpr const char* kMultilook = "main_multilook_WSS#";
+constexpr const char* kImport = "main_import_ESA#";
+// The import's positions of the orbit, calibration file, output root and
+// instrument file.
+constexpr size_t kImportDoris = 1, kImportXca = 2, kImportRoot = 3, kImportIns = 4;
 constexpr const char* kNotOK = "NotOK";
 constexpr const char* kOK = "OK";
 constexpr size_t kProduct = 0, kRoot = 1, kDoris = 2, kGroundRange = 6, kTiff = 12,
@@ -146,6 +150,14 @@ class MultilookCommand : public vlr_test::HostRunTest {
     a[kProduct] = run.product;
     a[kRoot] = root;
     a[kDoris] = orbitOf(run);
+    return a;
+  }
+  // The same for the import: product, orbit and output root.
+  static std::vector<std::string> importArguments(const SynthRun& run, const std::string& root) {
+    std::vector<std::string> a(14, kNotOK);
+    a[kProduct] = run.product;
+    a[kImportDoris] = orbitOf(run);
+    a[kImportRoot] = root;
     return a;
   }
   static Outcome runTool(const std::vector<std::string>& args) {
@@ -527,7 +539,7 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
     int percent = 50;
     bool byTiffCheck = false;  // stopped by the check before the export
   } cases[] = {
-      {"the import's extraction", "main_import_ESA#", "Extracting data..."},
+      {"the import's extraction", kImport, "Extracting data..."},
       {"the multilook processing", kMultilook, "MULTILOOK PROCESSING"},
       {"the recomposition", kMultilook, "MULTILOOK SWATHS RECOMPOSITION"},
       {"the TIFF export", kMultilook, "Tiff generation ..."},
@@ -539,14 +551,9 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
     SCOPED_TRACE(c.what);
     const std::string dir = folder("withdrawn" + std::to_string(++n));
     const bool import = std::string(c.word) != kMultilook;
-    std::vector<std::string> args = arguments(vor(), dir + "R");
-    args[kGroundRange] = args[kTiff] = kOK;
-    if (import) {
-      // The import's positions: orbit 1, output root 3.
-      args[1] = args[kDoris];
-      args[2] = kNotOK;
-      args[3] = dir + "R";
-    }
+    std::vector<std::string> args =
+        import ? importArguments(vor(), dir + "R") : arguments(vor(), dir + "R");
+    if (!import) args[kGroundRange] = args[kTiff] = kOK;
     useAuxiliaryListOf(vor());
     const Outcome o = vlr_test::RunAsHost(
         inst(), c.word, args, false,
@@ -598,8 +605,9 @@ TEST_F(MultilookCommand, EveryOutputOpensInGdalByItsOwnName) {
   EXPECT_EQ(inversions, 0u);
 }
 
-// One run per way the command ends early: the code, the error file, the
-// record in Process.log, and nothing the run began left in its folder.
+// One run per way either command ends early: the code, the error file, the
+// record in Process.log, no output root, and nothing the run began left in
+// its folder.
 TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
   const SynthRun& run = vor();
   const std::string xca = run.dir + Truth(run, "Scene", "XcaFile");
@@ -608,6 +616,7 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
   const std::string missingOrbit = folder("failures") + "DOR_VOR_AXVF-P_missing";
   using Prepare = std::function<void(const std::string& dir, std::vector<std::string>& args)>;
   struct Case {
+    const char* word;  // the command
     const char* what;
     int code;
     std::string extra;    // text after "[EC : code]\n" in the error file
@@ -638,46 +647,79 @@ TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
               "FileName = " +
                   Truth(run, "Scene", "XcaFile") + "\n");
   };
+  const Prepare truncated =
+      productOf(product.substr(0, std::stoul(Truth(run, SubSwath(3), "MdsOffset"))));
   std::string unknownPolarisation = product;
   unknownPolarisation[unknownPolarisation.find("MDS1_TX_RX_POLAR=\"") + 18] = 'X';
   const std::string orbitFolder = folder("failures");
+  const Prepare calibrationAsProduct = [&](const std::string&, std::vector<std::string>& a) {
+    a[kProduct] = a[kImportXca] = a[kImportIns] = xca;
+  };
   const Case cases[] = {
-      {"no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]", argument(kProduct, kNotOK)},
-      {"a calibration file as product", 456962, "WSS\n", "INVALID INPUT", argument(kProduct, xca)},
-      {"no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
+      {kImport, "no product", 456962, "ASA_XXX\n", "\nINPUT ASA : [ NotOK ]",
+       argument(kProduct, kNotOK)},
+      // "NotOK" is compared whole: a longer text is a file name, here one
+      // that does not exist.
+      {kImport, "a product that does not open", 9, "", "File not opened!",
+       argument(kProduct, "NotOKay")},
+      {kImport, "a calibration file as product", 456962, "WSS\n",
+       "Input file is not a ASA_WSS dataset", calibrationAsProduct},
+      {kImport, "a missing orbit file", 9, "", "Orbit file " + missingOrbit + ": ",
+       argument(kImportDoris, missingOrbit)},
+      {kImport, "an orbit file that is a folder", 4, "", "Orbit file " + orbitFolder,
+       argument(kImportDoris, orbitFolder)},
+      {kImport, "a product cut inside its third sub-swath", 4, "", "file : images_v2", truncated},
+      {kImport, "an output folder that is a file", 9, "", "File not opened!",
+       argument(kImportRoot, xca + "/R")},
+      {kImport, "a polarisation the conversion does not know", 1, "", "Wrong Polarization Type",
+       productOf(unknownPolarisation)},
+      {kMultilook, "no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]",
+       argument(kProduct, kNotOK)},
+      {kMultilook, "a calibration file as product", 456962, "WSS\n", "INVALID INPUT",
+       argument(kProduct, xca)},
+      {kMultilook, "no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
        argument(kRoot, kNotOK)},
-      {"no orbit", 456962, "DOR_VOR\n", "INPUT DORIS : [ NotOK ]", argument(kDoris, kNotOK)},
-      {"a calibration file as orbit", 456962, "DOR_VOR\n", "INVALID INPUT", argument(kDoris, xca)},
-      {"a missing orbit file", 456962, "DOR_VOR\n", "Orbit file " + missingOrbit + ": ",
+      {kMultilook, "no orbit", 456962, "DOR_VOR\n", "INPUT DORIS : [ NotOK ]",
+       argument(kDoris, kNotOK)},
+      {kMultilook, "a calibration file as orbit", 456962, "DOR_VOR\n", "INVALID INPUT",
+       argument(kDoris, xca)},
+      {kMultilook, "a missing orbit file", 456962, "DOR_VOR\n", "Orbit file " + missingOrbit + ": ",
        argument(kDoris, missingOrbit)},
-      {"an orbit file that is a folder", 456962, "DOR_VOR\n", "Orbit file " + orbitFolder,
-       argument(kDoris, orbitFolder)},
-      {"no auxiliary file valid at the sensing start", 130560, "findaux()\n", "file : find_aux",
-       noValidAuxiliary},
-      {"a product cut inside its third sub-swath", 130560, "images run()\n", "file : images_v2",
-       productOf(product.substr(0, std::stoul(Truth(run, SubSwath(3), "MdsOffset"))))},
-      {"a polarisation the conversion does not know", 130560, "tessal2kestova()\n",
+      {kMultilook, "an orbit file that is a folder", 456962, "DOR_VOR\n",
+       "Orbit file " + orbitFolder, argument(kDoris, orbitFolder)},
+      {kMultilook, "no auxiliary file valid at the sensing start", 130560, "findaux()\n",
+       "file : find_aux", noValidAuxiliary},
+      {kMultilook, "a product cut inside its third sub-swath", 130560, "images run()\n",
+       "file : images_v2", truncated},
+      {kMultilook, "a polarisation the conversion does not know", 130560, "tessal2kestova()\n",
        "Wrong Polarization Type", productOf(unknownPolarisation)},
-      {"a list file that cannot be created", 9, "", "File not opened!", inTheWay("R.list_tmp")},
-      {"a parameter file without W1", 130560, "mlook conf readpar()\n", "PROCESSING STEP FAILED",
-       parameter("W1", "")},
-      {"a ground resolution out of range", 130560, "mlook conf checkpar()\n",
+      {kMultilook, "a list file that cannot be created", 9, "", "File not opened!",
+       inTheWay("R.list_tmp")},
+      {kMultilook, "a parameter file without W1", 130560, "mlook conf readpar()\n",
+       "PROCESSING STEP FAILED", parameter("W1", "")},
+      {kMultilook, "a ground resolution out of range", 130560, "mlook conf checkpar()\n",
        "PROCESSING STEP FAILED", parameter("GrResolution", "5000")},
-      {"more than 15 range looks", 130560, "mlook run()\n",
+      {kMultilook, "more than 15 range looks", 130560, "mlook run()\n",
        "Number of estimated range looks must be lower than 15", parameter("GrResolution", "1000")},
-      {"a processor header that cannot be written", 130560, "mlook writepar()\n",
+      {kMultilook, "a processor header that cannot be written", 130560, "mlook writepar()\n",
        "PROCESSING STEP FAILED", inTheWay("R_pwr.hdr")},
-      {"a suite header that cannot be written", 261124, "", "R_pwr.sml", inTheWay("R_pwr.sml")},
+      {kMultilook, "a suite header that cannot be written", 261124, "", "R_pwr.sml",
+       inTheWay("R_pwr.sml")},
   };
   int n = 0;
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);
+    const bool import = std::string(c.word) != kMultilook;
     const std::string dir = folder("failure" + std::to_string(++n));
-    std::vector<std::string> args = arguments(run, dir + "R");
+    std::vector<std::string> args =
+        import ? importArguments(run, dir + "R") : arguments(run, dir + "R");
     useAuxiliaryListOf(run);
     c.prepare(dir, args);
     const std::set<std::string> prepared = vlr_test::FolderNames(dir);
-    ExpectFailure(runTool(args), c.code, c.extra, c.logText);
+    const Outcome o = vlr_test::RunAsHost(inst(), c.word, args);
+    vlr_test::ExpectFailureRecords(
+        o, c.code, c.extra, import ? "Import ESA Products" : "Multilooking ASA WSS", c.logText);
+    EXPECT_FALSE(Exists(args[import ? kImportRoot : kRoot]));
     // Nothing the run began is left: no list file, sub-swath, temporary or
     // partial output.
     EXPECT_EQ(vlr_test::FolderNames(dir), prepared);
