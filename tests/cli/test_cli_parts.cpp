@@ -1,5 +1,6 @@
 // The command line's own pieces: choosing auxiliary files by the dates in
-// their names, reading the options and reading the host's error file.
+// their names, reading the options, reading the host's error file and the
+// sizes of the summary.
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -9,21 +10,14 @@
 #include "cli/aux_choice.h"
 #include "cli/cli_options.h"
 #include "cli/host_child.h"
+#include "cli/run_summary.h"
+#include "truth_math.h"
 
 namespace {
 
 using vlr::cli::AuxFileName;
 
-// Seconds since 1985 of a UTC date, by counting days.
-double Sec85(int year, int month, int day, int hour = 0, int minute = 0, int second = 0) {
-  static const int kCumulative[] = {0, 31, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334};
-  long days = 0;
-  for (int y = 1985; y < year; ++y)
-    days += (y % 4 == 0 && (y % 100 != 0 || y % 400 == 0)) ? 366 : 365;
-  days += kCumulative[month - 1] + day - 1;
-  if (month > 2 && year % 4 == 0 && (year % 100 != 0 || year % 400 == 0)) ++days;
-  return days * 86400.0 + hour * 3600.0 + minute * 60.0 + second;
-}
+using truth::Sec85;
 
 TEST(AuxFileNames, DatesAreReadFromEsaNames) {
   AuxFileName a;
@@ -146,6 +140,13 @@ TEST(HostErrorFile, CodeTitleTextAndExtraLinesAreRead) {
   EXPECT_EQ(message, "BATCH RUN INTERRUPTED (/tmp/w/Process.working)");
   std::remove(name);
   EXPECT_EQ(vlr::cli::ReadErrorFile(name, message), 0);
+}
+
+TEST(RunSummary, SizesInTheirLargestWholeUnit) {
+  EXPECT_EQ(vlr::cli::HumanSize(0), "0 B");
+  EXPECT_EQ(vlr::cli::HumanSize(1023), "1023 B");
+  EXPECT_EQ(vlr::cli::HumanSize(1536), "1.5 KB");
+  EXPECT_EQ(vlr::cli::HumanSize(3ull << 30), "3.0 GB");
 }
 
 }  // namespace

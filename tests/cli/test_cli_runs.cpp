@@ -13,7 +13,7 @@
 #include <string>
 #include <vector>
 
-#include "installation.h"
+#include "host_run.h"
 #include "synth_run.h"
 
 namespace {
@@ -63,12 +63,6 @@ class CommandLineRuns : public ::testing::Test {
   static std::string truth(const std::string& section, const std::string& key) {
     return synth_->truth[section][key];
   }
-  static std::string file(const char* prefix) {
-    for (const auto& e : fs::directory_iterator(synth_->dir)) {
-      if (e.path().filename().string().rfind(prefix, 0) == 0) return e.path().string();
-    }
-    return "";
-  }
   // A fresh empty folder for one case.
   static std::string folder(const std::string& name) {
     const std::string dir = scratch_ + name + "/";
@@ -81,12 +75,6 @@ class CommandLineRuns : public ::testing::Test {
     std::vector<std::string> argv = {"/usr/bin/env", "-C", cwd, tool};
     argv.insert(argv.end(), args.begin(), args.end());
     return vlr_test::RunProgram(argv, kNoHost, true);
-  }
-  static std::vector<std::string> listing(const std::string& dir) {
-    std::vector<std::string> names;
-    for (const auto& e : fs::directory_iterator(dir)) names.push_back(e.path().filename().string());
-    std::sort(names.begin(), names.end());
-    return names;
   }
 
   static synth_test::SynthRun* synth_;
@@ -113,8 +101,8 @@ TEST_F(CommandLineRuns, CommandsWithDefaultsOptionsAndWrongInputs) {
   std::string stem = fs::path(product).filename().string();
   stem = stem.substr(0, stem.rfind('.'));
   const std::string orbit = synth_->dir + truth("Scene", "OrbitFile");
-  const std::string xca = file("ASA_XCA_");
-  const std::string ins = file("ASA_INS_");
+  const std::string xca = synth_->dir + truth("Scene", "XcaFile");
+  const std::string ins = synth_->dir + truth("Scene", "InsFile");
   const std::string aux = synth_->dir;
   // A folder whose only calibration file is valid years before the product.
   const std::string staleAux = folder("stale_aux");
@@ -193,7 +181,7 @@ TEST_F(CommandLineRuns, CommandsWithDefaultsOptionsAndWrongInputs) {
     }
     for (const std::string& w : c.written) EXPECT_TRUE(Exists(dir + w)) << w;
     // The run's private folder never stays; a refused run writes nothing.
-    for (const std::string& name : listing(dir)) {
+    for (const std::string& name : vlr_test::FolderNames(dir)) {
       EXPECT_EQ(name.find(".import_wss-run-"), std::string::npos) << name;
       if (c.written.empty()) {
         ADD_FAILURE() << "left behind: " << name;
@@ -201,11 +189,10 @@ TEST_F(CommandLineRuns, CommandsWithDefaultsOptionsAndWrongInputs) {
     }
   }
   // The list file of the import names the five rasters.
-  const std::string list = ReadFile(folder("import_every_option") + "R");
-  EXPECT_EQ(list, folder("import_every_option") + "R1_slc\n" + folder("import_every_option") +
-                      "R2_slc\n" + folder("import_every_option") + "R3_slc\n" +
-                      folder("import_every_option") + "R4_slc\n" + folder("import_every_option") +
-                      "R5_slc\n");
+  const std::string dir = folder("import_every_option");
+  std::string list;
+  for (int k = 1; k <= 5; ++k) list += dir + "R" + std::to_string(k) + "_slc\n";
+  EXPECT_EQ(ReadFile(dir + "R"), list);
 }
 
 // The summary's sizes and corners against the generator's truth.
@@ -308,7 +295,7 @@ TEST_F(CommandLineRuns, CtrlCStopsTheRunThroughTheWithdrawal) {
   // file, since the import never completed.
   EXPECT_NE(ReadFile(dir + "R.log").find("[ERROR ID : 326400]"), std::string::npos);
   EXPECT_FALSE(Exists(dir + "R"));
-  for (const std::string& name : listing(dir))
+  for (const std::string& name : vlr_test::FolderNames(dir))
     EXPECT_EQ(name.find(".import_wss-run-"), std::string::npos) << name;
 }
 

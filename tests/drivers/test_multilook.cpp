@@ -10,73 +10,64 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <functional>
 #include <map>
 #include <set>
-#include <sstream>
 #include <string>
 #include <vector>
 
 #include "host_run.h"
-#include "installation.h"
 #include "synth_geometry.h"
-#include "synth_run.h"
+#include "truth_math.h"
 
 using synth_test::SynthRun;
 using vlr_test::Exists;
+using vlr_test::Field;
+using vlr_test::Outcome;
 using vlr_test::ReadFile;
-using vlr_test::TempInstallation;
+using vlr_test::SubSwath;
+using vlr_test::Truth;
+using vlr_test::TruthNumber;
 using vlr_test::WriteFile;
+using Fields = vlr_test::SmlFields;
 
 namespace {
 
 constexpr const char* kMultilook = "main_multilook_WSS#";
+constexpr const char* kImport = "main_import_ESA#";
+// The import's positions of the orbit, calibration file, output root and
+// instrument file.
+constexpr size_t kImportDoris = 1, kImportXca = 2, kImportRoot = 3, kImportIns = 4;
 constexpr const char* kNotOK = "NotOK";
 constexpr const char* kOK = "OK";
-constexpr size_t kArguments = 14;
 constexpr size_t kProduct = 0, kRoot = 1, kDoris = 2, kGroundRange = 6, kTiff = 12,
                  kSaturation = 13;
 constexpr int kSubSwaths = 5;
 constexpr double kHalfSpeedOfLight = 149896229.0;
 // "GrSamplingStep" of the installation's parameter file, metres.
 constexpr double kGroundStep = 75.0;
-// "GrResolution" of the installation's parameter file and of the two slant
-// range runs, metres: on the generated scene they ask for 3, 5 and 9 range
-// looks.
-constexpr int kInstalledResolution = 120, kSlantResolution = 150, kCoarseResolution = 275;
+// "GrResolution" of the slant range run, metres; on the generated scene it
+// asks for 5 range looks, the installation's 120 m for 3.
+constexpr int kSlantResolution = 150;
 constexpr size_t kFloatBytes = 4;
-constexpr const char* kGdalInfo = "gdalinfo";
-
-// The fields of a ".sml" header that the tests read.
-constexpr const char* kSmlFields =
-    "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,PRODUCT,Projection,"
-    "SceneHeading,OrbitConfiguration,NRangeLooks,NAzimuthLooks";
-
-using Fields = vlr_test::SmlFields;
-using vlr_test::Field;
+// A descending scene on the real DOR_VOR orbit, and an ascending one on the
+// real preliminary orbit (DOR_POR).
+constexpr const char* kVor = "--size tiny --pass descending";
+const std::string kPor =
+    "--size tiny --pass ascending --polarisation VV --seed 3 --orbit " + vlr_test::kSamplePor;
 
 Fields ReadSml(const std::string& sml) {
-  return vlr_test::ReadSml(sml, kSmlFields);
+  return vlr_test::ReadSml(sml,
+                           "NrOfLinesPerImage,NrOfPixelsPerLine,PixelSpacingRg,CellType,DataUnits,"
+                           "PRODUCT,Projection,SceneHeading,OrbitConfiguration,NRangeLooks,"
+                           "NAzimuthLooks");
 }
 
 long Integer(const Fields& f, const std::string& name) {
   return std::atol(Field(f, name).c_str());
-}
-
-std::string Truth(const SynthRun& run, const std::string& section, const std::string& key) {
-  const auto s = run.truth.find(section);
-  if (s == run.truth.end() || s->second.count(key) == 0) return "<missing " + key + ">";
-  return s->second.at(key);
-}
-double TruthNumber(const SynthRun& run, const std::string& section, const std::string& key) {
-  return synth_test::truth_number(run.truth, section, key);
-}
-std::string SubSwath(int k) {
-  return "SubSwath" + std::to_string(k);
 }
 
 long FileSize(const std::string& path) {
@@ -84,17 +75,9 @@ long FileSize(const std::string& path) {
   return stat(path.c_str(), &st) == 0 ? static_cast<long>(st.st_size) : -1;
 }
 
-bool HaveGdal() {
-  return synth_test::shell("command -v gdalinfo > /dev/null 2>&1") == 0;
-}
-
-// Earth-fixed position of a point of the WGS84 ellipsoid surface.
-synth::Vec3 Ecef(double latDeg, double lonDeg) {
-  constexpr double e2 = 1.0 - (synth::kWgsB * synth::kWgsB) / (synth::kWgsA * synth::kWgsA);
-  const double phi = latDeg * M_PI / 180.0, lambda = lonDeg * M_PI / 180.0;
-  const double n = synth::kWgsA / std::sqrt(1.0 - e2 * std::sin(phi) * std::sin(phi));
-  return {n * std::cos(phi) * std::cos(lambda), n * std::cos(phi) * std::sin(lambda),
-          n * (1.0 - e2) * std::sin(phi)};
+// Distance in metres between a surface point in degrees and a generator point.
+double Off(double lat, double lon, const synth::Vec3& p) {
+  return truth::Distance(truth::EarthFixed(lat, lon), {p.x, p.y, p.z});
 }
 
 // The generator's geometry of a ground-range image: the zero-Doppler ground
@@ -135,7 +118,7 @@ struct GdalView {
 
 GdalView GdalInfo(const std::string& tif) {
   GdalView v;
-  const vlr_test::RunResult r = vlr_test::RunProgram({"/usr/bin/env", kGdalInfo, tif}, {}, true);
+  const vlr_test::RunResult r = vlr_test::RunProgram({"/usr/bin/env", "gdalinfo", tif}, {}, true);
   v.status = r.status;
   v.text = r.out + r.err;
   std::istringstream lines(r.out);
@@ -151,135 +134,69 @@ GdalView GdalInfo(const std::string& tif) {
   return v;
 }
 
-using vlr_test::Outcome;
-
-class MultilookCommand : public ::testing::Test {
- protected:
-  static void SetUpTestSuite() {
-    inst_ = new TempInstallation();
-    char pattern[] = "/tmp/vlr_multilook_XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    scratch_ = std::string(pattern) + "/";
-    // A descending scene on the real DOR_VOR orbit, and an ascending one on
-    // the real preliminary orbit (DOR_POR).
-    vor_ = new SynthRun(synth_test::run_synth("--size tiny --pass descending"));
-    por_ =
-        new SynthRun(synth_test::run_synth("--size tiny --pass ascending --polarisation VV "
-                                           "--seed 3 --orbit " +
-                                           vlr_test::kSamplePor));
-    ASSERT_EQ(vor_->exit_code, 0);
-    ASSERT_EQ(por_->exit_code, 0);
-    ASSERT_EQ(Truth(*vor_, "Scene", "OrbitFile").rfind("DOR_VOR_", 0), 0u);
-    ASSERT_EQ(Truth(*por_, "Scene", "OrbitFile").rfind("DOR_POR_", 0), 0u);
-
-    // Ground range asked for by the command while the parameter file says
-    // slant range, with the TIFF copy.
-    parameters({{"Sl2Gr", "0"}});
-    groundArgs_ = arguments(*vor_, folder("ground") + "R");
-    groundArgs_[kGroundRange] = kOK;
-    groundArgs_[kTiff] = kOK;
-    groundArgs_[kSaturation] = "2";
-    useAuxiliaryListOf(*vor_);
-    groundRun_ = runTool(groundArgs_);
-    // Slant range while the parameter file says ground range; "ok" is not
-    // "OK" for either switch.
-    parameters({{"Sl2Gr", "1"}, {"GrResolution", std::to_string(kSlantResolution)}});
-    slantArgs_ = arguments(*vor_, folder("slant") + "R");
-    slantArgs_[kGroundRange] = "ok";
-    slantArgs_[kTiff] = "ok";
-    slantRun_ = runTool(slantArgs_);
-    // Slant range again, with a resolution that asks for more looks.
-    parameters({{"GrResolution", std::to_string(kCoarseResolution)}});
-    coarseArgs_ = arguments(*vor_, folder("coarse") + "R");
-    coarseRun_ = runTool(coarseArgs_);
-    // The preliminary orbit, ground range and TIFF, installed parameters.
-    parameters({});
-    porArgs_ = arguments(*por_, folder("por") + "R");
-    porArgs_[kGroundRange] = kOK;
-    porArgs_[kTiff] = kOK;
-    useAuxiliaryListOf(*por_);
-    porRun_ = runTool(porArgs_);
-    ready_ = true;
-  }
-  static void TearDownTestSuite() {
-    for (SynthRun* r : {vor_, por_}) {
-      if (r != nullptr) synth_test::remove_run(*r);
-      delete r;
-    }
-    vor_ = por_ = nullptr;
-    std::error_code ec;
-    std::filesystem::remove_all(scratch_, ec);
-    delete inst_;
-    inst_ = nullptr;
-    ready_ = false;
-  }
-  void SetUp() override { ASSERT_TRUE(ready_) << "the generated products are missing"; }
-  void TearDown() override { parameters({}); }
-
-  // Exactly 14 arguments: product, output root and orbit, the rest "NotOK".
-  static std::vector<std::string> arguments(const SynthRun& run, const std::string& root) {
-    std::vector<std::string> a(kArguments, kNotOK);
-    a[kProduct] = run.product;
-    a[kRoot] = root;
-    a[kDoris] = run.dir + Truth(run, "Scene", "OrbitFile");
-    return a;
-  }
-  // A new empty folder under the scratch folder; ends with '/'.
-  static std::string folder(const std::string& name) {
-    const std::string path = scratch_ + name + "/";
-    std::filesystem::create_directories(path);
-    return path;
-  }
-  static std::string desFolder() { return inst_->root() + "/des/"; }
-
-  // The installation's multilook parameter file with the given keys set to
-  // new values; an empty value removes the key.
-  static void parameters(const std::map<std::string, std::string>& edits) {
-    std::istringstream in(
-        ReadFile(vlr_test::SourceDir() + "/data/install/parameters_multilook.hdr"));
-    std::string out;
-    for (std::string line; std::getline(in, line);) {
-      const std::string key = line.substr(0, line.find(' '));
-      const auto edit = edits.find(key);
-      if (edit == edits.end())
-        out += line + "\n";
-      else if (!edit->second.empty())
-        out += key + " = " + edit->second + "\n";
-    }
-    WriteFile(desFolder() + "parameters_multilook.hdr", out);
-  }
-
-  // Puts the generator's auxiliary list and files where the command looks.
-  static void useAuxiliaryListOf(const SynthRun& run) {
-    ASSERT_EQ(synth_test::shell("cp " + run.dir + "ASA_AUX_list.dat " + run.dir + "ASA_XCA_* " +
-                                run.dir + "ASA_INS_* " + desFolder()),
-              0);
-  }
-
-  // Runs the command as the host does and collects what it left.
-  // `withdrawn`: the host has already deleted "_batch_ok".
-  static Outcome runTool(const std::vector<std::string>& args, bool withdrawn = false) {
-    return vlr_test::RunAsHost(*inst_, kMultilook, args, withdrawn);
-  }
-
-  static bool ready_;
-  static TempInstallation* inst_;
-  static std::string scratch_;
-  static SynthRun* vor_;
-  static SynthRun* por_;
-  static std::vector<std::string> groundArgs_, slantArgs_, coarseArgs_, porArgs_;
-  static Outcome groundRun_, slantRun_, coarseRun_, porRun_;
+struct MultilookRun {
+  std::vector<std::string> args;
+  Outcome outcome;
 };
 
-bool MultilookCommand::ready_ = false;
-TempInstallation* MultilookCommand::inst_ = nullptr;
-std::string MultilookCommand::scratch_;
-SynthRun* MultilookCommand::vor_ = nullptr;
-SynthRun* MultilookCommand::por_ = nullptr;
-std::vector<std::string> MultilookCommand::groundArgs_, MultilookCommand::slantArgs_,
-    MultilookCommand::coarseArgs_, MultilookCommand::porArgs_;
-Outcome MultilookCommand::groundRun_, MultilookCommand::slantRun_, MultilookCommand::coarseRun_,
-    MultilookCommand::porRun_;
+class MultilookCommand : public vlr_test::HostRunTest {
+ protected:
+  void TearDown() override { parameters({}); }
+  static const SynthRun& vor() { return scene(kVor); }
+  static const SynthRun& por() { return scene(kPor); }
+  // Exactly 14 arguments: product, output root and orbit, the rest "NotOK".
+  static std::vector<std::string> arguments(const SynthRun& run, const std::string& root) {
+    std::vector<std::string> a(14, kNotOK);
+    a[kProduct] = run.product;
+    a[kRoot] = root;
+    a[kDoris] = orbitOf(run);
+    return a;
+  }
+  // The same for the import: product, orbit and output root.
+  static std::vector<std::string> importArguments(const SynthRun& run, const std::string& root) {
+    std::vector<std::string> a(14, kNotOK);
+    a[kProduct] = run.product;
+    a[kImportDoris] = orbitOf(run);
+    a[kImportRoot] = root;
+    return a;
+  }
+  static Outcome runTool(const std::vector<std::string>& args) {
+    return vlr_test::RunAsHost(inst(), kMultilook, args);
+  }
+  // A run of `run` over a new folder with the parameter file edited and the
+  // arguments at the given positions set.
+  static MultilookRun runWith(const SynthRun& run, const std::string& name,
+                              const std::map<std::string, std::string>& edits,
+                              const std::map<size_t, std::string>& set) {
+    MultilookRun m{arguments(run, folder(name) + "R"), {}};
+    for (const auto& [at, value] : set) m.args[at] = value;
+    parameters(edits);
+    useAuxiliaryListOf(run);
+    m.outcome = runTool(m.args);
+    parameters({});
+    return m;
+  }
+  // Ground range asked for by the command while the parameter file says
+  // slant range, with the TIFF copy.
+  static const MultilookRun& groundRun() {
+    static const MultilookRun r = runWith(vor(), "ground", {{"Sl2Gr", "0"}},
+                                          {{kGroundRange, kOK}, {kTiff, kOK}, {kSaturation, "2"}});
+    return r;
+  }
+  // Slant range while the parameter file says ground range; "ok" is not "OK"
+  // for either switch.
+  static const MultilookRun& slantRun() {
+    static const MultilookRun r = runWith(
+        vor(), "slant", {{"Sl2Gr", "1"}, {"GrResolution", std::to_string(kSlantResolution)}},
+        {{kGroundRange, "ok"}, {kTiff, "ok"}});
+    return r;
+  }
+  // The preliminary orbit, ground range and TIFF, installed parameters.
+  static const MultilookRun& porRun() {
+    static const MultilookRun r = runWith(por(), "por", {}, {{kGroundRange, kOK}, {kTiff, kOK}});
+    return r;
+  }
+};
 
 std::string StartText(const std::vector<std::string>& args) {
   return "\nINPUT ASA_RS : [ " + args[kProduct] + " ]\nOUTPUT ROOT NAME : [ " + args[kRoot] +
@@ -373,28 +290,6 @@ double SwathWidthOnGround(const SynthRun& run, double t = NAN) {
   return width;
 }
 
-// The range look count that a ground resolution asks for on the generated
-// scene: per sub-swath the processed band, 0.8 of the pulse bandwidth, over
-// the band that gives the resolution at the centre incidence, times 1.3,
-// rounded up and then down to an odd count (one look when the processed band
-// is the narrower); the largest over the five sub-swaths.
-int RangeLooks(const SynthRun& run, int resolution) {
-  int looks = 1;
-  for (int k = 1; k <= kSubSwaths; ++k) {
-    const double processed = 0.8 * TruthNumber(run, SubSwath(k), "PulseBandwidth");
-    const double incidence = TruthNumber(run, SubSwath(k), "CentreIncidence") * M_PI / 180.0;
-    const double band = kHalfSpeedOfLight / (std::sin(incidence) * resolution);
-    if (processed < band) continue;
-    const double ratio = 1.3 * processed / band;
-    // Far enough from a whole number that the mid-swath incidence the
-    // processor evaluates cannot round it the other way.
-    EXPECT_GT(std::fabs(ratio - std::round(ratio)), 0.01) << "sub-swath " << k;
-    const int m = static_cast<int>(std::ceil(ratio));
-    looks = std::max(looks, m % 2 == 1 ? m : m - 1);
-  }
-  return looks;
-}
-
 // The floats of a raster file in host order.
 std::vector<float> Floats(const std::string& path) {
   const std::vector<uint8_t> bytes = synth_test::read_file(path);
@@ -444,7 +339,7 @@ void ExpectTiff(const SynthRun& run, const std::string& output) {
   for (const Gcp& g : v.gcps) {
     const double t = start + (g.line - 0.5) * interval;
     const synth::Vec3 truth = GroundRangePoint(orbit, t, nearTau, (g.pixel - 0.5) * kGroundStep);
-    EXPECT_LE(synth::norm(Ecef(g.lat, g.lon) - truth), pixel)
+    EXPECT_LE(Off(g.lat, g.lon, truth), pixel)
         << "GCP (" << g.pixel << ", " << g.line << ") -> (" << g.lon << ", " << g.lat << ")";
   }
   const struct {
@@ -463,19 +358,58 @@ void ExpectTiff(const SynthRun& run, const std::string& output) {
         });
     ASSERT_LE(std::hypot(closest->pixel - c.pixel, closest->line - c.line), 1.0)
         << "no ground control point at this corner";
-    const synth::Vec3 truth = Ecef(TruthNumber(run, "Scene", std::string(c.truth) + "Lat"),
-                                   TruthNumber(run, "Scene", std::string(c.truth) + "Lon"));
-    EXPECT_LE(synth::norm(Ecef(closest->lat, closest->lon) - truth), pixel);
+    EXPECT_LE(truth::SurfaceDistance(closest->lat, closest->lon,
+                                     TruthNumber(run, "Scene", std::string(c.truth) + "Lat"),
+                                     TruthNumber(run, "Scene", std::string(c.truth) + "Lon")),
+              pixel);
   }
 }
 
-TEST_F(MultilookCommand, GroundRangeWhenAskedWhateverTheParameterFileSays) {
-  ExpectSuccess(groundRun_, groundArgs_);
-  const Fields f = ExpectOutput(*vor_, groundArgs_[kRoot], true);
+// The outputs of the descending scene in ground range (asked for by the
+// command while the parameter file says slant range), in slant range (the
+// other way round; "ok" is not "OK" for either switch) and of the ascending
+// scene on the preliminary orbit, against the generator's scene.
+TEST_F(MultilookCommand, OutputsMatchTheGeneratedScene) {
+  ExpectSuccess(porRun().outcome, porRun().args);
+  ExpectOutput(por(), porRun().args[kRoot], true);
+  ExpectSuccess(groundRun().outcome, groundRun().args);
+  const Fields ground = ExpectOutput(vor(), groundRun().args[kRoot], true);
   // Samples every GrSamplingStep from the near edge of the first sub-swath
   // up to the far edge of the last.
-  EXPECT_NEAR(Integer(f, "NrOfPixelsPerLine"), SwathWidthOnGround(*vor_) / kGroundStep + 1.0, 1.0);
-  EXPECT_TRUE(Exists(groundArgs_[kRoot] + "_gr.tif"));
+  EXPECT_NEAR(Integer(ground, "NrOfPixelsPerLine"), SwathWidthOnGround(vor()) / kGroundStep + 1.0,
+              1.0);
+  EXPECT_TRUE(Exists(groundRun().args[kRoot] + "_gr.tif"));
+
+  ExpectSuccess(slantRun().outcome, slantRun().args);
+  const Fields slant = ExpectOutput(vor(), slantRun().args[kRoot], false);
+  // The composed lines cover the slant range from the first sample of the
+  // first sub-swath to the last of the fifth; beyond it at most the padding
+  // of the fifth sub-swath's range transform, whose length is rounded up to
+  // one with small prime factors (a few percent).
+  const double near = TruthNumber(vor(), SubSwath(1), "NearRangeTime");
+  const double lastNear = TruthNumber(vor(), SubSwath(kSubSwaths), "NearRangeTime");
+  const double far = TruthNumber(vor(), SubSwath(kSubSwaths), "FarRangeTime");
+  const double span = (far - near) * kHalfSpeedOfLight;
+  const double padding = 0.1 * (far - lastNear) * kHalfSpeedOfLight;
+  const double spacing = std::atof(Field(slant, "PixelSpacingRg").c_str());
+  const double width = Integer(slant, "NrOfPixelsPerLine") * spacing;
+  EXPECT_GE(width, span - spacing);
+  EXPECT_LE(width, span + padding + spacing);
+  EXPECT_FALSE(Exists(slantRun().args[kRoot] + "_pwr.tif"));
+  EXPECT_FALSE(Exists(slantRun().args[kRoot] + "_pwr.tif.sml"));
+  EXPECT_EQ(slantRun().outcome.log.find("MAKE TIFF OF FILE"), std::string::npos);
+
+  // The header states the range look count of the resolution asked for, and
+  // one azimuth look: one output line per input line interval.
+  const double inputLines =
+      (TruthNumber(vor(), "Scene", "SensingStop") - TruthNumber(vor(), "Scene", "SensingStart")) /
+          TruthNumber(vor(), "Scene", "LineTimeInterval") +
+      1.0;
+  EXPECT_EQ(Integer(ground, "NRangeLooks"), 3);
+  EXPECT_EQ(Integer(slant, "NRangeLooks"), 5);
+  for (const Fields* f : {&ground, &slant})
+    EXPECT_EQ(Integer(*f, "NAzimuthLooks"),
+              std::lround(inputLines / Integer(*f, "NrOfLinesPerImage")));
 }
 
 // The ground width of a long scene changes along it: on this descending
@@ -487,28 +421,22 @@ TEST_F(MultilookCommand, GroundRangeWhenAskedWhateverTheParameterFileSays) {
 TEST_F(MultilookCommand, GroundRangeKeepsTheFarEdgeOfEveryLine) {
   constexpr double kFineStep = 10.0;  // m
   constexpr long kMargin = 40;        // lines at either end that the burst taper darkens
-  const SynthRun run = synth_test::run_synth("--size small --bursts 90 --pass descending");
-  ASSERT_EQ(run.exit_code, 0);
-  parameters({{"GrSamplingStep", "10"}, {"GrResolution", "30"}});
-  std::vector<std::string> args = arguments(run, folder("long") + "R");
-  args[kGroundRange] = kOK;
-  useAuxiliaryListOf(run);
-  ExpectSuccess(runTool(args), args);
-  const std::string output = args[kRoot] + "_gr";
+  const SynthRun& run = scene("--size small --bursts 90 --pass descending");
+  const MultilookRun m = runWith(run, "long", {{"GrSamplingStep", "10"}, {"GrResolution", "30"}},
+                                 {{kGroundRange, kOK}});
+  ExpectSuccess(m.outcome, m.args);
+  const std::string output = m.args[kRoot] + "_gr";
   const Fields f = ReadSml(output + ".sml");
   const long lines = Integer(f, "NrOfLinesPerImage");
   const long samples = Integer(f, "NrOfPixelsPerLine");
   ASSERT_GT(lines, 2 * kMargin);
-  const std::string image = ReadFile(output);
-  ASSERT_EQ(image.size(), static_cast<size_t>(lines * samples) * kFloatBytes);
+  const std::vector<float> image = Floats(output);
+  ASSERT_EQ(image.size(), static_cast<size_t>(lines * samples));
   // The last sample of a line that holds data.
   auto lastData = [&](long line) {
-    for (long k = samples - 1; k >= 0; --k) {
-      float v = 0.0f;
-      std::memcpy(&v, image.data() + (line * samples + k) * kFloatBytes, kFloatBytes);
-      if (v != 0.0f) return k;
-    }
-    return -1L;
+    long k = samples - 1;
+    while (k >= 0 && image[line * samples + k] == 0.0f) --k;
+    return k;
   };
   // The generator's far edge of a line, in output samples.
   const double start = TruthNumber(run, "Scene", "SensingStart");
@@ -524,114 +452,74 @@ TEST_F(MultilookCommand, GroundRangeKeepsTheFarEdgeOfEveryLine) {
     SCOPED_TRACE("line " + std::to_string(line));
     EXPECT_NEAR(lastData(line), edge(line), 1.5);
   }
-  synth_test::remove_run(run);
 }
 
 // Products that begin and end with blank records, their time fields zero or
 // nominal, multilook onto the same grid as the product without them.
 TEST_F(MultilookCommand, BlankRecordsAtEitherEndMultilook) {
-  ASSERT_EQ(groundRun_.status, 0);
-  const Fields plain = ReadSml(groundArgs_[kRoot] + "_gr.sml");
+  ASSERT_EQ(groundRun().outcome.status, 0);
+  const Fields plain = ReadSml(groundRun().args[kRoot] + "_gr.sml");
   for (const bool zero : {false, true}) {
     SCOPED_TRACE(zero ? "zero times" : "nominal times");
     // The whole first burst and the first line of the last one are blank.
-    const SynthRun run =
-        synth_test::run_synth(std::string("--size tiny --pass descending --blank-start 60 "
-                                          "--blank-end 60") +
-                              (zero ? " --blank-zero-time" : ""));
-    ASSERT_EQ(run.exit_code, 0);
-    std::vector<std::string> args =
-        arguments(run, folder(zero ? "blank_zero" : "blank_nominal") + "R");
-    args[kGroundRange] = kOK;
-    useAuxiliaryListOf(run);
-    ExpectSuccess(runTool(args), args);
-    const Fields f = ExpectOutput(run, args[kRoot], true);
+    const SynthRun& run = scene(std::string("--size tiny --pass descending --blank-start 60 "
+                                            "--blank-end 60") +
+                                (zero ? " --blank-zero-time" : ""));
+    const MultilookRun m =
+        runWith(run, zero ? "blank_zero" : "blank_nominal", {}, {{kGroundRange, kOK}});
+    ExpectSuccess(m.outcome, m.args);
+    const Fields f = ExpectOutput(run, m.args[kRoot], true);
     EXPECT_EQ(Field(f, "NrOfLinesPerImage"), Field(plain, "NrOfLinesPerImage"));
     EXPECT_EQ(Field(f, "NrOfPixelsPerLine"), Field(plain, "NrOfPixelsPerLine"));
-    synth_test::remove_run(run);
   }
 }
 
-TEST_F(MultilookCommand, SlantRangeWithoutTiffUnlessExactlyOK) {
-  ExpectSuccess(slantRun_, slantArgs_);
-  const Fields f = ExpectOutput(*vor_, slantArgs_[kRoot], false);
-  // The composed lines cover the slant range from the first sample of the
-  // first sub-swath to the last of the fifth; beyond it at most the padding
-  // of the fifth sub-swath's range transform, whose length is rounded up to
-  // one with small prime factors (a few percent).
-  const double near = TruthNumber(*vor_, SubSwath(1), "NearRangeTime");
-  const double lastNear = TruthNumber(*vor_, SubSwath(kSubSwaths), "NearRangeTime");
-  const double far = TruthNumber(*vor_, SubSwath(kSubSwaths), "FarRangeTime");
-  const double span = (far - near) * kHalfSpeedOfLight;
-  const double padding = 0.1 * (far - lastNear) * kHalfSpeedOfLight;
-  const double spacing = std::atof(Field(f, "PixelSpacingRg").c_str());
-  const double width = Integer(f, "NrOfPixelsPerLine") * spacing;
-  EXPECT_GE(width, span - spacing);
-  EXPECT_LE(width, span + padding + spacing);
-  const std::string output = slantArgs_[kRoot] + "_pwr";
-  EXPECT_FALSE(Exists(output + ".tif"));
-  EXPECT_FALSE(Exists(output + ".tif.sml"));
-  EXPECT_EQ(slantRun_.log.find("MAKE TIFF OF FILE"), std::string::npos) << slantRun_.log;
-}
-
-TEST_F(MultilookCommand, AntennaFlagInTheParameterFileChangesNothing) {
-  ASSERT_EQ(slantRun_.status, 0);
-  parameters(
-      {{"Sl2Gr", "1"}, {"RgAnt_flag", "1"}, {"GrResolution", std::to_string(kSlantResolution)}});
-  std::vector<std::string> args = slantArgs_;
-  args[kRoot] = folder("antenna") + "R";
-  useAuxiliaryListOf(*vor_);
-  ExpectSuccess(runTool(args), args);
-  const std::string flagged = ReadFile(args[kRoot] + "_pwr");
+// The antenna flag of the parameter file changes nothing.  The map-projected
+// copy "<root>_geo.tif" is written only when the parameter file asks for it;
+// map options that cannot make a map end the run before the multilook, with
+// the reason in the error file.
+TEST_F(MultilookCommand, ParameterFileSwitches) {
+  const MultilookRun antenna = runWith(
+      vor(), "antenna",
+      {{"Sl2Gr", "1"}, {"RgAnt_flag", "1"}, {"GrResolution", std::to_string(kSlantResolution)}},
+      {});
+  ExpectSuccess(antenna.outcome, antenna.args);
+  const std::string flagged = ReadFile(antenna.args[kRoot] + "_pwr");
   ASSERT_FALSE(flagged.empty());
-  EXPECT_TRUE(flagged == ReadFile(slantArgs_[kRoot] + "_pwr"))
+  EXPECT_TRUE(flagged == ReadFile(slantRun().args[kRoot] + "_pwr"))
       << "the antenna correction changed the image";
-}
 
-// The map-projected copy "<root>_geo.tif" is written only when the
-// parameter file asks for it; map options that cannot make a map end the
-// run before the multilook, with the reason in the error file.
-TEST_F(MultilookCommand, GeocodedCopyOnlyWhenAsked) {
-  ExpectSuccess(groundRun_, groundArgs_);
-  EXPECT_FALSE(Exists(groundArgs_[kRoot] + "_geo.tif"));
-  useAuxiliaryListOf(*vor_);
-  parameters({{"Geocode", "1"}});
-  std::vector<std::string> args = groundArgs_;
-  args[kRoot] = folder("geocoded") + "R";
-  ExpectSuccess(runTool(args), args);
-  EXPECT_TRUE(Exists(args[kRoot] + "_geo.tif"));
-  EXPECT_TRUE(Exists(args[kRoot] + "_geo.tif.sml"));
+  EXPECT_FALSE(Exists(groundRun().args[kRoot] + "_geo.tif"));
+  const std::map<size_t, std::string> ground = {
+      {kGroundRange, kOK}, {kTiff, kOK}, {kSaturation, "2"}};
+  const MultilookRun geocoded = runWith(vor(), "geocoded", {{"Geocode", "1"}}, ground);
+  ExpectSuccess(geocoded.outcome, geocoded.args);
+  EXPECT_TRUE(Exists(geocoded.args[kRoot] + "_geo.tif"));
+  EXPECT_TRUE(Exists(geocoded.args[kRoot] + "_geo.tif.sml"));
   // The other outputs are those of a run without it.
-  EXPECT_TRUE(ReadFile(args[kRoot] + "_gr") == ReadFile(groundArgs_[kRoot] + "_gr"));
+  EXPECT_TRUE(ReadFile(geocoded.args[kRoot] + "_gr") == ReadFile(groundRun().args[kRoot] + "_gr"));
 
-  parameters({{"Geocode", "1"}, {"MapEPSG", "99999"}});
-  args[kRoot] = folder("badmap") + "R";
-  const Outcome bad = runTool(args);
-  ExpectFailure(bad, 130560, "geocode(): EPSG code 99999", "EPSG code 99999 is unknown");
-  EXPECT_FALSE(Exists(args[kRoot] + "_gr"));
-  EXPECT_FALSE(Exists(args[kRoot] + "_geo.tif"));
-}
-
-TEST_F(MultilookCommand, PreliminaryOrbitIsAccepted) {
-  ExpectSuccess(porRun_, porArgs_);
-  ExpectOutput(*por_, porArgs_[kRoot], true);
+  const MultilookRun bad =
+      runWith(vor(), "badmap", {{"Geocode", "1"}, {"MapEPSG", "99999"}}, ground);
+  ExpectFailure(bad.outcome, 130560, "geocode(): EPSG code 99999", "EPSG code 99999 is unknown");
+  EXPECT_EQ(vlr_test::FolderNames(folder("badmap")), std::set<std::string>());
 }
 
 TEST_F(MultilookCommand, TiffOpensInGdalWithControlPointsOnTheScene) {
-  if (!HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
-  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
-  ASSERT_EQ(porRun_.status, 0) << porRun_.error;
+  if (!vlr_test::HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
+  ASSERT_EQ(groundRun().outcome.status, 0) << groundRun().outcome.error;
+  ASSERT_EQ(porRun().outcome.status, 0) << porRun().outcome.error;
   {
     SCOPED_TRACE("descending scene, DOR_VOR");
-    ExpectTiff(*vor_, groundArgs_[kRoot] + "_gr");
+    ExpectTiff(vor(), groundRun().args[kRoot] + "_gr");
   }
   {
     SCOPED_TRACE("ascending scene, DOR_POR");
-    ExpectTiff(*por_, porArgs_[kRoot] + "_gr");
+    ExpectTiff(por(), porRun().args[kRoot] + "_gr");
   }
-  EXPECT_NE(groundRun_.log.find("MAKE TIFF OF FILE [" + groundArgs_[kRoot] + "_gr]"),
+  EXPECT_NE(groundRun().outcome.log.find("MAKE TIFF OF FILE [" + groundRun().args[kRoot] + "_gr]"),
             std::string::npos)
-      << groundRun_.log;
+      << groundRun().outcome.log;
 }
 
 // The host withdraws the run (deletes "_batch_ok") while it shows a given
@@ -639,14 +527,9 @@ TEST_F(MultilookCommand, TiffOpensInGdalWithControlPointsOnTheScene) {
 // while the outputs of an earlier successful run under another root stay as
 // they were.
 TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
-  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
-  const std::string earlierDir = scratch_ + "ground/";
-  auto state = [](const std::string& dir) {
-    std::map<std::string, std::string> files;
-    for (const std::string& name : vlr_test::FolderNames(dir)) files[name] = ReadFile(dir + name);
-    return files;
-  };
-  const std::map<std::string, std::string> earlier = state(earlierDir);
+  ASSERT_EQ(groundRun().outcome.status, 0) << groundRun().outcome.error;
+  const std::string earlierDir = folder("ground");
+  const std::map<std::string, std::string> earlier = vlr_test::FolderFiles(earlierDir);
   ASSERT_GT(earlier.size(), 20u);
 
   const struct {
@@ -656,7 +539,7 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
     int percent = 50;
     bool byTiffCheck = false;  // stopped by the check before the export
   } cases[] = {
-      {"the import's extraction", "main_import_ESA#", "Extracting data..."},
+      {"the import's extraction", kImport, "Extracting data..."},
       {"the multilook processing", kMultilook, "MULTILOOK PROCESSING"},
       {"the recomposition", kMultilook, "MULTILOOK SWATHS RECOMPOSITION"},
       {"the TIFF export", kMultilook, "Tiff generation ..."},
@@ -668,58 +551,21 @@ TEST_F(MultilookCommand, AWithdrawnRunLeavesNothingBehind) {
     SCOPED_TRACE(c.what);
     const std::string dir = folder("withdrawn" + std::to_string(++n));
     const bool import = std::string(c.word) != kMultilook;
-    std::vector<std::string> args = arguments(*vor_, dir + "R");
-    args[kGroundRange] = args[kTiff] = kOK;
-    if (import) {
-      // The import's positions: orbit 1, output root 3.
-      args[1] = args[kDoris];
-      args[2] = kNotOK;
-      args[3] = dir + "R";
-    }
-    useAuxiliaryListOf(*vor_);
+    std::vector<std::string> args =
+        import ? importArguments(vor(), dir + "R") : arguments(vor(), dir + "R");
+    if (!import) args[kGroundRange] = args[kTiff] = kOK;
+    useAuxiliaryListOf(vor());
     const Outcome o = vlr_test::RunAsHost(
-        *inst_, c.word, args, false,
+        inst(), c.word, args, false,
         {{"VELORAN_TEST_WITHDRAW_AT", std::string(c.phase) + "@" + std::to_string(c.percent)}});
-    vlr_test::ExpectFailureRecords(o, 326400, c.byTiffCheck ? "" : inst_->workingFile() + "\n",
+    vlr_test::ExpectFailureRecords(o, 326400, c.byTiffCheck ? "" : inst().workingFile() + "\n",
                                    import ? "Import ESA Products" : "Multilooking ASA WSS",
                                    "[ERROR ID : 326400]");
     EXPECT_EQ(vlr_test::FolderNames(dir), std::set<std::string>());
   }
   parameters({});
-  EXPECT_TRUE(state(earlierDir) == earlier) << "an earlier run's outputs changed";
-  EXPECT_TRUE(Exists(vor_->product));
-}
-
-// The composed header states the range look count of the resolution asked
-// for, and one azimuth look: one output line per input line interval.
-TEST_F(MultilookCommand, HeaderStatesTheLooksTheProcessorUsed) {
-  const struct {
-    const char* what;
-    const Outcome& outcome;
-    const SynthRun* run;
-    std::string output;
-    int resolution;
-  } cases[] = {
-      {"ground range", groundRun_, vor_, groundArgs_[kRoot] + "_gr", kInstalledResolution},
-      {"slant range", slantRun_, vor_, slantArgs_[kRoot] + "_pwr", kSlantResolution},
-      {"slant range, coarser", coarseRun_, vor_, coarseArgs_[kRoot] + "_pwr", kCoarseResolution},
-  };
-  std::set<int> counts;
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.what);
-    ASSERT_EQ(c.outcome.status, 0) << c.outcome.error;
-    const Fields f = ReadSml(c.output + ".sml");
-    const int looks = RangeLooks(*c.run, c.resolution);
-    counts.insert(looks);
-    EXPECT_EQ(Integer(f, "NRangeLooks"), looks);
-    const double inputLines = (TruthNumber(*c.run, "Scene", "SensingStop") -
-                               TruthNumber(*c.run, "Scene", "SensingStart")) /
-                                  TruthNumber(*c.run, "Scene", "LineTimeInterval") +
-                              1.0;
-    EXPECT_EQ(Integer(f, "NAzimuthLooks"),
-              std::lround(inputLines / Integer(f, "NrOfLinesPerImage")));
-  }
-  EXPECT_EQ(counts, (std::set<int>{3, 5, 9}));
+  EXPECT_TRUE(vlr_test::FolderFiles(earlierDir) == earlier) << "an earlier run's outputs changed";
+  EXPECT_TRUE(Exists(vor().product));
 }
 
 // Opened by its own name, every output reads in GDAL as what it holds: the
@@ -727,11 +573,12 @@ TEST_F(MultilookCommand, HeaderStatesTheLooksTheProcessorUsed) {
 // with 0 exactly at the null pixels of the image and its grey levels in the
 // order of the image's amplitudes.
 TEST_F(MultilookCommand, EveryOutputOpensInGdalByItsOwnName) {
-  if (!HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
-  ASSERT_EQ(groundRun_.status, 0) << groundRun_.error;
-  ASSERT_EQ(slantRun_.status, 0) << slantRun_.error;
+  if (!vlr_test::HaveGdal()) GTEST_SKIP() << "gdal-bin is not installed";
+  ASSERT_EQ(groundRun().outcome.status, 0) << groundRun().outcome.error;
+  ASSERT_EQ(slantRun().outcome.status, 0) << slantRun().outcome.error;
   const std::string copy = folder("gdal") + "copy";
-  for (const std::string& output : {groundArgs_[kRoot] + "_gr", slantArgs_[kRoot] + "_pwr"}) {
+  for (const std::string& output :
+       {groundRun().args[kRoot] + "_gr", slantRun().args[kRoot] + "_pwr"}) {
     SCOPED_TRACE(output);
     const Fields f = ReadSml(output + ".sml");
     ASSERT_EQ(Field(f, "CellType"), "FLOAT");
@@ -739,7 +586,7 @@ TEST_F(MultilookCommand, EveryOutputOpensInGdalByItsOwnName) {
         << "GDAL does not read the image's own floats";
   }
 
-  const std::string image = groundArgs_[kRoot] + "_gr";
+  const std::string image = groundRun().args[kRoot] + "_gr";
   const std::vector<float> values = Floats(image);
   const std::vector<uint8_t> grey = GdalCopy(image + ".tif", copy);
   ASSERT_EQ(grey.size(), values.size());
@@ -758,111 +605,131 @@ TEST_F(MultilookCommand, EveryOutputOpensInGdalByItsOwnName) {
   EXPECT_EQ(inversions, 0u);
 }
 
+// One run per way either command ends early: the code, the error file, the
+// record in Process.log, no output root, and nothing the run began left in
+// its folder.
 TEST_F(MultilookCommand, EveryFailureEndsWithItsCodeInTheRecords) {
-  const SynthRun& run = *vor_;
+  const SynthRun& run = vor();
   const std::string xca = run.dir + Truth(run, "Scene", "XcaFile");
-  const std::vector<uint8_t> productBytes = synth_test::read_file(run.product);
+  const std::string product = ReadFile(run.product);
   const std::string productName = Truth(run, "Scene", "Product");
-  const std::string mdsOffset = Truth(run, SubSwath(3), "MdsOffset");
-
+  const std::string missingOrbit = folder("failures") + "DOR_VOR_AXVF-P_missing";
+  using Prepare = std::function<void(const std::string& dir, std::vector<std::string>& args)>;
   struct Case {
+    const char* word;  // the command
     const char* what;
     int code;
     std::string extra;    // text after "[EC : code]\n" in the error file
     std::string logText;  // text in Process.log
-    // Prepares the case in its folder (ends with '/') and edits the arguments.
-    std::function<void(const std::string&, std::vector<std::string>&)> prepare;
-    bool withdrawn = false;
+    Prepare prepare;      // readies the case in its folder (ends with '/')
   };
-  // A copy of the product, under its own name in `dir`, with `edit` applied.
-  auto productCopy = [&](const std::string& dir,
-                         const std::function<void(std::string&)>& edit) -> std::string {
-    std::string bytes(productBytes.begin(), productBytes.end());
-    edit(bytes);
-    WriteFile(dir + productName, bytes);
-    return dir + productName;
+  auto argument = [](size_t at, const std::string& value) -> Prepare {
+    return [=](const std::string&, std::vector<std::string>& a) { a[at] = value; };
+  };
+  auto parameter = [](const std::string& key, const std::string& value) -> Prepare {
+    return [=](const std::string&, std::vector<std::string>&) { parameters({{key, value}}); };
+  };
+  auto inTheWay = [](const std::string& name) -> Prepare {
+    return [=](const std::string& dir, std::vector<std::string>&) {
+      std::filesystem::create_directories(dir + name);
+    };
+  };
+  // The product, under its own name in the case's folder, as these bytes.
+  auto productOf = [&](const std::string& bytes) -> Prepare {
+    return [=](const std::string& dir, std::vector<std::string>& a) {
+      a[kProduct] = dir + productName;
+      WriteFile(a[kProduct], bytes);
+    };
+  };
+  const Prepare noValidAuxiliary = [&](const std::string&, std::vector<std::string>&) {
+    WriteFile(desFolder() + "ASA_AUX_list.dat",
+              "[ASA_XCA_0]\nStartDate = 01-JAN-2000 00:00:00\nStopDate = 01-JAN-2001 00:00:00\n"
+              "FileName = " +
+                  Truth(run, "Scene", "XcaFile") + "\n");
+  };
+  const Prepare truncated =
+      productOf(product.substr(0, std::stoul(Truth(run, SubSwath(3), "MdsOffset"))));
+  std::string unknownPolarisation = product;
+  unknownPolarisation[unknownPolarisation.find("MDS1_TX_RX_POLAR=\"") + 18] = 'X';
+  const std::string orbitFolder = folder("failures");
+  const Prepare calibrationAsProduct = [&](const std::string&, std::vector<std::string>& a) {
+    a[kProduct] = a[kImportXca] = a[kImportIns] = xca;
   };
   const Case cases[] = {
-      {"13 arguments", 456962, inst_->working() + "args.txt\n", " Parameter 12 (NotOK)\n",
-       [](const std::string&, std::vector<std::string>& a) { a.pop_back(); }},
-      {"no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]",
-       [](const std::string&, std::vector<std::string>& a) { a[kProduct] = kNotOK; }},
-      {"a calibration file as product", 456962, "WSS\n", "INVALID INPUT",
-       [&](const std::string&, std::vector<std::string>& a) { a[kProduct] = xca; }},
-      {"no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
-       [](const std::string&, std::vector<std::string>& a) { a[kRoot] = kNotOK; }},
-      {"no orbit", 456962, "DOR_VOR\n", "INPUT DORIS : [ NotOK ]",
-       [](const std::string&, std::vector<std::string>& a) { a[kDoris] = kNotOK; }},
-      {"a calibration file as orbit", 456962, "DOR_VOR\n", "INVALID INPUT",
-       [&](const std::string&, std::vector<std::string>& a) { a[kDoris] = xca; }},
-      {"no auxiliary file valid at the sensing start", 130560, "findaux()\n", "file : find_aux",
-       [&](const std::string&, std::vector<std::string>&) {
-         WriteFile(desFolder() + "ASA_AUX_list.dat",
-                   "[ASA_XCA_0]\nStartDate = 01-JAN-2000 00:00:00\nStopDate = 01-JAN-2001 "
-                   "00:00:00\nFileName = " +
-                       Truth(run, "Scene", "XcaFile") + "\n");
-       }},
-      {"a product cut inside its third sub-swath", 130560, "images run()\n", "file : images_v2",
-       [&](const std::string& dir, std::vector<std::string>& a) {
-         a[kProduct] = productCopy(dir, [&](std::string& b) { b.resize(std::stoul(mdsOffset)); });
-       }},
-      {"a polarisation the conversion does not know", 130560, "tessal2kestova()\n",
-       "Wrong Polarization Type",
-       [&](const std::string& dir, std::vector<std::string>& a) {
-         a[kProduct] = productCopy(dir, [](std::string& b) {
-           const std::string field = "MDS1_TX_RX_POLAR=\"";
-           const size_t at = b.find(field);
-           if (at != std::string::npos) b[at + field.size()] = 'X';
-         });
-       }},
-      {"a list file that cannot be created", 9, "", "File not opened!",
-       [](const std::string& dir, std::vector<std::string>&) {
-         std::filesystem::create_directories(dir + "R.list_tmp");
-       }},
-      {"a parameter file without W1", 130560, "mlook conf readpar()\n", "PROCESSING STEP FAILED",
-       [](const std::string&, std::vector<std::string>&) {
-         parameters({{"W1", ""}});
-       }},
-      {"a ground resolution out of range", 130560, "mlook conf checkpar()\n",
-       "PROCESSING STEP FAILED",
-       [](const std::string&, std::vector<std::string>&) {
-         parameters({{"GrResolution", "5000"}});
-       }},
-      {"more than 15 range looks", 130560, "mlook run()\n",
-       "Number of estimated range looks must be lower than 15",
-       [](const std::string&, std::vector<std::string>&) {
-         parameters({{"GrResolution", "1000"}});
-       }},
-      {"a processor header that cannot be written", 130560, "mlook writepar()\n",
-       "PROCESSING STEP FAILED",
-       [](const std::string& dir, std::vector<std::string>&) {
-         std::filesystem::create_directories(dir + "R_pwr.hdr");
-       }},
-      {"a suite header that cannot be written", 261124, "", "R_pwr.sml",
-       [](const std::string& dir, std::vector<std::string>&) {
-         std::filesystem::create_directories(dir + "R_pwr.sml");
-       }},
-      // The host deleted "_batch_ok" before the start: the first progress
-      // update, when the extraction starts copying lines, ends the run
-      // before any sub-swath is converted.
-      {"a run withdrawn by the host", 326400, inst_->workingFile() + "\n",
-       "END :  Extracting data...", [](const std::string&, std::vector<std::string>&) {}, true},
+      {kImport, "no product", 456962, "ASA_XXX\n", "\nINPUT ASA : [ NotOK ]",
+       argument(kProduct, kNotOK)},
+      // "NotOK" is compared whole: a longer text is a file name, here one
+      // that does not exist.
+      {kImport, "a product that does not open", 9, "", "File not opened!",
+       argument(kProduct, "NotOKay")},
+      {kImport, "a calibration file as product", 456962, "WSS\n",
+       "Input file is not a ASA_WSS dataset", calibrationAsProduct},
+      {kImport, "a missing orbit file", 9, "", "Orbit file " + missingOrbit + ": ",
+       argument(kImportDoris, missingOrbit)},
+      {kImport, "an orbit file that is a folder", 4, "", "Orbit file " + orbitFolder,
+       argument(kImportDoris, orbitFolder)},
+      {kImport, "a product cut inside its third sub-swath", 4, "", "file : images_v2", truncated},
+      {kImport, "an output folder that is a file", 9, "", "File not opened!",
+       argument(kImportRoot, xca + "/R")},
+      {kImport, "a polarisation the conversion does not know", 1, "", "Wrong Polarization Type",
+       productOf(unknownPolarisation)},
+      {kMultilook, "no product", 456962, "WSS\n", "\nINPUT ASA_RS : [ NotOK ]",
+       argument(kProduct, kNotOK)},
+      {kMultilook, "a calibration file as product", 456962, "WSS\n", "INVALID INPUT",
+       argument(kProduct, xca)},
+      {kMultilook, "no output root", 456962, "OUTNAME\n", "OUTPUT ROOT NAME : [ NotOK ]",
+       argument(kRoot, kNotOK)},
+      {kMultilook, "no orbit", 456962, "DOR_VOR\n", "INPUT DORIS : [ NotOK ]",
+       argument(kDoris, kNotOK)},
+      {kMultilook, "a calibration file as orbit", 456962, "DOR_VOR\n", "INVALID INPUT",
+       argument(kDoris, xca)},
+      {kMultilook, "a missing orbit file", 456962, "DOR_VOR\n", "Orbit file " + missingOrbit + ": ",
+       argument(kDoris, missingOrbit)},
+      {kMultilook, "an orbit file that is a folder", 456962, "DOR_VOR\n",
+       "Orbit file " + orbitFolder, argument(kDoris, orbitFolder)},
+      {kMultilook, "no auxiliary file valid at the sensing start", 130560, "findaux()\n",
+       "file : find_aux", noValidAuxiliary},
+      {kMultilook, "a product cut inside its third sub-swath", 130560, "images run()\n",
+       "file : images_v2", truncated},
+      {kMultilook, "a polarisation the conversion does not know", 130560, "tessal2kestova()\n",
+       "Wrong Polarization Type", productOf(unknownPolarisation)},
+      {kMultilook, "a list file that cannot be created", 9, "", "File not opened!",
+       inTheWay("R.list_tmp")},
+      {kMultilook, "a parameter file without W1", 130560, "mlook conf readpar()\n",
+       "PROCESSING STEP FAILED", parameter("W1", "")},
+      {kMultilook, "a ground resolution out of range", 130560, "mlook conf checkpar()\n",
+       "PROCESSING STEP FAILED", parameter("GrResolution", "5000")},
+      {kMultilook, "more than 15 range looks", 130560, "mlook run()\n",
+       "Number of estimated range looks must be lower than 15", parameter("GrResolution", "1000")},
+      {kMultilook, "a processor header that cannot be written", 130560, "mlook writepar()\n",
+       "PROCESSING STEP FAILED", inTheWay("R_pwr.hdr")},
+      {kMultilook, "a suite header that cannot be written", 261124, "", "R_pwr.sml",
+       inTheWay("R_pwr.sml")},
   };
   int n = 0;
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);
+    const bool import = std::string(c.word) != kMultilook;
     const std::string dir = folder("failure" + std::to_string(++n));
-    std::vector<std::string> args = arguments(run, dir + "R");
+    std::vector<std::string> args =
+        import ? importArguments(run, dir + "R") : arguments(run, dir + "R");
     useAuxiliaryListOf(run);
     c.prepare(dir, args);
     const std::set<std::string> prepared = vlr_test::FolderNames(dir);
-    const Outcome o = runTool(args, c.withdrawn);
-    ExpectFailure(o, c.code, c.extra, c.logText);
+    const Outcome o = vlr_test::RunAsHost(inst(), c.word, args);
+    vlr_test::ExpectFailureRecords(
+        o, c.code, c.extra, import ? "Import ESA Products" : "Multilooking ASA WSS", c.logText);
+    EXPECT_FALSE(Exists(args[import ? kImportRoot : kRoot]));
     // Nothing the run began is left: no list file, sub-swath, temporary or
     // partial output.
     EXPECT_EQ(vlr_test::FolderNames(dir), prepared);
     parameters({});
   }
+  // Thirteen arguments: the list file is named, and the last one read.
+  std::vector<std::string> args = arguments(run, folder("thirteen") + "R");
+  args.pop_back();
+  ExpectFailure(runTool(args), 456962, inst().working() + "args.txt\n", " Parameter 12 (NotOK)\n");
+  EXPECT_EQ(vlr_test::FolderNames(folder("thirteen")), std::set<std::string>());
 }
 
 }  // namespace

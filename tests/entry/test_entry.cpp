@@ -2,9 +2,10 @@
 // file and the working file.
 #include <gtest/gtest.h>
 
-#include <cctype>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
+#include <regex>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -24,13 +25,6 @@ namespace {
 
 const std::string kStars(160, '*');
 const std::string kId = "Veloran Base ENVI 4.2.000 Aug 30 2010 ";
-
-std::vector<std::string> fourteen() {
-  std::vector<std::string> a(14, "NotOK");
-  a[0] = "/data/ASA_WSS_1PNPDE20080302_091230.N1";
-  a[3] = "/out/R";
-  return a;
-}
 
 class Tool : public ::testing::Test {
  protected:
@@ -54,15 +48,12 @@ TEST(CommandWord, SelectionIsCaseSensitiveAndNeedsTheHash) {
   EXPECT_STREQ(cmd, "main_import_ESA#/a/b");
 }
 
-TEST_F(Tool, UnknownCommandWordsEndWith456963) {
-  for (const char* command : {"main_convert#x", "main_Import_ESA#x", "main_import_ESA x"}) {
-    SCOPED_TRACE(command);
-    const RunResult r = inst_.run(command);
-    EXPECT_EQ(r.status, 255);
-    EXPECT_NE(log().find(kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command; the tool"),
-              std::string::npos);
-    EXPECT_NE(errorFile().find("[EC : 456963]"), std::string::npos);
-  }
+TEST_F(Tool, UnknownCommandWordEndsWith456963) {
+  const RunResult r = inst_.run("main_Import_ESA#x");
+  EXPECT_EQ(r.status, 255);
+  EXPECT_NE(log().find(kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command; the tool"),
+            std::string::npos);
+  EXPECT_NE(errorFile().find("[EC : 456963]"), std::string::npos);
   EXPECT_EQ(log().find("START :"), std::string::npos);
   EXPECT_NE(MaskLocalTimes(log()).find("\n\n- -   " + kId + "\n\n<TIME>\n\nERROR :\n   \n\n\n" +
                                        kStars + "\nEND :  -  -  <TIME>\n" + kStars + "\n\n"),
@@ -104,67 +95,23 @@ TEST_F(Tool, BrokenConfigurationFails) {
 }
 
 TEST_F(Tool, TooFewArgumentsRaise456962AfterTheStartRecord) {
-  struct Case {
-    const char* word;
-    const char* title;
-  };
-  for (const Case& c : {Case{"main_import_ESA#", "Import ESA Products"},
-                        Case{"main_multilook_WSS#", "Multilooking ASA WSS"}}) {
-    SCOPED_TRACE(c.word);
-    std::remove((inst_.working() + "Process.log").c_str());
-    inst_.hostFiles();
-    const std::string args = inst_.writeArguments({"one", "two"});
-    const RunResult r = inst_.run(std::string(c.word) + args + "###Veloran###host text");
-    EXPECT_EQ(r.status, 255);
-    const std::string expected = "\n\n\n" + kStars + "\nSTART : " + c.title + "  [ " + kId +
-                                 " ]\n<TIME>\n" + kStars +
-                                 "\n\n Parameter 0 (one)\n Parameter 1 (two)\n\n" + kStars + "\n\n";
-    EXPECT_EQ(MaskLocalTimes(log()).substr(0, expected.size()), expected) << log();
-    EXPECT_NE(log().find("[ERROR ID : 456962]\n  INVALID INPUT [An input argument is missing or "
-                         "invalid; check the named input]\n  " +
-                         args + " \n\n"),
-              std::string::npos);
-    const std::string error = errorFile();
-    EXPECT_EQ(error.substr(0, 3), "-1\n");
-    EXPECT_NE(error.find("[EC : 456962]\n" + args + "\n"), std::string::npos);
-    EXPECT_EQ(ReadFile(inst_.workingFile()).substr(0, 12), "-1\nStarting\n");
-    EXPECT_NE(log().find("\nEND :  " + std::string(c.title) + "  -  "), std::string::npos);
-  }
-}
-
-TEST_F(Tool, ArgumentChecksNeedingNoFileName) {
-  std::vector<std::string> a = fourteen();
-  a[0] = "NotOK";
-  RunResult r = inst_.run("main_import_ESA#" + inst_.writeArguments(a));
+  const std::string title = "Import ESA Products";
+  const std::string args = inst_.writeArguments({"one", "two"});
+  const RunResult r = inst_.run("main_import_ESA#" + args + "###Veloran###host text");
   EXPECT_EQ(r.status, 255);
-  EXPECT_NE(errorFile().find("[EC : 456962]\nASA_XXX\n"), std::string::npos);
-  // The full parameter text of the import.
-  EXPECT_NE(log().find("\nINPUT ASA : [ NotOK ]\nINPUT DORIS : [ NotOK ]\nINPUT ASA_XCA : [ NotOK "
-                       "]\nOUTPUT ROOT NAME : [ /out/R ]\n" +
-                       kStars),
+  const std::string expected = "\n\n\n" + kStars + "\nSTART : " + title + "  [ " + kId +
+                               " ]\n<TIME>\n" + kStars +
+                               "\n\n Parameter 0 (one)\n Parameter 1 (two)\n\n" + kStars + "\n\n";
+  EXPECT_EQ(MaskLocalTimes(log()).substr(0, expected.size()), expected) << log();
+  EXPECT_NE(log().find("[ERROR ID : 456962]\n  INVALID INPUT [An input argument is missing or "
+                       "invalid; check the named input]\n  " +
+                       args + " \n\n"),
             std::string::npos);
-
-  r = inst_.run("main_multilook_WSS#" + inst_.writeArguments(a));
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(errorFile().find("[EC : 456962]\nWSS\n"), std::string::npos);
-  // "NotOK" is compared whole: a longer text is a file name, here one that
-  // does not exist, so the search for the calibration file cannot open it.
-  a = fourteen();
-  a[0] = "NotOKay";
-  std::remove((inst_.workingFile() + "_error").c_str());
-  r = inst_.run("main_import_ESA#" + inst_.writeArguments(a));
-  EXPECT_EQ(r.status, 9);
-  EXPECT_EQ(errorFile(),
-            "-1\nPROCESSING LIBRARY ERROR\nA file could not be opened; check its name and "
-            "permissions [EC : 9]\n\n" +
-                std::string(66, ' ') + "\n" + std::string(66, ' ') + "\n");
-  EXPECT_NE(log().find("\nINPUT ASA : [ NotOKay ]\n"), std::string::npos);
-  EXPECT_NE(log().find("PROCESSING ERROR: File not opened! - line : "), std::string::npos);
-  EXPECT_NE(log().find(" - function : find_aux - file : find_aux - Tessal\n"), std::string::npos);
-  EXPECT_NE(
-      log().find(kId + " [ERROR ID : 9]\n  PROCESSING LIBRARY ERROR [A file could not be opened; "
-                       "check its name and permissions]\n   \n\n"),
-      std::string::npos);
+  const std::string error = errorFile();
+  EXPECT_EQ(error.substr(0, 3), "-1\n");
+  EXPECT_NE(error.find("[EC : 456962]\n" + args + "\n"), std::string::npos);
+  EXPECT_EQ(ReadFile(inst_.workingFile()).substr(0, 12), "-1\nStarting\n");
+  EXPECT_NE(log().find("\nEND :  " + title + "  -  "), std::string::npos);
 }
 
 TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
@@ -174,8 +121,7 @@ TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
     std::vector<int> closed;
     bool trace;
   };
-  const Case cases[] = {
-      {{2}, false}, {{1}, true}, {{1, 2}, true}, {{0, 1, 2}, false}, {{0, 1, 2}, true}};
+  const Case cases[] = {{{2}, false}, {{1}, true}, {{0, 1, 2}, true}};
   for (const Case& c : cases) {
     std::string name;
     for (int fd : c.closed) name += std::to_string(fd) + " ";
@@ -297,67 +243,37 @@ TEST_F(Tool, EntryEndsTheRunAsTheDriverEnds) {
 
 namespace {
 
-TEST(ToolTrace, TraceRecordsTheCommandAndIsArchivedAfterAnError) {
-  TempInstallation inst(/*trace=*/true);
-  inst.hostFiles();
-  const RunResult r = inst.run("main_convert#x###Veloran###tail");
-  EXPECT_EQ(r.status, 255);
-  const std::string trace = ReadFile(inst.working() + "Process.trace");
-  EXPECT_EQ(trace.substr(0, 15), "OpenTrace 1  2\n");
-  EXPECT_NE(trace.find("[main_convert#x]\n"), std::string::npos);
-  EXPECT_NE(trace.find("\nERROR : INVALID INPUT [Unknown command"), std::string::npos);
-  EXPECT_NE(trace.find("FILE=main_import_ASAR"), std::string::npos);
-  // The standard streams went to files beside the trace.
-  EXPECT_TRUE(Exists(inst.working() + "_cerr.txt"));
-  EXPECT_NE(ReadFile(inst.working() + "_cerr.txt").find("[EC : 456963]"), std::string::npos);
-  const std::string listing = vlr_test::RunProgram({"/bin/ls", inst.working()}, {}, true).out;
-  EXPECT_NE(listing.find("_trace.txt"), std::string::npos);
-}
-
-// Names of the form "Process" + "YYYYMMDDhhmmss.uuuuuu" + ".trace".
-std::vector<std::string> traceArchives(const std::string& dir) {
-  const std::string listing = vlr_test::RunProgram({"/bin/ls", "-1", dir}, {}, true).out;
-  std::vector<std::string> names;
-  size_t at = 0;
-  while (at < listing.size()) {
-    size_t end = listing.find('\n', at);
-    if (end == std::string::npos) end = listing.size();
-    const std::string name = listing.substr(at, end - at);
-    at = end + 1;
-    const std::string head = "Process", tail = ".trace";
-    if (name.size() != head.size() + 21 + tail.size()) continue;
-    if (name.compare(0, head.size(), head) != 0) continue;
-    if (name.compare(name.size() - tail.size(), tail.size(), tail) != 0) continue;
-    bool shape = true;
-    for (size_t i = 0; i < 21; ++i) {
-      const char ch = name[head.size() + i];
-      shape = shape && (i == 14 ? ch == '.' : std::isdigit(static_cast<unsigned char>(ch)) != 0);
-    }
-    if (shape) names.push_back(name);
-  }
-  return names;
-}
-
-TEST(ToolTrace, TraceIsArchivedWhenTheHostAsksForIt) {
-  // "Process.trace_save" in the working folder asks for a copy of every
-  // closed trace.
-  for (const bool save : {true, false}) {
+// The trace records the command and the error, the standard streams go to
+// files beside it, and "Process.trace_save" in the working folder asks for a
+// copy of every closed trace, named "Process" + "YYYYMMDDhhmmss.uuuuuu" +
+// ".trace".
+TEST(ToolTrace, TraceRecordsTheRunAndIsArchivedWhenTheHostAsks) {
+  for (const bool save : {false, true}) {
     SCOPED_TRACE(save ? "Process.trace_save present" : "no Process.trace_save");
     TempInstallation inst(/*trace=*/true);
     inst.hostFiles();
     if (save) WriteFile(inst.working() + "Process.trace_save", "");
-    const RunResult r = inst.run("main_convert#x");
-    EXPECT_EQ(r.status, 255);
-    const std::vector<std::string> archives = traceArchives(inst.working());
-    if (!save) {
-      EXPECT_TRUE(archives.empty());
-      continue;
+    EXPECT_EQ(inst.run("main_convert#x###Veloran###tail").status, 255);
+    const std::string trace = ReadFile(inst.working() + "Process.trace");
+    EXPECT_EQ(trace.substr(0, 15), "OpenTrace 1  2\n");
+    EXPECT_NE(trace.find("[main_convert#x]\n"), std::string::npos);
+    EXPECT_NE(trace.find("\nERROR : INVALID INPUT [Unknown command"), std::string::npos);
+    EXPECT_NE(trace.find("FILE=main_import_ASAR"), std::string::npos);
+    EXPECT_NE(ReadFile(inst.working() + "_cerr.txt").find("[EC : 456963]"), std::string::npos);
+    std::vector<std::string> archives;
+    bool errorTrace = false;
+    for (const auto& e : std::filesystem::directory_iterator(inst.working())) {
+      const std::string name = e.path().filename().string();
+      if (std::regex_match(name, std::regex(R"(Process\d{14}\.\d{6}\.trace)")))
+        archives.push_back(name);
+      errorTrace = errorTrace || name.find("_trace.txt") != std::string::npos;
     }
-    ASSERT_EQ(archives.size(), 1u);
+    EXPECT_TRUE(errorTrace);
+    ASSERT_EQ(archives.size(), save ? 1u : 0u);
+    if (!save) continue;
+    // The copy is taken after the closing records.
     const std::string copy = ReadFile(inst.working() + archives[0]);
     EXPECT_EQ(copy, ReadFile(inst.working() + "Process.trace"));
-    EXPECT_EQ(copy.substr(0, 15), "OpenTrace 1  2\n");
-    // The copy is taken after the closing records.
     EXPECT_NE(copy.find("\nEND :  -  "), std::string::npos) << copy;
   }
 }

@@ -140,6 +140,15 @@ TEST_F(CheckedAllocation, OwnedBuffersReturnOnEveryPath) {
   EXPECT_EQ(ckerr_count(), 0);
 }
 
+// A count and size whose product does not fit in size_t are refused, not
+// wrapped round to a small block.
+TEST(CheckedAllocationSize, OverflowingCountIsRefused) {
+  NVLR_UTILITY_ResetForTesting();
+  void* block = calloc_ckerr(SIZE_MAX / 8 + 1, 16);
+  EXPECT_EQ(block, nullptr);
+  free_ckerr(block);
+}
+
 TEST(Report, LevelsAreSilentUntilReportsAreOnAndCountOtherwise) {
   NVLR_UTILITY_ResetForTesting();
   set_flg_report(0);

@@ -34,7 +34,9 @@ class SuiteEnvironment : public ::testing::Test {
   TempInstallation inst_;
 };
 
-TEST_F(SuiteEnvironment, ConfigurationFillsTheTable) {
+// The configuration fills the table of folders; process variables override
+// it, and stray characters of a DOS line end are dropped.
+TEST_F(SuiteEnvironment, ConfigurationAndProcessVariables) {
   init();
   EXPECT_EQ(NVLR_UTILITY_EnvValue("VELORAN_WORKING_DIR"), inst_.working());
   EXPECT_EQ(NVLR_UTILITY_EnvValue("VELORAN_BATCH_DIR"), inst_.working());
@@ -45,19 +47,14 @@ TEST_F(SuiteEnvironment, ConfigurationFillsTheTable) {
   std::string v;
   EXPECT_EQ(NVLR_UTILITY_GetEnvCode(v, "NO_SUCH_NAME"), -11);
   EXPECT_FALSE(NVLR_UTILITY_Catalog(VlrCatalog::Errors).empty());
-  EXPECT_TRUE(Exists(inst_.working() + "Process.log"));
-}
 
-TEST_F(SuiteEnvironment, ProcessVariablesOverrideAndStrayCharactersAreDropped) {
-  // A DOS line end behind a closing separator, and a plain no-data value.
   std::string ini = ReadFile(inst_.root() + "/Veloran_configuration.ini");
-  const size_t first = ini.find('\n');
-  ini.insert(first, "\r");
-  const size_t last = ini.rfind("NaN");
-  ini.replace(last, 3, "-9999.5");
+  ini.insert(ini.find('\n'), "\r");
+  ini.replace(ini.rfind("NaN"), 3, "-9999.5");
   WriteFile(inst_.root() + "/Veloran_configuration.ini", ini);
   setenv("VELORAN_BATCH_DIR", (inst_.root() + "/batch").c_str(), 1);
   setenv("VELORAN_GCP_DATABASE_DIR", "/gcp", 1);
+  NVLR_UTILITY_ResetForTesting();
   init();
   EXPECT_EQ(NVLR_UTILITY_EnvValue("VELORAN_KEY_FILES_DIR"), inst_.root() + "/keys/");
   EXPECT_EQ(NVLR_UTILITY_EnvValue("VELORAN_BATCH_DIR"), inst_.root() + "/batch/");
@@ -143,10 +140,8 @@ TEST_F(SuiteEnvironment, RecorderWritesErrorFileAndWorkingFile) {
   EXPECT_EQ(ReadFile(inst_.workingFile()), "-1\nExtracting\n" + body);
   NVLR_UTILITY_RecordError(vlr::kCodeWarnings, nullptr);
   EXPECT_EQ(ReadFile(inst_.workingFile()).substr(0, 14), "-2\nExtracting\n");
-}
-
-TEST_F(SuiteEnvironment, RecorderFallsBackToTmpFileWhenWorkingFileIsMissing) {
-  init();
+  // Without a working file the lines go beside it.
+  std::remove(inst_.workingFile().c_str());
   NVLR_UTILITY_RecordError(vlr::kCodeBatchWithdrawn, nullptr);
   EXPECT_FALSE(Exists(inst_.workingFile()));
   const std::string tmp = ReadFile(inst_.workingFile() + "_tmp");
@@ -154,36 +149,12 @@ TEST_F(SuiteEnvironment, RecorderFallsBackToTmpFileWhenWorkingFileIsMissing) {
   EXPECT_NE(tmp.find("BATCH RUN INTERRUPTED\n [EC : 326400]\n"), std::string::npos);
 }
 
-TEST_F(SuiteEnvironment, ProgressIsWrittenCappedAndKeepsTheMessage) {
+TEST_F(SuiteEnvironment, CorruptWorkingFileEndsWith326400) {
   init();
-  inst_.hostFiles(0, "Starting");
-  EXPECT_EQ(getAndSetPerc(0, 42, "Reading"), 1);
-  EXPECT_EQ(ReadFile(inst_.workingFile()), "42\nReading\n");
-  EXPECT_EQ(getAndSetPerc(42, 100, nullptr), 1);
-  EXPECT_EQ(ReadFile(inst_.workingFile()), "99\nReading\n");
-  // The bar forwards only changes of the whole percent.
-  WriteFile(inst_.workingFile(), "5\nkeep\n");
-  init_ckerr_locking();
-  waitbar_update(0, 42.3f);
-  WriteFile(inst_.workingFile(), "5\nkeep\n");
-  waitbar_update(0, 42.9f);
-  EXPECT_EQ(ReadFile(inst_.workingFile()), "5\nkeep\n");
-  waitbar_update(0, 150.0f);
-  EXPECT_EQ(ReadFile(inst_.workingFile()), "99\nkeep\n");
-  exit_ckerr();
-}
-
-TEST_F(SuiteEnvironment, WithdrawnRunOrCorruptWorkingFileEndsWith326400) {
-  init();
-  inst_.hostFiles(10, "Running");
-  std::remove((inst_.workingFile() + "_batch_ok").c_str());
-  EXPECT_EXIT(getAndSetPerc(10, 20, "x"), ::testing::ExitedWithCode(255), "");
-  EXPECT_NE(ReadFile(inst_.workingFile() + "_error").find("[EC : 326400]"), std::string::npos);
-  EXPECT_NE(ReadFile(inst_.working() + "Process.log").find("[ERROR ID : 326400]"),
-            std::string::npos);
   inst_.hostFiles(101, "Running");
   EXPECT_EXIT(getAndSetPerc(10, 20, "x"), ::testing::ExitedWithCode(255), "");
   EXPECT_EQ(ReadFile(inst_.workingFile()).substr(0, 3), "-1\n");
+  EXPECT_NE(ReadFile(inst_.workingFile() + "_error").find("[EC : 326400]"), std::string::npos);
 }
 
 TEST_F(SuiteEnvironment, FatalReportLevelRaisesItsCode) {
@@ -202,26 +173,11 @@ TEST_F(SuiteEnvironment, FatalReportLevelRaisesItsCode) {
   exit_ckerr();
 }
 
-TEST_F(SuiteEnvironment, SmallCodesAreTheirOwnExitStatus) {
-  init();
-  EXPECT_EXIT(NVLR_UTILITY_RaiseError(4, "m", 1, nullptr), ::testing::ExitedWithCode(4), "");
-  EXPECT_EXIT(NVLR_UTILITY_RaiseError(vlr::kCodeUnknownCommand, "m", 1, nullptr),
-              ::testing::ExitedWithCode(255), "");
+TEST(ExitStatus, SmallCodesAreTheirOwnExitStatus) {
   EXPECT_EQ(vlr::ExitStatusFor(0), 0);
   EXPECT_EQ(vlr::ExitStatusFor(255), 255);
   EXPECT_EQ(vlr::ExitStatusFor(65280), 255);
   EXPECT_EQ(vlr::ExitStatusFor(-3), 255);
-}
-
-TEST_F(SuiteEnvironment, SuccessfulEndDeletesTheWorkingFile) {
-  init();
-  inst_.hostFiles();
-  NVLR_UTILITY_WriteStart({"a"}, "Title", nullptr);
-  NVLR_UTILITY_EndProcess(0, 1, 1);
-  EXPECT_FALSE(Exists(inst_.workingFile()));
-  const std::string log = ReadFile(inst_.working() + "Process.log");
-  EXPECT_NE(log.find("\n\nSUCCESSFUL\n\n"), std::string::npos);
-  EXPECT_NE(log.find("\nEND :  Title  -  "), std::string::npos);
 }
 
 TEST_F(SuiteEnvironment, TraceIsArchivedOnlyAboveOneMillionBytes) {

@@ -7,10 +7,10 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cctype>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <regex>
 #include <sstream>
 #include <stdexcept>
 
@@ -38,29 +38,8 @@ void WriteFile(const std::string& path, const std::string& content) {
 }
 
 std::string MaskLocalTimes(const std::string& text) {
-  // 'a' a letter, '9' a digit, anything else itself.
-  static const std::string kShape = "aaa aaa 99 99:99:99 9999";
-  auto matches = [&](size_t at) {
-    if (at + kShape.size() > text.size()) return false;
-    for (size_t i = 0; i < kShape.size(); ++i) {
-      const char c = text[at + i];
-      const bool ok = kShape[i] == 'a'   ? std::isalpha(static_cast<unsigned char>(c)) != 0
-                      : kShape[i] == '9' ? std::isdigit(static_cast<unsigned char>(c)) != 0
-                                         : c == kShape[i];
-      if (!ok) return false;
-    }
-    return true;
-  };
-  std::string out;
-  for (size_t i = 0; i < text.size();) {
-    if (matches(i)) {
-      out += "<TIME>";
-      i += kShape.size();
-    } else {
-      out += text[i++];
-    }
-  }
-  return out;
+  static const std::regex kLocalTime(R"([A-Za-z]{3} [A-Za-z]{3} \d\d \d\d:\d\d:\d\d \d{4})");
+  return std::regex_replace(text, kLocalTime, "<TIME>");
 }
 
 bool Exists(const std::string& path) {

@@ -1,11 +1,14 @@
 // The host's side of a run of the tool: starting it with an argument list,
 // collecting what it left, checking the records a host reads, and reading a
 // ".sml" suite header with Python's own XML parser, never with the suite
-// library under test.
+// library under test.  HostRunTest is the fixture of the tests that run the
+// tool on generated products.
 #pragma once
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
@@ -17,6 +20,7 @@
 #include <vector>
 
 #include "installation.h"
+#include "synth_run.h"
 
 namespace vlr_test {
 
@@ -62,6 +66,14 @@ inline SmlFields ReadSml(const std::string& sml, const char* wanted) {
 inline std::string Field(const SmlFields& f, const std::string& name) {
   const auto it = f.find(name);
   return it == f.end() ? std::string() : it->second;
+}
+
+// Element `element` of a numeric field ('|'-joined vector); NaN when absent.
+inline double Number(const SmlFields& f, const std::string& name, size_t element = 0) {
+  std::string text = Field(f, name);
+  for (size_t i = 0; i < element; ++i)
+    text = text.substr(std::min(text.size(), text.find('|') + 1));
+  return text.empty() ? std::nan("") : std::atof(text.c_str());
 }
 
 // What one run of the tool left for the host.
@@ -136,5 +148,98 @@ inline std::set<std::string> FolderNames(const std::string& dir) {
     names.insert(e.path().filename().string());
   return names;
 }
+
+// Every file of a folder, by name, with its bytes.
+inline std::map<std::string, std::string> FolderFiles(const std::string& dir) {
+  std::map<std::string, std::string> files;
+  for (const std::string& name : FolderNames(dir)) files[name] = ReadFile(dir + "/" + name);
+  return files;
+}
+
+inline bool HaveGdal() {
+  return synth_test::shell("command -v gdal_translate > /dev/null 2>&1") == 0;
+}
+
+// A value of the generator's truth file, "<missing KEY>" when absent.
+inline std::string Truth(const synth_test::SynthRun& run, const std::string& section,
+                         const std::string& key) {
+  const auto s = run.truth.find(section);
+  if (s == run.truth.end() || s->second.count(key) == 0) return "<missing " + key + ">";
+  return s->second.at(key);
+}
+inline double TruthNumber(const synth_test::SynthRun& run, const std::string& section,
+                          const std::string& key) {
+  return synth_test::truth_number(run.truth, section, key);
+}
+inline std::string SubSwath(int k) {
+  return "SubSwath" + std::to_string(k);
+}
+
+// Tests that run the tool on generated products: one installation, one
+// scratch folder and the products of each generator argument text, made on
+// first use and removed when the test program ends.
+class HostRunTest : public ::testing::Test {
+ protected:
+  static TempInstallation& inst() { return state().inst; }
+  // A new empty folder under the scratch folder; ends with '/'.
+  static std::string folder(const std::string& name) {
+    const std::string path = state().scratch + name + "/";
+    std::filesystem::create_directories(path);
+    return path;
+  }
+  static std::string desFolder() { return inst().root() + "/des/"; }
+  // The generator's products for `args`; a test fails when they cannot be made.
+  static const synth_test::SynthRun& scene(const std::string& args) {
+    auto& scenes = state().scenes;
+    auto it = scenes.find(args);
+    if (it == scenes.end()) it = scenes.emplace(args, synth_test::run_synth(args)).first;
+    EXPECT_EQ(it->second.exit_code, 0) << args;
+    return it->second;
+  }
+  static std::string orbitOf(const synth_test::SynthRun& run) {
+    return run.dir + Truth(run, "Scene", "OrbitFile");
+  }
+  // Puts the generator's auxiliary list and files where the tool looks.
+  static void useAuxiliaryListOf(const synth_test::SynthRun& run) {
+    ASSERT_EQ(synth_test::shell("cp " + run.dir + "ASA_AUX_list.dat " + run.dir + "ASA_XCA_* " +
+                                run.dir + "ASA_INS_* " + desFolder()),
+              0);
+  }
+  // The installation's multilook parameter file with the given keys set to
+  // new values; an empty value removes the key.
+  static void parameters(const std::map<std::string, std::string>& edits) {
+    std::istringstream in(ReadFile(SourceDir() + "/data/install/parameters_multilook.hdr"));
+    std::string out;
+    for (std::string line; std::getline(in, line);) {
+      const std::string key = line.substr(0, line.find(' '));
+      const auto edit = edits.find(key);
+      if (edit == edits.end())
+        out += line + "\n";
+      else if (!edit->second.empty())
+        out += key + " = " + edit->second + "\n";
+    }
+    WriteFile(desFolder() + "parameters_multilook.hdr", out);
+  }
+
+ private:
+  struct State {
+    TempInstallation inst;
+    std::string scratch;
+    std::map<std::string, synth_test::SynthRun> scenes;
+    State() {
+      char pattern[] = "/tmp/vlr_host_run_XXXXXX";
+      if (mkdtemp(pattern) != nullptr) scratch = std::string(pattern) + "/";
+    }
+    ~State() {
+      for (const auto& s : scenes) synth_test::remove_run(s.second);
+      std::error_code ec;
+      if (!scratch.empty()) std::filesystem::remove_all(scratch, ec);
+    }
+  };
+  static State& state() {
+    static State s;
+    return s;
+  }
+};
 
 }  // namespace vlr_test
