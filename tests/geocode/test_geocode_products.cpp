@@ -123,27 +123,15 @@ class GeocodeProducts : public MultilookTest {
   Geocoded geocode(const Imported& p, const std::string& name, bool ground,
                    GeocodeOptions options = {}) {
     Geocoded g;
-    mlook_conf conf;
-    installedConfiguration(&conf);
-    conf.Sl2Gr = ground ? 1 : 0;
-    mlook_input input;
-    mlook_output output;
-    std::snprintf(input.Level1Filename, kMlookNameSize, "%s", p.root.c_str());
-    std::snprintf(input.ASA_XCA_Filename, kMlookNameSize, "%s", xca(p).c_str());
-    const std::string image = work(name);
-    std::snprintf(output.OutputFilename, kMlookNameSize, "%s", image.c_str());
     g.orbit = std::make_unique<GeneralSAROrbit>();
-    {
-      mlook ml(&conf, &input, &output);
-      g.code = ml.readimages_kestova();
-      if (g.code == 0) g.code = ml.run();
-      if (g.code == 0) g.code = ml.radarGrid(&g.grid);
-      if (g.code == 0) g.code = ml.orbit()->clone(g.orbit.get());
-      ml.freeimages();
-    }
+    const Output o = multilook(p, name, ground, nullptr, [&](mlook& ml) {
+      ASSERT_EQ(ml.radarGrid(&g.grid), 0);
+      ASSERT_EQ(ml.orbit()->clone(g.orbit.get()), 0);
+    });
+    g.code = o.code;
     if (g.code != 0) return g;
     g.path = work(name + "_geo.tif");
-    g.code = GeocodeMultilook(image.c_str(), g.grid, *g.orbit, options, conf.GrSamplingStep,
+    g.code = GeocodeMultilook(o.name.c_str(), g.grid, *g.orbit, options, kGroundStep,
                               g.path.c_str(), &g.message, &g.map);
     if (g.code == 0) g.image = ReadMap(g.path);
     return g;
@@ -164,21 +152,7 @@ class GeocodeProducts : public MultilookTest {
         if (std::isnan(a)) return NAN;
         profile[static_cast<size_t>(s + kReach)] += a * a;
       }
-    double low = 0.0, high = 0.0;
-    for (int s = 12; s <= kReach; ++s) {
-      low += profile[static_cast<size_t>(kReach - s)];
-      high += profile[static_cast<size_t>(kReach + s)];
-    }
-    const double level = std::pow(0.5 * (std::sqrt(low) + std::sqrt(high)), 2) / (kReach - 11);
-    double best = NAN;
-    for (int s = -12; s < 12; ++s) {
-      const double a = profile[static_cast<size_t>(s + kReach)] - level;
-      const double b = profile[static_cast<size_t>(s + kReach + 1)] - level;
-      if (a * b > 0.0 || a == b) continue;
-      const double x = 0.25 * (s + a / (a - b));
-      if (std::isnan(best) || std::fabs(x) < std::fabs(best)) best = x;
-    }
-    return best;
+    return 0.25 * (Crossing(profile, kReach, 12, kReach) - kReach);
   }
 
   // Every cell edge of the checkerboard that lies within the image, away

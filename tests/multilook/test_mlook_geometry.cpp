@@ -17,30 +17,6 @@ double Db(double x) {
   return 10.0 * std::log10(x);
 }
 
-// Where a profile of powers crosses the power of the mean amplitude of its
-// levels on either side of the expected step at e (inner..outer samples
-// away): the middle of a band-limited step in amplitude.  NaN when it does
-// not cross within `inner` of e.
-double Crossing(const std::vector<double>& profile, double e, int inner, int outer) {
-  const int c = static_cast<int>(std::lround(e));
-  double left = 0.0, right = 0.0;
-  for (int i = inner; i <= outer; ++i) {
-    left += profile[static_cast<size_t>(c - i)];
-    right += profile[static_cast<size_t>(c + i)];
-  }
-  const double amplitude = 0.5 * (std::sqrt(left) + std::sqrt(right));
-  const double level = amplitude * amplitude / (outer - inner + 1);
-  double best = NAN;
-  for (int i = c - inner; i < c + inner; ++i) {
-    const double a = profile[static_cast<size_t>(i)] - level;
-    const double b = profile[static_cast<size_t>(i) + 1] - level;
-    if (a * b > 0.0 || a == b) continue;
-    const double x = i + a / (a - b);
-    if (std::isnan(best) || std::fabs(x - e) < std::fabs(best - e)) best = x;
-  }
-  return best;
-}
-
 class MultilookGeometry : public MultilookTest {
  protected:
   // The checkerboard's cell edges in range (per row of cells) and azimuth

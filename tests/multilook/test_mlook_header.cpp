@@ -3,21 +3,13 @@
 #include <cmath>
 
 #include "mlook_fixture.h"
+#include "truth_math.h"
 
 namespace mlook_test {
 namespace {
 
 constexpr const char* kScene = "--size small --pattern uniform --band-limit --seed 5";
 constexpr double kDegToRad = M_PI / 180.0;
-
-synth::Vec3 Ecef(double latDeg, double lonDeg) {
-  const double a = synth::kWgsA, b = synth::kWgsB;
-  const double e2 = 1.0 - b * b / (a * a);
-  const double lat = latDeg * kDegToRad, lon = lonDeg * kDegToRad;
-  const double n = a / std::sqrt(1.0 - e2 * std::sin(lat) * std::sin(lat));
-  return {n * std::cos(lat) * std::cos(lon), n * std::cos(lat) * std::sin(lon),
-          n * (1.0 - e2) * std::sin(lat)};
-}
 
 // The values of the first element named `field` of a ".sml" file, read by
 // python's own XML parser.
@@ -75,10 +67,11 @@ class MultilookHeader : public MultilookTest {
                    {h.geoCoords.SouthEast, "SphLastNear"},
                    {h.geoCoords.SouthWest, "SphLastFar"}};
     for (const auto& c : corners) {
-      const synth::Vec3 truth = Ecef(p.number("Scene", std::string(c.truth) + "Lat"),
-                                     p.number("Scene", std::string(c.truth) + "Lon"));
-      const synth::Vec3 got = Ecef(c.point.latitude, c.point.longitude);
-      EXPECT_LE(synth::norm(got - truth), tolerance) << c.truth;
+      EXPECT_LE(truth::SurfaceDistance(c.point.latitude, c.point.longitude,
+                                       p.number("Scene", std::string(c.truth) + "Lat"),
+                                       p.number("Scene", std::string(c.truth) + "Lon")),
+                tolerance)
+          << c.truth;
     }
     // The suite header after conversion.
     const std::string suite = o.name + "_hdr";
