@@ -126,12 +126,6 @@ class MultilookInputs : public MultilookTest {
     }
     return work(root);
   }
-  Output runOn(const Imported& p, const std::string& root, const std::string& name) {
-    Imported copy;
-    copy.run = p.run;
-    copy.root = root;
-    return multilook(copy, name, false);
-  }
 };
 
 // A burst range beyond the shortest sub-swath and a missing sub-swath are
@@ -149,7 +143,7 @@ TEST_F(MultilookInputs, ImpossibleBurstRangeOrMissingSwathIsRefused) {
       std::string::npos);
   const std::string root = copyImport(p, "M");
   ASSERT_EQ(std::remove((root + "3_slc").c_str()), 0);
-  EXPECT_NE(runOn(p, root, "M_pwr").code, 0);
+  EXPECT_NE(multilook(Imported{p.run, root}, "M_pwr", false).code, 0);
 }
 
 TEST_F(MultilookInputs, BurstSelectionSetsTheOutputSpan) {
@@ -197,7 +191,7 @@ TEST_F(MultilookInputs, BurstTimesFollowTheBurstStructure) {
   ASSERT_NE(f, nullptr);
   ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
   std::fclose(f);
-  const Output damaged = runOn(p, root, "T_pwr");
+  const Output damaged = multilook(Imported{p.run, root}, "T_pwr", false);
   const Output intact = multilook(p, "I_pwr", false);
   ASSERT_EQ(damaged.code, 0);
   ASSERT_EQ(intact.code, 0);
