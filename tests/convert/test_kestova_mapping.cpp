@@ -97,6 +97,11 @@ TEST_F(Conversion, SubSwathHeaderHoldsEveryMappedValue) {
   EXPECT_NEAR(D(h, "RgFilterCoeff"), value(s, "RangeWindowCoefficient"), 1e-6);
   EXPECT_NEAR(D(h, "AzWinCoeff"), value(s, "AzimuthWindowCoefficient"), 1e-6);
   EXPECT_EQ(D(h, "RO_REF"), lib->dataSetInfo.RO_REF);
+  // The sub-swath's elevation pattern table, whole.
+  ASSERT_GT(lib->antenna.PatternSamples, 2);
+  EXPECT_EQ(I(h, "EnvisatTwoWayAntennaElevationPatternTableNbr"), lib->antenna.PatternSamples);
+  EXPECT_EQ(F(h, "EnvisatTwoWayAntennaElevationPatternTable")->columns(),
+            lib->antenna.PatternSamples);
 
   // Raster layout of the extracted raster.
   EXPECT_EQ(S(h, "CellType"), "FLOAT_COMPLEX");
