@@ -67,6 +67,8 @@ class MultilookGeometry : public MultilookTest {
     const double rgCell = p.number("Pattern", "RgCell");
     const double contrast = Db(p.number("Pattern", "High") / p.number("Pattern", "Low"));
     const double width = p.swath(4, "FarRangeTime") - p.swath(0, "NearRangeTime");
+    // The image ends at the far range of the last sub-swath.
+    EXPECT_NEAR(im.samples - 1, grid.column(width), 1.0);
     ExpectCheckerboardEdges(p, im, [&](double daz, double drg) {
       return std::array<double, 2>{grid.column(drg), grid.line(daz)};
     });
