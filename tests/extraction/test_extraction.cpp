@@ -5,6 +5,7 @@
 // rasters and headers, and the metadata against the values the generator
 // wrote and the geometry it computed by itself.
 #include <cmath>
+#include <cstdio>
 #include <cstring>
 #include <string>
 #include <vector>
@@ -303,5 +304,41 @@ INSTANTIATE_TEST_SUITE_P(
         Kind{"--product APS --seed 4 --orbit kepler --pass ascending --polarisation VV "
              "--blank-start 3 --blank-end 9",
              2, kAps}));
+
+// Antenna pattern records that do not fit their sub-swath (one naming
+// another beam, one with a gain that is not a number) are left out of its
+// header; the other sub-swaths keep theirs and the run succeeds.
+TEST(DamagedAntennaPatterns, RecordsThatDoNotFitAreLeftOut) {
+  const SynthRun run = synth_test::run_synth("--seed 3");
+  ASSERT_EQ(run.exit_code, 0);
+  const std::vector<uint8_t> original = synth_test::read_file(run.product);
+  std::string bytes(original.begin(), original.end());
+  const size_t dsd = bytes.find("DS_NAME=\"MDS1 ANTENNA ELEV PATT ADS");
+  ASSERT_NE(dsd, std::string::npos);
+  const size_t offset = std::stoull(bytes.substr(bytes.find("DS_OFFSET=", dsd) + 10, 21));
+  constexpr size_t kRecord = 162, kBeam = 13, kFirstGain = 104;
+  bytes.replace(offset + kRecord + kBeam, 3, "SS3");
+  const char quietNaN[4] = {0x7f, static_cast<char>(0xc0), 0, 0};
+  bytes.replace(offset + 3 * kRecord + kFirstGain + 8, 4, quietNaN, 4);
+  std::FILE* f = std::fopen(run.product.c_str(), "wb");
+  ASSERT_NE(f, nullptr);
+  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
+  ASSERT_EQ(std::fclose(f), 0);
+
+  images_conf conf;
+  images ex(conf);
+  ASSERT_EQ(Extract(run, conf, &ex), 0);
+  for (int k = 1; k <= 5; ++k) {
+    SCOPED_TRACE(k);
+    const std::string hdr = run.dir + "R" + std::to_string(k) + ".hdr";
+    AntennaPattern_Obj none;
+    if (k == 2 || k == 4)
+      EXPECT_NE(none.readhdr(hdr.c_str()), 0);
+    else
+      ExpectElevationPattern(run, "SubSwath" + std::to_string(k), hdr,
+                             "ReferenceAngleSS" + std::to_string(k));
+  }
+  synth_test::remove_run(run);
+}
 
 }  // namespace

@@ -5,7 +5,6 @@
 #include <vector>
 
 #include "extraction_fixture.h"
-#include "metadata_sections/antenna_pattern.h"
 #include "metadata_sections/data_set_info.h"
 #include "metadata_sections/poly_sar.h"
 #include "profile/profile.h"
@@ -54,37 +53,6 @@ TEST(BadProducts, RefusedWithACodeAndNoOutputLeft) {
     }
     synth_test::remove_run(run);
   }
-}
-
-// Antenna pattern records that do not fit their sub-swath (one naming
-// another beam, one with a gain that is not a number) are left out of its
-// header; the other sub-swaths keep theirs and the run succeeds.
-TEST(BadProducts, AntennaPatternRecordsThatDoNotFitAreLeftOut) {
-  const SynthRun run = synth_test::run_synth("--seed 3");
-  ASSERT_EQ(run.exit_code, 0);
-  const std::vector<uint8_t> original = synth_test::read_file(run.product);
-  std::string bytes(original.begin(), original.end());
-  const size_t dsd = bytes.find("DS_NAME=\"MDS1 ANTENNA ELEV PATT ADS");
-  ASSERT_NE(dsd, std::string::npos);
-  const size_t offset = std::stoull(bytes.substr(bytes.find("DS_OFFSET=", dsd) + 10, 21));
-  constexpr size_t kRecord = 162, kBeam = 13, kFirstGain = 104;
-  bytes.replace(offset + kRecord + kBeam, 3, "SS3");
-  const char quietNaN[4] = {0x7f, static_cast<char>(0xc0), 0, 0};
-  bytes.replace(offset + 3 * kRecord + kFirstGain + 8, 4, quietNaN, 4);
-  std::FILE* f = std::fopen(run.product.c_str(), "wb");
-  ASSERT_NE(f, nullptr);
-  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
-  ASSERT_EQ(std::fclose(f), 0);
-
-  images_conf conf;
-  images ex(conf);
-  ASSERT_EQ(Extract(run, conf, &ex), 0);
-  for (int k = 1; k <= 5; ++k) {
-    AntennaPattern_Obj pattern;
-    const std::string hdr = run.dir + "R" + std::to_string(k) + ".hdr";
-    EXPECT_EQ(pattern.readhdr(hdr.c_str()) == 0, k != 2 && k != 4) << k;
-  }
-  synth_test::remove_run(run);
 }
 
 // Annotation that is only warned about: without Doppler records the
