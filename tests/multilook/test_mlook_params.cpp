@@ -210,8 +210,7 @@ TEST_F(MultilookInputs, AntennaCorrectionFollowsTheElevationPattern) {
   const ROI_Obj& roi = plain.header->roi.roi;
   const double rate = plain.header->sampling.frg_hz;
   for (int k = 0; k < kMlookSwaths; ++k) {
-    const int slot = k == 0 ? 7 : k + 1;
-    const double c = 0.75 + 0.05 * slot;
+    const double c = 0.75 + 0.05 * p.swath(k, "XcaSlot");  // the generator's pattern
     const double reference = p.number("Calibration", "ReferenceAngleSS" + std::to_string(k + 1));
     // Three columns inside the swath, away from the seams.
     for (double f : {0.25, 0.5, 0.75}) {
