@@ -23,7 +23,7 @@
 #include "suite/description_header.h"
 #include "suite_fixture.h"
 #include "synth_run.h"
-#include "time/date_text.h"
+#include "truth_math.h"
 
 namespace convert_test {
 
@@ -131,16 +131,6 @@ inline std::string OtherInfoValue(CDescriptionHeader& h, const std::string& key)
     if (row.first == key) return row.second;
   }
   return "<missing>";
-}
-inline double Sec85(const std::string& text) {
-  double t = -1.0;
-  EXPECT_TRUE(parse_sec85(text.c_str(), &t)) << text;
-  return t;
-}
-inline std::string DateText(double t) {
-  char buffer[kSec85TextSize] = {};
-  sec852ascii(t, buffer);
-  return buffer;
 }
 
 }  // namespace convert_test
