@@ -108,41 +108,69 @@ bool CogWriter::create(const std::string& target, const MapGrid& map, float noDa
   return true;
 }
 
-bool CogWriter::write(int x, int y, int columns, int rows, const float* values) {
-  if (work_ == nullptr) return false;
+void CogWriter::reduce(int columns, int rows, const float* values, OverviewBlock* block) const {
+  const size_t levels = factors_.size();
+  block->levels.resize(levels);
+  block->columns.assign(levels, 0);
+  block->rows.assign(levels, 0);
+  // Sums and counts of the level below: the block itself at first.
+  int below = 0, belowColumns = columns, belowRows = rows;
+  for (size_t level = 0; level < levels; ++level) {
+    const int oc = (belowColumns + 1) / 2, orows = (belowRows + 1) / 2;
+    const int to = static_cast<int>(level % 2);
+    std::vector<double>& sum = block->sum[to];
+    std::vector<int>& count = block->count[to];
+    sum.assign(static_cast<size_t>(oc) * orows, 0.0);
+    count.assign(sum.size(), 0);
+    for (int r = 0; r < belowRows; ++r) {
+      double* s = &sum[static_cast<size_t>(r / 2) * oc];
+      int* n = &count[static_cast<size_t>(r / 2) * oc];
+      if (level == 0) {
+        const float* row = values + static_cast<size_t>(r) * columns;
+        for (int c = 0; c < belowColumns; ++c)
+          if (row[c] != noData_ && !std::isnan(row[c])) {
+            s[c / 2] += row[c];
+            ++n[c / 2];
+          }
+      } else {
+        const double* rs = &block->sum[below][static_cast<size_t>(r) * belowColumns];
+        const int* rn = &block->count[below][static_cast<size_t>(r) * belowColumns];
+        for (int c = 0; c < belowColumns; ++c) {
+          s[c / 2] += rs[c];
+          n[c / 2] += rn[c];
+        }
+      }
+    }
+    std::vector<float>& mean = block->levels[level];
+    mean.assign(sum.size(), noData_);
+    for (size_t k = 0; k < sum.size(); ++k)
+      if (count[k] > 0) mean[k] = static_cast<float>(sum[k] / count[k]);
+    block->columns[level] = oc;
+    block->rows[level] = orows;
+    below = to;
+    belowColumns = oc;
+    belowRows = orows;
+  }
+}
+
+bool CogWriter::write(int x, int y, int columns, int rows, const float* values,
+                      const OverviewBlock& block) {
+  if (work_ == nullptr || block.levels.size() != factors_.size()) return false;
   GDALRasterBand* band = work_->GetRasterBand(1);
   if (band->RasterIO(GF_Write, x, y, columns, rows, const_cast<float*>(values), columns, rows,
                      GDT_Float32, 0, 0, nullptr) != CE_None)
     return false;
   for (size_t level = 0; level < factors_.size(); ++level) {
-    // Each overview pixel is the mean of the valid pixels it covers, NoData
-    // where it covers none.
     const int f = factors_[level];
     GDALRasterBand* overview = band->GetOverview(static_cast<int>(level));
     if (overview == nullptr || x % f != 0 || y % f != 0) return false;
-    const int ox = x / f, oy = y / f;
-    const int oc = std::min((columns + f - 1) / f, overview->GetXSize() - ox);
-    const int orows = std::min((rows + f - 1) / f, overview->GetYSize() - oy);
+    const int ox = x / f, oy = y / f, width = block.columns[level];
+    const int oc = std::min(width, overview->GetXSize() - ox);
+    const int orows = std::min(block.rows[level], overview->GetYSize() - oy);
     if (oc <= 0 || orows <= 0) continue;
-    reduced_.assign(static_cast<size_t>(oc) * orows, noData_);
-    for (int j = 0; j < orows; ++j) {
-      for (int i = 0; i < oc; ++i) {
-        double sum = 0.0;
-        int count = 0;
-        for (int r = j * f; r < std::min(rows, (j + 1) * f); ++r) {
-          const float* row = values + static_cast<size_t>(r) * columns;
-          for (int c = i * f; c < std::min(columns, (i + 1) * f); ++c) {
-            if (row[c] != noData_ && !std::isnan(row[c])) {
-              sum += row[c];
-              ++count;
-            }
-          }
-        }
-        if (count > 0) reduced_[static_cast<size_t>(j) * oc + i] = static_cast<float>(sum / count);
-      }
-    }
-    if (overview->RasterIO(GF_Write, ox, oy, oc, orows, reduced_.data(), oc, orows, GDT_Float32, 0,
-                           0, nullptr) != CE_None)
+    if (overview->RasterIO(GF_Write, ox, oy, oc, orows,
+                           const_cast<float*>(block.levels[level].data()), oc, orows, GDT_Float32,
+                           0, static_cast<GSpacing>(width) * sizeof(float), nullptr) != CE_None)
       return false;
   }
   return true;

@@ -83,10 +83,11 @@ struct Lattice {
   size_t at(int i, int j) const { return static_cast<size_t>(i) * columns + j; }
 };
 
-// One thread's image window and tile.
+// One thread's image window, tile and the tile's overview averages.
 struct Worker {
   std::vector<float> window;
   std::vector<float> tile;
+  OverviewBlock overviews;
   bool failed = false;
 };
 
@@ -170,24 +171,30 @@ class Geocoder {
       const double fr = (r + 0.0) / kLookupStep - lattice.rowBase;
       const int i = std::min(static_cast<int>(fr), lattice.rows - 2);
       const double u = fr - i;
-      float* out = &w.tile[static_cast<size_t>(r - tileRow0) * tileWidth];
-      for (int c = c0; c < c1; ++c) {
-        const double fc = (c + 0.0) / kLookupStep;
-        const int j = std::min(static_cast<int>(fc), lattice.columns - 2);
-        const double v = fc - j;
-        const size_t a = lattice.at(i, j), b = a + 1, d = lattice.at(i + 1, j), e = d + 1;
-        if (std::isnan(lattice.line[a] + lattice.line[b] + lattice.line[d] + lattice.line[e])) {
+      float* out = &w.tile[static_cast<size_t>(r - tileRow0) * tileWidth] - tileColumn0;
+      // One run of columns per lattice cell: its four nodes are read once.
+      for (int c = c0; c < c1;) {
+        const int j = std::min(c / kLookupStep, lattice.columns - 2);
+        const int end = j == lattice.columns - 2 ? c1 : std::min(c1, (j + 1) * kLookupStep);
+        const size_t a = lattice.at(i, j), d = lattice.at(i + 1, j);
+        const double la = lattice.line[a], lb = lattice.line[a + 1], ld = lattice.line[d],
+                     le = lattice.line[d + 1];
+        const double ca = lattice.column[a], cb = lattice.column[a + 1], cd = lattice.column[d],
+                     ce = lattice.column[d + 1];
+        if (std::isnan(la + lb + ld + le)) {
           // A node the orbit does not see lies far beyond the image in
           // azimuth (the orbit reaches a fifth of the scene, and at least
           // ten seconds, past either end): so does its cell.
-          out[c - tileColumn0] = kGeocodeNoData;
+          std::fill(out + c, out + end, kGeocodeNoData);
+          c = end;
           continue;
         }
-        const double line = (1 - u) * ((1 - v) * lattice.line[a] + v * lattice.line[b]) +
-                            u * ((1 - v) * lattice.line[d] + v * lattice.line[e]);
-        const double column = (1 - u) * ((1 - v) * lattice.column[a] + v * lattice.column[b]) +
-                              u * ((1 - v) * lattice.column[d] + v * lattice.column[e]);
-        out[c - tileColumn0] = sample(w.window.data(), wl0, wl1, wc0, wc1, ww, line, column);
+        for (; c < end; ++c) {
+          const double v = (c + 0.0) / kLookupStep - j;
+          const double line = (1 - u) * ((1 - v) * la + v * lb) + u * ((1 - v) * ld + v * le);
+          const double column = (1 - u) * ((1 - v) * ca + v * cb) + u * ((1 - v) * cd + v * ce);
+          out[c] = sample(w.window.data(), wl0, wl1, wc0, wc1, ww, line, column);
+        }
       }
     }
     return true;
@@ -266,49 +273,50 @@ int GeocodeImage(const char* image, const MlookRadarGrid& grid, const GeneralSAR
     VLR_FAIL(message->c_str(), vlr::kLibWrite);
 
   Geocoder geocoder(grid, file);
-  Lattice lattice;
-  lattice.columns = (map.width - 1) / kLookupStep + 2;
-  std::mutex writing;
-  bool readFailed = false, writeFailed = false;
-  int valid = 0, exact = 0, percent = -1;
-  for (int band = 0; band < map.height; band += kTile) {
-    // Progress for the host, which may also withdraw the run here.
-    const int now = static_cast<int>(int64_t{100} * band / map.height);
-    getAndSetPerc(percent, now, kProgressTitle);
-    percent = now;
+  // Two lattices: the calling thread solves the next band's nodes while the
+  // other thread resamples the tiles of the current band.
+  Lattice lattices[2];
+  int exact = 0;
+  auto solveBand = [&](Lattice& lattice, int band) {
     const int bandEnd = std::min(map.height, band + kTile);
+    lattice.columns = (map.width - 1) / kLookupStep + 2;
     lattice.rowBase = band / kLookupStep;
     lattice.rows = (bandEnd - 1) / kLookupStep + 2 - lattice.rowBase;
     lattice.line.assign(static_cast<size_t>(lattice.rows) * lattice.columns, NAN);
     lattice.column.assign(lattice.line.size(), NAN);
     exact += Geocoder::solveNodes(solver, lattice);
+  };
+  std::mutex writing;
+  bool readFailed = false, writeFailed = false;
+  int valid = 0, percent = -1;
+  solveBand(lattices[0], 0);
+  for (int band = 0, current = 0; band < map.height; band += kTile, current ^= 1) {
+    // Progress for the host, which may also withdraw the run here.
+    const int now = static_cast<int>(int64_t{100} * band / map.height);
+    getAndSetPerc(percent, now, kProgressTitle);
+    percent = now;
+    const int bandEnd = std::min(map.height, band + kTile);
+    const Lattice& lattice = lattices[current];
     std::atomic<int> next{0};
     const int tiles = (map.width + kTile - 1) / kTile;
     OnTwoThreads([&](int t) {
+      // t == 1 runs on the calling thread, the only one the orbit may use.
+      if (t == 1 && bandEnd < map.height) solveBand(lattices[current ^ 1], bandEnd);
       Worker& w = *workers[t];
       for (int k = next++; k < tiles; k = next++) {
         const int c0 = k * kTile, c1 = std::min(map.width, c0 + kTile);
-        if (!geocoder.resample(w, lattice, band, bandEnd, c0, c1, band, c0, kTile)) {
+        // The tile's rows one after another, as GDAL wants them.
+        if (!geocoder.resample(w, lattice, band, bandEnd, c0, c1, band, c0, c1 - c0)) {
           w.failed = true;
           return;
         }
-        int count = 0;
-        for (int r = 0; r < bandEnd - band; ++r)
-          for (int c = 0; c < c1 - c0; ++c)
-            if (w.tile[static_cast<size_t>(r) * kTile + c] != kGeocodeNoData) ++count;
-        // Rows of the tile one after another, as GDAL wants them.
-        std::vector<float> packed;
-        const float* values = w.tile.data();
-        if (c1 - c0 != kTile) {
-          packed.resize(static_cast<size_t>(bandEnd - band) * (c1 - c0));
-          for (int r = 0; r < bandEnd - band; ++r)
-            std::copy_n(&w.tile[static_cast<size_t>(r) * kTile], c1 - c0,
-                        &packed[static_cast<size_t>(r) * (c1 - c0)]);
-          values = packed.data();
-        }
+        const size_t size = static_cast<size_t>(bandEnd - band) * (c1 - c0);
+        const int count = static_cast<int>(
+            size - std::count(w.tile.begin(), w.tile.begin() + size, kGeocodeNoData));
+        writer.reduce(c1 - c0, bandEnd - band, w.tile.data(), &w.overviews);
         std::lock_guard<std::mutex> lock(writing);
         valid += count;
-        if (!writer.write(c0, band, c1 - c0, bandEnd - band, values)) {
+        if (!writer.write(c0, band, c1 - c0, bandEnd - band, w.tile.data(), w.overviews)) {
           writeFailed = true;
           return;
         }

@@ -9,10 +9,10 @@
 // the mapping is smooth enough that this stays within a few thousandths of
 // an image pixel of the exact solution.
 //
-// The work goes by bands of map rows: the band's lattice nodes on the
-// calling thread, then its tiles on two threads; each tile reads only the
-// window of image lines and columns it needs, so memory does not grow with
-// the length of the product.
+// The work goes by bands of map rows, their tiles on two threads; the
+// calling thread solves the next band's lattice nodes before it joins in.
+// Each tile reads only the window of image lines and columns it needs, so
+// memory does not grow with the length of the product.
 #pragma once
 
 #include <string>
