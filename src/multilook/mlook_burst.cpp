@@ -29,8 +29,11 @@ constexpr int kTaperEntries = 101;
 constexpr double kPi = 3.14159265358979323846;
 constexpr int kTempBufferBytes = 1 << 20;
 constexpr int kThreads = 2;
-// Burst lines a thread reads and processes at a time.
-constexpr int kChunkLines = 4;
+// Burst lines a thread reads and processes at a time: one, so that the
+// threads finish a burst together (a burst has a few dozen lines).
+constexpr int kChunkLines = 1;
+// Samples whose Doppler shift a thread evaluates at a time.
+constexpr int kShiftChunk = 512;
 
 struct CosineTable {
   float value[kTaperEntries];
@@ -55,14 +58,19 @@ const P& PlainSet(const std::vector<P>& family, double az) {
 // in between are interpolated (the Doppler term varies smoothly in range).
 constexpr int kWeightStride = 32;
 
+class RawFile;
+
 // What the lines of every burst of a sub-swath share: the raster layout,
 // the transforms, the gains, the look sub-bands and the azimuth weighting.
 struct SwathLines {
+  const RawFile* raster;
   int64_t lineLength;  // bytes per raw line
-  int firstByte;       // prefix and skipped samples
+  int64_t firstByte;   // of the used samples in raster line 0
   int cellType;
   bool swap;
-  int samples;  // samples used per line
+  bool native;                       // raw samples are the transforms' own
+  unsigned char* rawLine[kThreads];  // the used raw samples of one line
+  int samples;                       // samples used per line
   int fftLength;
   int lookLength;
   int looks;
@@ -84,11 +92,10 @@ struct SwathLines {
 
 // What changes from one burst to the next; shared read-only by the threads.
 struct BurstLines {
-  const unsigned char* raw;  // first raw line read
-  int firstRawLine;          // burst line of raw
-  const double* shift;       // Doppler centroid over rate per used sample, s
-  double shiftLo, shiftHi;   // their range
-  double firstLineTime;      // grid time of the burst's first line
+  int64_t firstLine;        // raster line of the burst's first line
+  const double* shift;      // Doppler centroid over rate per used sample, s
+  double shiftLo, shiftHi;  // their range
+  double firstLineTime;     // grid time of the burst's first line
   double centreTime;
   int firstRingLine;  // output line of the burst's first line
 };
@@ -113,6 +120,12 @@ class RawFile {
   bool open() {
     fd_ = ::open(name_, O_RDONLY);
     return fd_ >= 0;
+  }
+  // Asks the system to start reading n bytes at `offset` in the
+  // background; only a hint.
+  void prefetch(int64_t n, int64_t offset) const {
+    (void)posix_fadvise(fd_, static_cast<off_t>(offset), static_cast<off_t>(n),
+                        POSIX_FADV_WILLNEED);
   }
   // Reads exactly n bytes at `offset`.
   bool read(unsigned char* to, int64_t n, int64_t offset) const {
@@ -179,25 +192,35 @@ void CopyPeriodic(const fcomplex* from, int n, int first, int count, fcomplex* t
   }
 }
 
-// Processes line j of the burst; true when it went through the transforms.
-bool ProcessLine(const LineJob& job, int j, int thread) {
+enum LineResult { kSkipped, kTransformed, kReadFailed };
+
+// Processes line j of the burst.  Only the samples it uses are read, into
+// the transform line itself when they are stored as the transforms take
+// them.
+LineResult ProcessLine(const LineJob& job, int j, int thread) {
   const LineWeights weights = Classify(job, j);
-  if (weights == kAllZero) return false;
+  if (weights == kAllZero) return kSkipped;
   fcomplex* row = job.swath.block + static_cast<size_t>(j) * job.swath.fftLength;
   float* out =
       job.swath.ring + static_cast<size_t>((job.burst.firstRingLine + j) % job.swath.ringLines) *
                            job.swath.lookLength;
-  convert_samples(
-      job.burst.raw + (j - job.burst.firstRawLine) * job.swath.lineLength + job.swath.firstByte,
-      job.swath.cellType, job.swath.swap, row, CT_FLOAT_COMPLEX,
-      static_cast<size_t>(job.swath.samples));
+  const SwathLines& sl = job.swath;
+  const int64_t at = (job.burst.firstLine + j) * sl.lineLength + sl.firstByte;
+  const int64_t bytes = static_cast<int64_t>(sl.samples) * cell_type_size(sl.cellType);
+  if (sl.native) {
+    if (!sl.raster->read(reinterpret_cast<unsigned char*>(row), bytes, at)) return kReadFailed;
+  } else {
+    if (!sl.raster->read(sl.rawLine[thread], bytes, at)) return kReadFailed;
+    convert_samples(sl.rawLine[thread], sl.cellType, sl.swap, row, CT_FLOAT_COMPLEX,
+                    static_cast<size_t>(sl.samples));
+  }
   std::fill(row + job.swath.samples, row + job.swath.fftLength, fcomplex(0.0f, 0.0f));
   if (job.swath.gain != nullptr)
     for (int x = 0; x < job.swath.samples; ++x) row[x] *= job.swath.gain[x];
   if (weights == kPartly) WeightLine(job, j, row);
   if (job.swath.plain) {
     for (int x = 0; x < job.swath.samples; ++x) out[x] += std::norm(row[x]);
-    return false;
+    return kSkipped;
   }
   pfft_c(job.swath.forward, row, row);
   fcomplex* look = job.swath.lookBuffer[thread];
@@ -212,7 +235,7 @@ bool ProcessLine(const LineJob& job, int j, int thread) {
     pfft_c(job.swath.inverse, look, look);
     for (int x = 0; x < m; ++x) out[x] += std::norm(look[x]) * job.swath.scale;
   }
-  return true;
+  return kTransformed;
 }
 
 }  // namespace
@@ -271,14 +294,15 @@ int mlook::processswath(int k) {
 
   const DataFile& in = gs.datafile.data;
   const int64_t lineLength = in.line_length();
-  vlr::CkBuffer<unsigned char> raw;
+  vlr::CkBuffer<unsigned char> rawLine[kThreads];
   vlr::CkBuffer<fcomplex> block, lookBuffer[kThreads];
   vlr::CkBuffer<float> ring;
   vlr::CkBuffer<double> shift;
-  bool allocated = raw.allocate(static_cast<size_t>(lineLength) * L) &&
-                   block.allocate(static_cast<size_t>(nfft) * L) &&
+  const bool native = in.cell_type == CT_FLOAT_COMPLEX && in.byte_order == 0;
+  bool allocated = block.allocate(static_cast<size_t>(nfft) * L) &&
                    ring.allocate(static_cast<size_t>(m) * L) && shift.allocate(n);
   for (auto& b : lookBuffer) allocated = allocated && (plain || b.allocate(m));
+  for (auto& b : rawLine) allocated = allocated && (native || b.allocate(lineLength));
   if (!allocated) VLR_FAIL("Cannot allocate the burst buffers", vlr::kLibAlloc);
 
   DataFile& temp = output_->swath[k];
@@ -311,10 +335,13 @@ int mlook::processswath(int k) {
   };
 
   SwathLines lines{};
+  lines.raster = &raster;
   lines.lineLength = lineLength;
-  lines.firstByte = in.row_prefix + sw.skip * in.element_sizeof();
+  lines.firstByte = in.line_offset(0) + in.row_prefix + sw.skip * in.element_sizeof();
   lines.cellType = in.cell_type;
   lines.swap = in.byte_order != 0;
+  lines.native = native;
+  for (int t = 0; t < kThreads; ++t) lines.rawLine[t] = rawLine[t].data();
   lines.samples = n;
   lines.fftLength = nfft;
   lines.lookLength = m;
@@ -335,7 +362,6 @@ int mlook::processswath(int k) {
   lines.ring = ring.data();
   lines.ringLines = L;
   BurstLines burst{};
-  burst.raw = raw.data();
   burst.shift = shift.data();
   const LineJob job{lines, burst};
 
@@ -361,14 +387,21 @@ int mlook::processswath(int k) {
     const double centre = burst.centreTime;
     const poly& dc = PlainSet(gs.polys.dc, centre);
     const poly& fr = PlainSet(gs.polys.fr, centre);
-    for (int x = 0; x < n; ++x) {
-      const double rt = sw.rangeTime + x / fsSwath;
-      shift[x] = poly::Value(dc.pol, rt - dc.trg0_s, centre - dc.taz0_s) /
-                 poly::Value(fr.pol, rt - fr.trg0_s, centre - fr.taz0_s);
-      if (!std::isfinite(shift[x])) {
-        VLR_FAIL("Doppler centroid over Doppler rate is not a number", vlr::kLibInconsistent);
-      }
-    }
+    // Both threads evaluate the polynomials, a stretch of samples at a time.
+    bool notFinite[kThreads] = {};
+    const double rangeTime = sw.rangeTime;
+    mlook_detail::ParallelChunks(
+        helper_, n, kShiftChunk,
+        [&dc, &fr, &shift, &notFinite, rangeTime, fsSwath, centre](int from, int to, int thread) {
+          for (int x = from; x < to; ++x) {
+            const double rt = rangeTime + x / fsSwath;
+            shift[x] = poly::Value(dc.pol, rt - dc.trg0_s, centre - dc.taz0_s) /
+                       poly::Value(fr.pol, rt - fr.trg0_s, centre - fr.taz0_s);
+            if (!std::isfinite(shift[x])) notFinite[thread] = true;
+          }
+        });
+    if (notFinite[0] || notFinite[1])
+      VLR_FAIL("Doppler centroid over Doppler rate is not a number", vlr::kLibInconsistent);
     burst.shiftLo = *std::min_element(shift.begin(), shift.end());
     burst.shiftHi = *std::max_element(shift.begin(), shift.end());
     // Only the lines with a weight above 0 are read and processed.
@@ -376,23 +409,21 @@ int mlook::processswath(int k) {
     while (first < L && Classify(job, first) == kAllZero) ++first;
     while (last > first && Classify(job, last - 1) == kAllZero) --last;
     if (first == last) continue;
-    burst.firstRawLine = first;
-    const int64_t offset = in.line_offset(static_cast<int64_t>(b) * L + first);
+    burst.firstLine = static_cast<int64_t>(b) * L;
+    // The next burst is read from storage while this one is processed.
+    if (b + 1 < firstBurst_ + burstCount_)
+      raster.prefetch(L * lineLength, in.line_offset(static_cast<int64_t>(b + 1) * L));
     int transformed[kThreads] = {};
     bool readFailed[kThreads] = {};
     // Both threads take a few lines at a time, read them and process them.
     mlook_detail::ParallelChunks(
         helper_, last - first, kChunkLines,
-        [&job, &transformed, &readFailed, &raster, first, offset, lineLength, &raw](
-            int from, int to, int thread) {
-          if (readFailed[thread]) return;
-          if (!raster.read(raw.data() + from * lineLength, (to - from) * lineLength,
-                           offset + from * lineLength)) {
-            readFailed[thread] = true;
-            return;
+        [&job, &transformed, &readFailed, first](int from, int to, int thread) {
+          for (int j = first + from; j < first + to && !readFailed[thread]; ++j) {
+            const LineResult r = ProcessLine(job, j, thread);
+            transformed[thread] += r == kTransformed ? 1 : 0;
+            readFailed[thread] = r == kReadFailed;
           }
-          for (int j = first + from; j < first + to; ++j)
-            transformed[thread] += ProcessLine(job, j, thread) ? 1 : 0;
         });
     if (readFailed[0] || readFailed[1]) VLR_FAIL("File reading failed!", vlr::kLibRead);
     sw.transformedLines += transformed[0] + transformed[1];
