@@ -32,6 +32,9 @@ constexpr int kThreads = 2;
 // Burst lines a thread reads and processes at a time: one, so that the
 // threads finish a burst together (a burst has a few dozen lines).
 constexpr int kChunkLines = 1;
+// Output lines kept in memory, in bursts: two, so that the lines a burst
+// completes are written while the next one is processed.
+constexpr int kRingBursts = 2;
 // Samples whose Doppler shift a thread evaluates at a time.
 constexpr int kShiftChunk = 512;
 
@@ -300,7 +303,7 @@ int mlook::processswath(int k) {
   vlr::CkBuffer<double> shift;
   const bool native = in.cell_type == CT_FLOAT_COMPLEX && in.byte_order == 0;
   bool allocated = block.allocate(static_cast<size_t>(nfft) * L) &&
-                   ring.allocate(static_cast<size_t>(m) * L) && shift.allocate(n);
+                   ring.allocate(static_cast<size_t>(m) * kRingBursts * L) && shift.allocate(n);
   for (auto& b : lookBuffer) allocated = allocated && (plain || b.allocate(m));
   for (auto& b : rawLine) allocated = allocated && (native || b.allocate(lineLength));
   if (!allocated) VLR_FAIL("Cannot allocate the burst buffers", vlr::kLibAlloc);
@@ -322,11 +325,12 @@ int mlook::processswath(int k) {
   if (!raster.open()) VLR_FAIL("File not opened!", vlr::kLibOpen);
 
   const int64_t rowBytes = static_cast<int64_t>(m) * sizeof(float);
+  const int ringLines = kRingBursts * L;
   int written = 0;
   // Writes the output lines before `upTo` and clears their ring lines.
   auto flush = [&](int upTo) -> int {
     for (; written < upTo; ++written) {
-      float* line = ring.data() + static_cast<size_t>(written % L) * m;
+      float* line = ring.data() + static_cast<size_t>(written % ringLines) * m;
       const int rc = temp.write(line, rowBytes);
       if (rc != 0) return rc;
       std::fill(line, line + m, 0.0f);
@@ -360,7 +364,7 @@ int mlook::processswath(int k) {
   lines.block = block.data();
   for (int t = 0; t < kThreads; ++t) lines.lookBuffer[t] = lookBuffer[t].data();
   lines.ring = ring.data();
-  lines.ringLines = L;
+  lines.ringLines = ringLines;
   BurstLines burst{};
   burst.shift = shift.data();
   const LineJob job{lines, burst};
@@ -376,9 +380,10 @@ int mlook::processswath(int k) {
     ++burstsDone_;
     const int p = static_cast<int>(
         std::nearbyint((times[static_cast<size_t>(b)] - outputStartTime_) / lineInterval_));
-    if (flush(p) != 0) {
-      VLR_FAIL("File writing failed!", vlr::kLibWrite);
-    }
+    // The lines before p are complete.  Those that share ring lines with
+    // this burst's are written now, the others while the burst is
+    // processed.
+    if (flush(p + L - ringLines) != 0) VLR_FAIL("File writing failed!", vlr::kLibWrite);
     // The burst centre from the burst cycle; the weight of a sample is
     // evaluated where its Doppler centroid puts it in the burst.
     burst.centreTime = times[0] + b * s.burstCycle + 0.5 * (L - 1) * lineInterval_;
@@ -415,7 +420,9 @@ int mlook::processswath(int k) {
       raster.prefetch(L * lineLength, in.line_offset(static_cast<int64_t>(b + 1) * L));
     int transformed[kThreads] = {};
     bool readFailed[kThreads] = {};
-    // Both threads take a few lines at a time, read them and process them.
+    int flushed = 0;
+    // Both threads take a line at a time, read it and process it; this
+    // thread writes the complete lines first.
     mlook_detail::ParallelChunks(
         helper_, last - first, kChunkLines,
         [&job, &transformed, &readFailed, first](int from, int to, int thread) {
@@ -424,7 +431,9 @@ int mlook::processswath(int k) {
             transformed[thread] += r == kTransformed ? 1 : 0;
             readFailed[thread] = r == kReadFailed;
           }
-        });
+        },
+        [&flush, &flushed, p] { flushed = flush(p); });
+    if (flushed != 0) VLR_FAIL("File writing failed!", vlr::kLibWrite);
     if (readFailed[0] || readFailed[1]) VLR_FAIL("File reading failed!", vlr::kLibRead);
     sw.transformedLines += transformed[0] + transformed[1];
   }

@@ -272,15 +272,16 @@ int mlook::composeswaths() {
   const double referenceTime = reference / kHalfSpeedOfLight;
   // The composite line with kKernelHalf copies of its edge samples on
   // either side, so that the kernels never leave it.
-  // One padded composite line per thread; the sub-swath lines of a block of
-  // output lines.
+  // One padded composite line per thread; the sub-swath lines of two
+  // blocks of output lines (one composed while the next is read).
   vlr::CkBuffer<float> spread, padded[kComposeThreads];
-  vlr::CkBuffer<float> lines[kMlookSwaths];
+  vlr::CkBuffer<float> lines[2][kMlookSwaths];
   bool allocated = spread.allocate(width);
   for (auto& b : padded) allocated = allocated && b.allocate(width + 2 * kKernelHalf);
-  for (int i = 0; i < kMlookSwaths; ++i)
-    allocated =
-        allocated && lines[i].allocate(static_cast<size_t>(swath_[i].lookLength) * kBlockLines);
+  for (auto& set : lines)
+    for (int i = 0; i < kMlookSwaths; ++i)
+      allocated =
+          allocated && set[i].allocate(static_cast<size_t>(swath_[i].lookLength) * kBlockLines);
   if (!allocated) VLR_FAIL("Cannot allocate the composition buffers", vlr::kLibAlloc);
   for (int k = 0; k < width; ++k) {
     const double r = (swath_[0].rangeTime + k * spacing) / referenceTime;
@@ -335,9 +336,10 @@ int mlook::composeswaths() {
     outputSamples_ = width;
     outputFarRangeTime_ = swath_[0].rangeTime + (width - 1) * spacing;
   }
-  vlr::CkBuffer<float> outLines;
+  vlr::CkBuffer<float> outLines[2];
   vlr::CkBuffer<double> lineNodes[kComposeThreads];
-  if (!outLines.allocate(static_cast<size_t>(outputSamples_) * kBlockLines))
+  if (!outLines[0].allocate(static_cast<size_t>(outputSamples_) * kBlockLines) ||
+      !outLines[1].allocate(static_cast<size_t>(outputSamples_) * kBlockLines))
     VLR_FAIL("Cannot allocate the output lines", vlr::kLibAlloc);
   if (ground) {
     VLR_CALL(groundgrid());
@@ -367,15 +369,15 @@ int mlook::composeswaths() {
 
   const double tolerance = kNewtonTolerance / fs;
   const int phases = static_cast<int>(kernels.size() / kKernelTaps);
-  // Output line `line` from the sub-swath lines at `row` of the block,
-  // into the block's output row.  Only computes: the two threads run it on
-  // different lines.
-  auto composeLine = [&](int line, int row, int thread) {
+  // Output line `line` from the sub-swath lines at `row` of block buffer
+  // `set`, into that block's output row.  Only computes: the two threads run
+  // it on different lines.
+  auto composeLine = [&](int line, int row, int set, int thread) {
     float* composite = padded[thread].data() + kKernelHalf;
-    float* out = outLines.data() + static_cast<size_t>(row) * outputSamples_;
+    float* out = outLines[set].data() + static_cast<size_t>(row) * outputSamples_;
     std::fill(composite, composite + width, 0.0f);
     for (int i = 0; i < kMlookSwaths; ++i) {
-      const float* from = lines[i].data() + static_cast<size_t>(row) * swath_[i].lookLength;
+      const float* from = lines[set][i].data() + static_cast<size_t>(row) * swath_[i].lookLength;
       for (int k = begin[i]; k < end[i]; ++k) composite[k] = from[k - swath_[i].offset];
     }
     if (!ground) {
@@ -432,9 +434,25 @@ int mlook::composeswaths() {
     out[last] = resample((SampleTime(nodes, lastNode, last, last, axis, step, tolerance) - first) /
                          spacing);
   };
-  // Blocks of lines: read on this thread, composed on both, written here.
+  // Blocks of lines, composed on both threads; this thread first writes
+  // the block before and reads the block after, so that the file traffic
+  // overlaps the composition.
+  auto readBlock = [&](int block, int set) -> bool {
+    const int count = std::min(kBlockLines, outputLines_ - block);
+    for (int i = 0; i < kMlookSwaths; ++i)
+      if (output_->swath[i].read(lines[set][i].data(), static_cast<int64_t>(swath_[i].lookLength) *
+                                                           count * sizeof(float)) != 0)
+        return false;
+    return true;
+  };
+  auto writeBlock = [&](int block, int set) -> bool {
+    const int count = std::min(kBlockLines, outputLines_ - block);
+    return image.write(outLines[set].data(),
+                       static_cast<int64_t>(outputSamples_) * count * sizeof(float)) == 0;
+  };
+  if (!readBlock(0, 0)) VLR_FAIL("File reading failed!", vlr::kLibRead);
   int percent = -1;
-  for (int block = 0; block < outputLines_; block += kBlockLines) {
+  for (int block = 0, set = 0; block < outputLines_; block += kBlockLines, set ^= 1) {
     const int count = std::min(kBlockLines, outputLines_ - block);
     for (int line = block; line < block + count; ++line) {
       if (line % kProgressLines == 0) {
@@ -443,18 +461,20 @@ int mlook::composeswaths() {
         percent = now;
       }
     }
-    for (int i = 0; i < kMlookSwaths; ++i) {
-      if (output_->swath[i].read(lines[i].data(), static_cast<int64_t>(swath_[i].lookLength) *
-                                                      count * sizeof(float)) != 0)
-        VLR_FAIL("File reading failed!", vlr::kLibRead);
-    }
-    mlook_detail::ParallelChunks(helper_, count, kComposeChunk,
-                                 [&composeLine, block](int from, int to, int thread) {
-                                   for (int row = from; row < to; ++row)
-                                     composeLine(block + row, row, thread);
-                                 });
-    if (image.write(outLines.data(),
-                    static_cast<int64_t>(outputSamples_) * count * sizeof(float)) != 0)
+    bool readOk = true, writeOk = true;
+    const int next = block + kBlockLines;
+    mlook_detail::ParallelChunks(
+        helper_, count, kComposeChunk,
+        [&composeLine, block, set](int from, int to, int thread) {
+          for (int row = from; row < to; ++row) composeLine(block + row, row, set, thread);
+        },
+        [&] {
+          if (block > 0) writeOk = writeBlock(block - kBlockLines, set ^ 1);
+          if (next < outputLines_) readOk = readBlock(next, set ^ 1);
+        });
+    if (!writeOk) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+    if (!readOk) VLR_FAIL("File reading failed!", vlr::kLibRead);
+    if (next >= outputLines_ && !writeBlock(block, set))
       VLR_FAIL("File writing failed!", vlr::kLibWrite);
   }
   for (int i = 0; i < kMlookSwaths; ++i) output_->swath[i].close();
