@@ -19,6 +19,7 @@
 
 #include "multilook/mlook_io.h"
 #include "multilook/mlook_radar_grid.h"
+#include "multilook/mlook_swath.h"
 #include "runtime/call_scope.h"
 #include "sar_container/general_sar.h"
 
@@ -43,7 +44,7 @@ struct mlook_swath_par {
 class mlook {
  public:
   // More looks than this are refused.
-  static constexpr int kMaxLooks = 15;
+  static constexpr int kMaxLooks = kMlookMaxLooks;
 
   mlook(mlook_conf* conf, mlook_input* input, mlook_output* output);
   ~mlook();
@@ -70,18 +71,18 @@ class mlook {
 
   // Results of fclook (swath 0..4, look 0..looks()-1).
   int looks() const { return looks_; }
-  double lookBandwidth(int swath) const { return lookBandwidth_[swath]; }
-  double lookFrequency(int look, int swath) const { return lookFrequency_[look][swath]; }
+  double lookBandwidth(int swath) const { return swath_[swath].lookBandwidth; }
+  double lookFrequency(int look, int swath) const { return swath_[swath].lookFrequency[look]; }
   // Results of run.
   int decimation() const { return decimation_; }
   int outputSamples() const { return outputSamples_; }
   int outputLines() const { return outputLines_; }
   double outputStartTime() const { return outputStartTime_; }
-  double outputNearRangeTime() const { return rangeTime_[0]; }
+  double outputNearRangeTime() const { return swath_[0].rangeTime; }
   // Lines of sub-swath k that went through the range transforms (lines
   // whose azimuth weights are all 0 contribute nothing and are skipped).
-  int64_t transformedLines(int k) const { return transformedLines_[k]; }
-  int fftLength(int k) const { return fftLength_[k]; }
+  int64_t transformedLines(int k) const { return swath_[k].transformedLines; }
+  int fftLength(int k) const { return swath_[k].fftLength; }
   // Zero-Doppler azimuth time and two-way range time of an output pixel
   // (column and row from 0, fractions allowed), and its latitude and
   // longitude on the ellipsoid.  Valid after run and before freeimages.
@@ -91,14 +92,16 @@ class mlook {
   // time of its columns) and the orbit it was imaged from.  Valid after run
   // and before freeimages.
   int radarGrid(MlookRadarGrid* grid);
-  const GeneralSAROrbit* orbit() const { return headers_[0] ? &headers_[0]->orbit : nullptr; }
+  const GeneralSAROrbit* orbit() const {
+    return swath_[0].header ? &swath_[0].header->orbit : nullptr;
+  }
   // Two-way range time from which the ground-range resampling took output
   // sample `column` of line `line`.  Valid after a ground-range run and
   // before freeimages; 0 or 1.
   int resampledRangeTime(int column, int line, double* range) const;
   // First composite sample of each sub-swath, as a two-way range time.
-  double swathStartRangeTime(int k) const { return boundaryTime_[k]; }
-  int lookLength(int k) const { return lookLength_[k]; }
+  double swathStartRangeTime(int k) const { return swath_[k].boundaryTime; }
+  int lookLength(int k) const { return swath_[k].lookLength; }
 
   // Sub-swath parameters (filled by readimages; tests may set them before
   // fclook) and the range sampling frequency of sub-swath 1.
@@ -123,30 +126,15 @@ class mlook {
   mlook_conf* conf_;
   mlook_input* input_;
   mlook_output* output_;
-  std::unique_ptr<GeneralSAR> headers_[kMlookSwaths];
+  mlook_swath swath_[kMlookSwaths];
 
   int looks_ = 0;
-  double lookBandwidth_[kMlookSwaths] = {};
-  double lookFrequency_[kMaxLooks][kMlookSwaths] = {};
-
-  // Range grid: decimation D, per swath the FFT length, look length, the
-  // samples dropped for alignment, the first output sample and the number
-  // of output samples that hold data.
+  // Range grid: decimation D.
   int decimation_ = 0;
-  int fftLength_[kMlookSwaths] = {};
-  int lookLength_[kMlookSwaths] = {};
-  int skip_[kMlookSwaths] = {};
-  int offset_[kMlookSwaths] = {};
-  int valid_[kMlookSwaths] = {};
-  double rangeTime_[kMlookSwaths] = {};     // first range time after alignment
-  double boundaryTime_[kMlookSwaths] = {};  // where each swath starts in the composite
-  double powerScale_[kMlookSwaths] = {};
 
-  // Azimuth grid: bursts processed, their first-line times per swath, the
-  // output start time and line count.
+  // Azimuth grid: bursts processed, the output start time and line count.
   int firstBurst_ = 0;
   int burstCount_ = 0;
-  std::vector<double> burstTimes_[kMlookSwaths];
   double outputStartTime_ = 0.0;
   double lineInterval_ = 0.0;
   int outputLines_ = 0;
@@ -160,6 +148,4 @@ class mlook {
   int gridRows_ = 0;
   int burstsDone_ = 0;
   int percentShown_ = -1;
-  bool tempWritten_[kMlookSwaths] = {};
-  int64_t transformedLines_[kMlookSwaths] = {};
 };

@@ -74,7 +74,7 @@ long long DataSetOffset(const char* sph, size_t size) {
 int mlook::envi_beam_corr(int k, std::vector<float>* gain) {
   VLR_SCOPE("envi_beam_corr", kModule);
   const mlook_swath_par& s = swathPar[k];
-  GeneralSAR& gs = *headers_[k];
+  GeneralSAR& gs = *swath_[k].header;
   const int fd = open(input_->ASA_XCA_Filename, O_RDONLY);
   if (fd < 0) VLR_FAIL("File not opened!", vlr::kLibOpen);
   std::vector<unsigned char> record(kRecordSize);

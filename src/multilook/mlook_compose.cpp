@@ -106,19 +106,19 @@ struct GroundLine {
   double start[kMlookSwaths] = {};   // ground range where a swath's span starts
   double startTime[kMlookSwaths] = {};
 
-  void set(GeneralSAR* const* headers, const double* boundaryTime, double az) {
+  void set(const mlook_swath* swath, double az) {
     for (int i = 0; i < kMlookSwaths; ++i) {
-      toGround[i].set(headers[i]->polys.sl2gr, az);
-      toSlant[i].set(headers[i]->polys.gr2sl, az);
+      toGround[i].set(swath[i].header->polys.sl2gr, az);
+      toSlant[i].set(swath[i].header->polys.gr2sl, az);
     }
-    offset[0] = -toGround[0].value(boundaryTime[0]);
+    offset[0] = -toGround[0].value(swath[0].boundaryTime);
     start[0] = 0.0;
-    startTime[0] = boundaryTime[0];
+    startTime[0] = swath[0].boundaryTime;
     for (int i = 1; i < kMlookSwaths; ++i) {
-      const double g = toGround[i - 1].value(boundaryTime[i]) + offset[i - 1];
-      offset[i] = g - toGround[i].value(boundaryTime[i]);
+      const double g = toGround[i - 1].value(swath[i].boundaryTime) + offset[i - 1];
+      offset[i] = g - toGround[i].value(swath[i].boundaryTime);
       start[i] = g;
-      startTime[i] = boundaryTime[i];
+      startTime[i] = swath[i].boundaryTime;
     }
   }
   double ground(double rt) const {
@@ -197,8 +197,6 @@ double SampleTime(const double* nodes, int lastNode, int last, int j, const Grou
 // of the previous grid line.
 int mlook::groundgrid() {
   VLR_SCOPE("groundgrid", kModule);
-  GeneralSAR* headers[kMlookSwaths];
-  for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
   const int lastSample = outputSamples_ - 1, lastLine = outputLines_ - 1;
   gridColumns_ = NodeCount(lastSample, kNodeSamples);
   gridRows_ = NodeCount(lastLine, kNodeLines);
@@ -210,8 +208,7 @@ int mlook::groundgrid() {
   const double tolerance = kNewtonTolerance / fs;
   GroundLine axis;
   for (int r = 0; r < gridRows_; ++r) {
-    axis.set(headers, boundaryTime_,
-             outputStartTime_ + NodePosition(r, lastLine, kNodeLines) * lineInterval_);
+    axis.set(swath_, outputStartTime_ + NodePosition(r, lastLine, kNodeLines) * lineInterval_);
     double* row = &gridTimes_[static_cast<size_t>(r) * gridColumns_];
     const double* above = r > 0 ? row - gridColumns_ : nullptr;
     for (int c = 0; c < gridColumns_; ++c)
@@ -237,9 +234,7 @@ int mlook::resampledRangeTime(int column, int line, double* range) const {
       column >= outputSamples_ || line < 0 || line >= outputLines_)
     return vlr::kLibInconsistent;
   GroundLine axis;
-  GeneralSAR* headers[kMlookSwaths];
-  for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
-  axis.set(headers, boundaryTime_, outputStartTime_ + line * lineInterval_);
+  axis.set(swath_, outputStartTime_ + line * lineInterval_);
   std::vector<double> nodes(static_cast<size_t>(gridColumns_));
   gridline(line, nodes.data());
   *range = SampleTime(nodes.data(), gridColumns_ - 1, outputSamples_ - 1, column, axis,
@@ -255,39 +250,41 @@ int mlook::composeswaths() {
   // their overlap.
   int begin[kMlookSwaths], end[kMlookSwaths];
   for (int i = 0; i < kMlookSwaths; ++i) {
-    begin[i] = offset_[i];
-    end[i] = offset_[i] + valid_[i];
+    begin[i] = swath_[i].offset;
+    end[i] = swath_[i].offset + swath_[i].valid;
   }
   for (int i = 1; i < kMlookSwaths; ++i) {
-    if (end[i - 1] > offset_[i]) {
-      begin[i] = offset_[i] + (end[i - 1] - offset_[i]) / 2;
+    if (end[i - 1] > swath_[i].offset) {
+      begin[i] = swath_[i].offset + (end[i - 1] - swath_[i].offset) / 2;
       end[i - 1] = begin[i];
     }
   }
   int width = 0;
   for (int i = 0; i < kMlookSwaths; ++i) width = std::max(width, end[i]);
   compositeSamples_ = width;
-  double* boundaryTime = boundaryTime_;
-  for (int i = 0; i < kMlookSwaths; ++i) boundaryTime[i] = rangeTime_[0] + begin[i] * spacing;
+  for (int i = 0; i < kMlookSwaths; ++i)
+    swath_[i].boundaryTime = swath_[0].rangeTime + begin[i] * spacing;
 
   // Range-spreading correction: amplitude sqrt(P r^3 / 3), r the range over
   // the reference range.
-  double reference = headers_[0]->dataSetInfo.RO_REF;
+  double reference = swath_[0].header->dataSetInfo.RO_REF;
   if (!(reference > 0.0) || !std::isfinite(reference)) reference = kDefaultReferenceRange;
   const double referenceTime = reference / kHalfSpeedOfLight;
   // The composite line with kKernelHalf copies of its edge samples on
   // either side, so that the kernels never leave it.
-  // One padded composite line per thread; the sub-swath lines of a block of
-  // output lines.
+  // One padded composite line per thread; the sub-swath lines of two
+  // blocks of output lines (one composed while the next is read).
   vlr::CkBuffer<float> spread, padded[kComposeThreads];
-  vlr::CkBuffer<float> lines[kMlookSwaths];
+  vlr::CkBuffer<float> lines[2][kMlookSwaths];
   bool allocated = spread.allocate(width);
   for (auto& b : padded) allocated = allocated && b.allocate(width + 2 * kKernelHalf);
-  for (int i = 0; i < kMlookSwaths; ++i)
-    allocated = allocated && lines[i].allocate(static_cast<size_t>(lookLength_[i]) * kBlockLines);
+  for (auto& set : lines)
+    for (int i = 0; i < kMlookSwaths; ++i)
+      allocated =
+          allocated && set[i].allocate(static_cast<size_t>(swath_[i].lookLength) * kBlockLines);
   if (!allocated) VLR_FAIL("Cannot allocate the composition buffers", vlr::kLibAlloc);
   for (int k = 0; k < width; ++k) {
-    const double r = (rangeTime_[0] + k * spacing) / referenceTime;
+    const double r = (swath_[0].rangeTime + k * spacing) / referenceTime;
     spread[k] = static_cast<float>(r * r * r / 3.0);
   }
 
@@ -296,19 +293,17 @@ int mlook::composeswaths() {
   // output is as wide as the widest line; shorter lines end in zeros.
   const bool ground = conf_->geometry() == OutputGeometry::kGroundRange;
   GroundLine axis;
-  GeneralSAR* headers[kMlookSwaths];
-  for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
   std::vector<float> kernels;
   if (ground) {
     for (int k = 0; k < kMlookSwaths; ++k)
-      if (headers_[k]->polys.nsl2gr < 1) VLR_FAIL("NO SL2GR poly available", vlr::kLibMissing);
+      if (swath_[k].header->polys.nsl2gr < 1) VLR_FAIL("NO SL2GR poly available", vlr::kLibMissing);
     if (!(conf_->GrSamplingStep > 0))
       VLR_FAIL("Ground sampling step not positive", vlr::kLibInconsistent);
-    const double farTime = rangeTime_[0] + (width - 1) * spacing;
+    const double farTime = swath_[0].rangeTime + (width - 1) * spacing;
     double far = -1.0;
     int widest = 0;
     for (int line = 0; line < outputLines_; ++line) {
-      axis.set(headers, boundaryTime, outputStartTime_ + line * lineInterval_);
+      axis.set(swath_, outputStartTime_ + line * lineInterval_);
       const double g = axis.ground(farTime);
       if (!std::isfinite(g)) {
         far = NAN;
@@ -324,7 +319,7 @@ int mlook::composeswaths() {
       VLR_FAIL("Slant-to-ground polynomials give no ground range across the swath",
                vlr::kLibInconsistent);
     outputSamples_ = static_cast<int>(count);
-    axis.set(headers, boundaryTime, outputStartTime_ + widest * lineInterval_);
+    axis.set(swath_, outputStartTime_ + widest * lineInterval_);
     outputFarRangeTime_ =
         axis.slant((outputSamples_ - 1) * conf_->GrSamplingStep, NAN, kNewtonTolerance / fs);
     const int phases = static_cast<int>(1.0f + 1.0f / kKernelStep);
@@ -339,11 +334,12 @@ int mlook::composeswaths() {
                     kKernelGuard));
   } else {
     outputSamples_ = width;
-    outputFarRangeTime_ = rangeTime_[0] + (width - 1) * spacing;
+    outputFarRangeTime_ = swath_[0].rangeTime + (width - 1) * spacing;
   }
-  vlr::CkBuffer<float> outLines;
+  vlr::CkBuffer<float> outLines[2];
   vlr::CkBuffer<double> lineNodes[kComposeThreads];
-  if (!outLines.allocate(static_cast<size_t>(outputSamples_) * kBlockLines))
+  if (!outLines[0].allocate(static_cast<size_t>(outputSamples_) * kBlockLines) ||
+      !outLines[1].allocate(static_cast<size_t>(outputSamples_) * kBlockLines))
     VLR_FAIL("Cannot allocate the output lines", vlr::kLibAlloc);
   if (ground) {
     VLR_CALL(groundgrid());
@@ -373,16 +369,16 @@ int mlook::composeswaths() {
 
   const double tolerance = kNewtonTolerance / fs;
   const int phases = static_cast<int>(kernels.size() / kKernelTaps);
-  // Output line `line` from the sub-swath lines at `row` of the block,
-  // into the block's output row.  Only computes: the two threads run it on
-  // different lines.
-  auto composeLine = [&](int line, int row, int thread) {
+  // Output line `line` from the sub-swath lines at `row` of block buffer
+  // `set`, into that block's output row.  Only computes: the two threads run
+  // it on different lines.
+  auto composeLine = [&](int line, int row, int set, int thread) {
     float* composite = padded[thread].data() + kKernelHalf;
-    float* out = outLines.data() + static_cast<size_t>(row) * outputSamples_;
+    float* out = outLines[set].data() + static_cast<size_t>(row) * outputSamples_;
     std::fill(composite, composite + width, 0.0f);
     for (int i = 0; i < kMlookSwaths; ++i) {
-      const float* from = lines[i].data() + static_cast<size_t>(row) * lookLength_[i];
-      for (int k = begin[i]; k < end[i]; ++k) composite[k] = from[k - offset_[i]];
+      const float* from = lines[set][i].data() + static_cast<size_t>(row) * swath_[i].lookLength;
+      for (int k = begin[i]; k < end[i]; ++k) composite[k] = from[k - swath_[i].offset];
     }
     if (!ground) {
       for (int k = 0; k < width; ++k) out[k] = std::sqrt(std::max(0.0f, composite[k]) * spread[k]);
@@ -391,12 +387,12 @@ int mlook::composeswaths() {
     for (int k = 0; k < width; ++k)
       composite[k] = std::sqrt(std::max(0.0f, composite[k]) * spread[k]);
     GroundLine axis;
-    axis.set(headers, boundaryTime, outputStartTime_ + line * lineInterval_);
+    axis.set(swath_, outputStartTime_ + line * lineInterval_);
     std::fill(padded[thread].begin(), composite, composite[0]);
     std::fill(composite + width, padded[thread].end(), composite[width - 1]);
     const float* c = composite;
     const double step = conf_->GrSamplingStep;
-    const double first = rangeTime_[0];
+    const double first = swath_[0].rangeTime;
     const float* table = kernels.data();
     const double phaseScale = 1.0 / kKernelStep;
     // This line's range times at the grid's node columns, then between
@@ -438,9 +434,25 @@ int mlook::composeswaths() {
     out[last] = resample((SampleTime(nodes, lastNode, last, last, axis, step, tolerance) - first) /
                          spacing);
   };
-  // Blocks of lines: read on this thread, composed on both, written here.
+  // Blocks of lines, composed on both threads; this thread first writes
+  // the block before and reads the block after, so that the file traffic
+  // overlaps the composition.
+  auto readBlock = [&](int block, int set) -> bool {
+    const int count = std::min(kBlockLines, outputLines_ - block);
+    for (int i = 0; i < kMlookSwaths; ++i)
+      if (output_->swath[i].read(lines[set][i].data(), static_cast<int64_t>(swath_[i].lookLength) *
+                                                           count * sizeof(float)) != 0)
+        return false;
+    return true;
+  };
+  auto writeBlock = [&](int block, int set) -> bool {
+    const int count = std::min(kBlockLines, outputLines_ - block);
+    return image.write(outLines[set].data(),
+                       static_cast<int64_t>(outputSamples_) * count * sizeof(float)) == 0;
+  };
+  if (!readBlock(0, 0)) VLR_FAIL("File reading failed!", vlr::kLibRead);
   int percent = -1;
-  for (int block = 0; block < outputLines_; block += kBlockLines) {
+  for (int block = 0, set = 0; block < outputLines_; block += kBlockLines, set ^= 1) {
     const int count = std::min(kBlockLines, outputLines_ - block);
     for (int line = block; line < block + count; ++line) {
       if (line % kProgressLines == 0) {
@@ -449,18 +461,20 @@ int mlook::composeswaths() {
         percent = now;
       }
     }
-    for (int i = 0; i < kMlookSwaths; ++i) {
-      if (output_->swath[i].read(lines[i].data(),
-                                 static_cast<int64_t>(lookLength_[i]) * count * sizeof(float)) != 0)
-        VLR_FAIL("File reading failed!", vlr::kLibRead);
-    }
-    mlook_detail::ParallelChunks(helper_, count, kComposeChunk,
-                                 [&composeLine, block](int from, int to, int thread) {
-                                   for (int row = from; row < to; ++row)
-                                     composeLine(block + row, row, thread);
-                                 });
-    if (image.write(outLines.data(),
-                    static_cast<int64_t>(outputSamples_) * count * sizeof(float)) != 0)
+    bool readOk = true, writeOk = true;
+    const int next = block + kBlockLines;
+    mlook_detail::ParallelChunks(
+        helper_, count, kComposeChunk,
+        [&composeLine, block, set](int from, int to, int thread) {
+          for (int row = from; row < to; ++row) composeLine(block + row, row, set, thread);
+        },
+        [&] {
+          if (block > 0) writeOk = writeBlock(block - kBlockLines, set ^ 1);
+          if (next < outputLines_) readOk = readBlock(next, set ^ 1);
+        });
+    if (!writeOk) VLR_FAIL("File writing failed!", vlr::kLibWrite);
+    if (!readOk) VLR_FAIL("File reading failed!", vlr::kLibRead);
+    if (next >= outputLines_ && !writeBlock(block, set))
       VLR_FAIL("File writing failed!", vlr::kLibWrite);
   }
   for (int i = 0; i < kMlookSwaths; ++i) output_->swath[i].close();
@@ -470,16 +484,14 @@ int mlook::composeswaths() {
 
 int mlook::outputPixelTimes(double column, double row, double* azimuth, double* range) {
   VLR_SCOPE("outputPixelTimes", kModule);
-  if (headers_[0] == nullptr || !(fs > 0.0) || decimation_ < 1 || outputLines_ < 1)
+  if (swath_[0].header == nullptr || !(fs > 0.0) || decimation_ < 1 || outputLines_ < 1)
     VLR_FAIL("The output geometry is not known", vlr::kLibInconsistent);
   const double az = outputStartTime_ + row * lineInterval_;
-  double rt = rangeTime_[0] + column * decimation_ / fs;
+  double rt = swath_[0].rangeTime + column * decimation_ / fs;
   if (conf_->geometry() == OutputGeometry::kGroundRange) {
     // The same chained ground axis as the resampling, at the pixel's line.
     GroundLine axis;
-    GeneralSAR* headers[kMlookSwaths];
-    for (int i = 0; i < kMlookSwaths; ++i) headers[i] = headers_[i].get();
-    axis.set(headers, boundaryTime_, az);
+    axis.set(swath_, az);
     rt = axis.slant(column * conf_->GrSamplingStep, NAN, kNewtonTolerance / fs);
     if (!std::isfinite(rt)) VLR_FAIL("No slant range for the ground range", vlr::kLibInconsistent);
   }
@@ -492,6 +504,6 @@ int mlook::geolocate(double column, double row, double* lat, double* lon) {
   VLR_SCOPE("geolocate", kModule);
   double az = 0.0, rt = 0.0;
   VLR_CALL(outputPixelTimes(column, row, &az, &rt));
-  VLR_CALL(headers_[0]->orbit.SVGetLatLon(az, rt, lat, lon));
+  VLR_CALL(swath_[0].header->orbit.SVGetLatLon(az, rt, lat, lon));
   return 0;
 }

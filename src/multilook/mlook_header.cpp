@@ -30,7 +30,7 @@ void CopyText(char* field, const char* text) {
 
 int mlook::writepar() {
   VLR_SCOPE("MLwritepars", kModule);
-  if (!headers_[0] || outputLines_ < 1 || outputSamples_ < 1)
+  if (!swath_[0].header || outputLines_ < 1 || outputSamples_ < 1)
     VLR_FAIL("Nothing processed", vlr::kLibInconsistent);
   std::unique_ptr<GeneralSAR> gs;
   try {
@@ -38,7 +38,7 @@ int mlook::writepar() {
   } catch (const std::bad_alloc&) {
     VLR_FAIL("Cannot allocate the output header", vlr::kLibAlloc);
   }
-  VLR_CALL(headers_[0]->GSclone(gs.get()));
+  VLR_CALL(swath_[0].header->GSclone(gs.get()));
   // Burst layout and per-swath polynomials describe the inputs only.
   gs->GSdisable(GeneralSAR::GS_SWATHINFO);
   gs->GSdisable(GeneralSAR::GS_POLYSAR);
@@ -47,9 +47,10 @@ int mlook::writepar() {
 
   DataSetInfo_Obj& info = gs->dataSetInfo;
   char date[kSec85TextSize] = {};
-  const double first = burstTimes_[0].empty()
-                           ? outputStartTime_
-                           : burstTimes_[0][0] + input_->BurstsToSkip * swathPar[0].burstCycle;
+  const double first =
+      swath_[0].burstTimes.empty()
+          ? outputStartTime_
+          : swath_[0].burstTimes[0] + input_->BurstsToSkip * swathPar[0].burstCycle;
   sec852ascii(first, date);
   CopyText(info.SenseDate, date);
   CopyText(info.Description, "WideSwath MULTILOOKING IMAGE");
@@ -82,8 +83,8 @@ int mlook::writepar() {
   // range times of the first and last output samples, with the output's
   // sample step (in ground range the step of the sampling constants).
   ROI_Obj& roi = gs->roi.roi;
-  roi.FastStartTime = rangeTime_[0];
-  roi.FastTimeLength = outputFarRangeTime_ - rangeTime_[0];
+  roi.FastStartTime = swath_[0].rangeTime;
+  roi.FastTimeLength = outputFarRangeTime_ - swath_[0].rangeTime;
   roi.FastTimeDelta = sampling.Trg_s;
   roi.Samples = outputSamples_;
   roi.SlowStartTime = outputStartTime_;

@@ -46,7 +46,7 @@ int mlook::fclook() {
         kHalfSpeedOfLight / (std::sin(s.incidence * kDegToRad) * conf_->GrResolution);
     if (processed < resolution) {
       looksPerSwath[i] = 1;
-      lookBandwidth_[i] = processed;
+      swath_[i].lookBandwidth = processed;
     } else {
       const double m = std::ceil(kLookOversampling * processed / resolution);
       if (m > kMaxLooks + 1) {
@@ -55,7 +55,7 @@ int mlook::fclook() {
         const int whole = static_cast<int>(m);
         looksPerSwath[i] = whole % 2 == 1 ? whole : whole - 1;
       }
-      lookBandwidth_[i] = resolution;
+      swath_[i].lookBandwidth = resolution;
     }
     if (looksPerSwath[i] > looks_) looks_ = looksPerSwath[i];
   }
@@ -66,12 +66,12 @@ int mlook::fclook() {
   }
   // Centres 0, +1, -1, +2, -2, ... steps apart, spanning the whole band.
   for (int i = 0; i < kMlookSwaths; ++i) {
-    const double b = lookBandwidth_[i];
+    const double b = swath_[i].lookBandwidth;
     const double d = looks_ > 1 ? (looks_ - swathPar[i].bandwidth / b) / (looks_ - 1) : 0.0;
-    lookFrequency_[0][i] = 0.0;
+    swath_[i].lookFrequency[0] = 0.0;
     for (int j = 1; 2 * j - 1 < looks_; ++j) {
-      lookFrequency_[2 * j - 1][i] = j * (1.0 - d) * b;
-      lookFrequency_[2 * j][i] = -j * (1.0 - d) * b;
+      swath_[i].lookFrequency[2 * j - 1] = j * (1.0 - d) * b;
+      swath_[i].lookFrequency[2 * j] = -j * (1.0 - d) * b;
     }
   }
   return 0;
@@ -85,7 +85,7 @@ int mlook::setuprange() {
   VLR_SCOPE("setuprange", kModule);
   decimation_ = 0;
   for (int i = 0; i < kMlookSwaths; ++i) {
-    const int d = static_cast<int>(fs / lookBandwidth_[i]);
+    const int d = static_cast<int>(fs / swath_[i].lookBandwidth);
     if (decimation_ == 0 || d < decimation_) decimation_ = d;
   }
   if (decimation_ < 1) decimation_ = 1;
@@ -105,32 +105,32 @@ int mlook::setuprange() {
           vlr::kLibInconsistent);
     const int q = static_cast<int>(shift);
     const int r = q % D;
-    skip_[i] = r == 0 ? 0 : D - r;
-    if (skip_[i] >= s.samples)
+    swath_[i].skip = r == 0 ? 0 : D - r;
+    if (swath_[i].skip >= s.samples)
       VLR_FAIL(NVLR_UTILITY_Format("Sub-swath %d: too few samples", i + 1).c_str(),
                vlr::kLibInconsistent);
-    rangeTime_[i] = s.firstRangeTime + skip_[i] / fs;
-    offset_[i] = (q + skip_[i]) / D;
-    if (offset_[i] <= previousOffset)
+    swath_[i].rangeTime = s.firstRangeTime + swath_[i].skip / fs;
+    swath_[i].offset = (q + swath_[i].skip) / D;
+    if (swath_[i].offset <= previousOffset)
       VLR_FAIL("Sub-swaths are not in order of range", vlr::kLibInconsistent);
-    previousOffset = offset_[i];
+    previousOffset = swath_[i].offset;
     const int blocks = genpow((s.samples + D - 1) / D, 1);
     if (blocks < 1 || blocks > kMaxSamples)
       VLR_FAIL("No transform length for the range lines", vlr::kLibInconsistent);
-    fftLength_[i] = blocks * D;
-    lookLength_[i] = blocks;
+    swath_[i].fftLength = blocks * D;
+    swath_[i].lookLength = blocks;
     // Output samples whose input sample lies inside the line.
-    valid_[i] = (s.samples - skip_[i] - 1) / D + 1;
+    swath_[i].valid = (s.samples - swath_[i].skip - 1) / D + 1;
   }
   // Look power: the share of a swath's spectrum that one look takes differs
   // between swaths (bandwidths differ), so each swath is brought to the
   // share of swath 1; a uniform scene then has one level across the swath.
   const bool plain = looks_ == 1 && D == 1;
   const double n3 = static_cast<double>(looks_) * looks_ * looks_;
-  const double share1 = lookBandwidth_[0] / swathPar[0].bandwidth;
+  const double share1 = swath_[0].lookBandwidth / swathPar[0].bandwidth;
   for (int i = 0; i < kMlookSwaths; ++i) {
-    const double share = lookBandwidth_[i] / swathPar[i].bandwidth;
-    powerScale_[i] = plain ? 1.0 : share1 / share / n3;
+    const double share = swath_[i].lookBandwidth / swathPar[i].bandwidth;
+    swath_[i].powerScale = plain ? 1.0 : share1 / share / n3;
   }
   return 0;
 }

@@ -120,8 +120,13 @@ class HelperThread {
 // turn as they become free, so that a late or slowed helper leaves its share
 // to the calling thread.  The body must only compute: no report, no call
 // graph, no checked allocation.
-template <class Body>
-void ParallelChunks(HelperThread* helper, int count, int chunk, const Body& body) {
+//
+// `first`, when given, runs on the calling thread before it takes any
+// piece; it may do what the body may not, but must not touch what the body
+// works on.
+template <class Body, class First>
+void ParallelChunks(HelperThread* helper, int count, int chunk, const Body& body,
+                    const First& first) {
   std::atomic<int> next{0};
   auto work = [&next, &body, count, chunk](int thread) {
     for (;;) {
@@ -131,10 +136,20 @@ void ParallelChunks(HelperThread* helper, int count, int chunk, const Body& body
     }
   };
   if (count <= chunk || helper == nullptr) {
+    first();
     work(0);
     return;
   }
-  helper->run([&work] { work(1); }, [&work] { work(0); });
+  helper->run([&work] { work(1); },
+              [&work, &first] {
+                first();
+                work(0);
+              });
+}
+
+template <class Body>
+void ParallelChunks(HelperThread* helper, int count, int chunk, const Body& body) {
+  ParallelChunks(helper, count, chunk, body, [] {});
 }
 
 }  // namespace mlook_detail

@@ -114,13 +114,13 @@ double MlookRadarGrid::column(double rangeTime, double time) const {
 
 int mlook::radarGrid(MlookRadarGrid* grid) {
   VLR_SCOPE("radarGrid", "mlook_v2");
-  if (headers_[0] == nullptr || !(fs > 0.0) || decimation_ < 1 || outputLines_ < 1 ||
+  if (swath_[0].header == nullptr || !(fs > 0.0) || decimation_ < 1 || outputLines_ < 1 ||
       outputSamples_ < 1)
     VLR_FAIL("The output geometry is not known", vlr::kLibInconsistent);
-  const int lookSign = headers_[0]->orbit.lookSign();
+  const int lookSign = swath_[0].header->orbit.lookSign();
   if (conf_->geometry() == OutputGeometry::kSlantRange) {
     *grid = MlookRadarGrid::Slant(outputStartTime_, lineInterval_, outputLines_, outputSamples_,
-                                  rangeTime_[0], decimation_ / fs, lookSign);
+                                  swath_[0].rangeTime, decimation_ / fs, lookSign);
     return 0;
   }
   // The ground axis at a row every kAxisRowLines lines at most, on every

@@ -57,8 +57,10 @@ mlook::~mlook() {
 }
 
 void mlook::release() {
-  for (auto& h : headers_) h.reset();
-  for (auto& t : burstTimes_) std::vector<double>().swap(t);
+  for (mlook_swath& s : swath_) {
+    s.header.reset();
+    std::vector<double>().swap(s.burstTimes);
+  }
   std::vector<double>().swap(gridTimes_);
 }
 
@@ -87,11 +89,11 @@ int mlook::readswath(int k, const char* header, bool kestova) {
   if (std::string(header).size() >= kMlookNameSize)
     VLR_FAIL("Sub-swath file name too long", vlr::kLibInconsistent);
   try {
-    headers_[k].reset(new GeneralSAR);
+    swath_[k].header.reset(new GeneralSAR);
   } catch (const std::bad_alloc&) {
     VLR_FAIL("Cannot allocate the sub-swath header", vlr::kLibAlloc);
   }
-  GeneralSAR& gs = *headers_[k];
+  GeneralSAR& gs = *swath_[k].header;
   if (kestova) {
     VLR_CALL(readhdr_kestova(header, &gs));
   } else {
@@ -178,7 +180,7 @@ int mlook::checkbursts() {
 int mlook::readbursttimes(int k, std::vector<double>* times) {
   VLR_SCOPE("readbursttimes", kModule);
   const mlook_swath_par& s = swathPar[k];
-  const DataFile& described = headers_[k]->datafile.data;
+  const DataFile& described = swath_[k].header->datafile.data;
   try {
     times->assign(static_cast<size_t>(s.bursts), 0.0);
   } catch (const std::bad_alloc&) {
@@ -203,7 +205,7 @@ int mlook::readbursttimes(int k, std::vector<double>* times) {
   }
   data.close();
   if (std::isnan(anchor)) {
-    anchor = headers_[k]->roi.roi.SlowStartTime;
+    anchor = swath_[k].header->roi.roi.SlowStartTime;
     if (!Positive(anchor))
       VLR_FAIL(NVLR_UTILITY_Format("Sub-swath %d: no line time and no start time", k + 1).c_str(),
                vlr::kLibInconsistent);
@@ -221,16 +223,17 @@ int mlook::timing() {
   lineInterval_ = swathPar[0].lineInterval;
   int longest = 0;
   for (int k = 0; k < kMlookSwaths; ++k) {
-    VLR_CALL(readbursttimes(k, &burstTimes_[k]));
+    VLR_CALL(readbursttimes(k, &swath_[k].burstTimes));
     longest = std::max(longest, swathPar[k].lines);
   }
-  outputStartTime_ = burstTimes_[0][static_cast<size_t>(firstBurst_)];
+  outputStartTime_ = swath_[0].burstTimes[static_cast<size_t>(firstBurst_)];
   for (int k = 1; k < kMlookSwaths; ++k)
-    outputStartTime_ = std::min(outputStartTime_, burstTimes_[k][static_cast<size_t>(firstBurst_)]);
+    outputStartTime_ =
+        std::min(outputStartTime_, swath_[k].burstTimes[static_cast<size_t>(firstBurst_)]);
   const double maxLines = static_cast<double>(kMaxOutputLinesPerInputLine) * longest;
   double end = 0.0;
   for (int k = 0; k < kMlookSwaths; ++k) {
-    const double last = burstTimes_[k][static_cast<size_t>(firstBurst_ + burstCount_ - 1)];
+    const double last = swath_[k].burstTimes[static_cast<size_t>(firstBurst_ + burstCount_ - 1)];
     const double lines =
         std::nearbyint((last - outputStartTime_) / lineInterval_) + swathPar[k].linesPerBurst;
     end = std::max(end, lines);
@@ -243,8 +246,8 @@ int mlook::timing() {
 
 int mlook::run() {
   VLR_SCOPE("run", kModule);
-  for (const auto& h : headers_)
-    if (!h) VLR_FAIL("Sub-swath headers not read", vlr::kLibMissing);
+  for (const mlook_swath& s : swath_)
+    if (!s.header) VLR_FAIL("Sub-swath headers not read", vlr::kLibMissing);
   VLR_CALL(fclook());
   VLR_CALL(setuprange());
   VLR_CALL(timing());
@@ -273,13 +276,13 @@ int mlook::freeimages() {
   VLR_SCOPE("freeimages", kModule);
   for (int k = 0; k < kMlookSwaths; ++k) {
     output_->swath[k].close();
-    if (conf_->DeleteTempFile != 0 && tempWritten_[k]) {
+    if (conf_->DeleteTempFile != 0 && swath_[k].tempWritten) {
       const std::string name = mlook_detail::TempName(output_->OutputFilename, k);
       if (unlink(name.c_str()) != 0 && errno != ENOENT)
         VLR_REPORT("Cannot remove file", ARE_WARNING);
       VlrRunOutputRemoved(name.c_str());
       errno = 0;
-      tempWritten_[k] = false;
+      swath_[k].tempWritten = false;
     }
   }
   output_->image.close();
