@@ -5,6 +5,7 @@
 #include <cstring>
 #include <fstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "envisat/product_header.h"
@@ -59,7 +60,15 @@ TEST(ProductHeader, GeneratedProductAsItsTruthStates) {
   EXPECT_NEAR(h.lineTimeInterval, truth(run, "Scene", "LineTimeInterval"), 1e-9);
   EXPECT_NEAR(h.azimuthSpacing, truth(run, "Scene", "AzimuthSpacing"), 1e-4);
   EXPECT_EQ(h.fileSize, truth(run, "Scene", "TotalSize"));
-  // The image data sets themselves are checked through the extraction.
+  // The tables sit where the wide-swath layout puts them (record sizes of
+  // the format); the image data sets are checked through the extraction.
+  const EnvisatDsdLayout& l = h.layout();
+  const std::pair<size_t, int64_t> tables[] = {{l.mainProcessing, 2009},
+                                               {l.doppler, 55},
+                                               {l.chirp, 1483},
+                                               {l.antenna, 162},
+                                               {l.geolocation, 521}};
+  for (const auto& [at, dsr] : tables) EXPECT_EQ(h.dataSet(at).dsrSize, dsr) << at;
   EnvisatDataSet mds[5];
   EXPECT_EQ(h.imageDataSets(mds), 5);
   remove_run(run);
