@@ -23,22 +23,7 @@ std::string file_named(const std::string& name) {
   return path;
 }
 
-TEST(EnvisatTypes, RecognisesTheRealOrbitAndCalibrationFiles) {
-  EXPECT_EQ(EnvisatTypes::is_dorvor(kVor.c_str()), 1);
-  EXPECT_EQ(EnvisatTypes::is_dorpor(kVor.c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::is_dorpor(kPor.c_str()), 1);
-  EXPECT_EQ(EnvisatTypes::is_dorvor(kPor.c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::is_xca(kXca.c_str()), 1);
-  // Its product name is not its file name; the header decides.
-  EXPECT_EQ(EnvisatTypes::is_xca(kEr1Xca.c_str()), 1);
-  EXPECT_EQ(EnvisatTypes::is_xch(kXca.c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::find_type(kVor.c_str()), kEnvisatDorVor);
-  EXPECT_EQ(EnvisatTypes::find_type(kPor.c_str()), kEnvisatDorPor);
-  EXPECT_EQ(EnvisatTypes::find_type(kXca.c_str()), kEnvisatAsaXca);
-  EXPECT_EQ(EnvisatTypes::find_type(kEr1Xca.c_str()), kEnvisatAsaXca);
-}
-
-TEST(EnvisatTypes, EveryCodeInTableOrder) {
+TEST(EnvisatTypes, EveryCodeInTableOrderAndNoType) {
   struct Case {
     const char* name;
     int number;
@@ -59,27 +44,28 @@ TEST(EnvisatTypes, EveryCodeInTableOrder) {
     EXPECT_EQ(EnvisatTypes::find_type(p.c_str()), c.number) << c.name;
     EXPECT_EQ(c.test(p.c_str()), 1) << c.name;
   }
-  // The level-0 codes need all nine characters: "ASA_IM_" alone is none.
-  EXPECT_EQ(EnvisatTypes::find_type(file_named("ASA_IM_X0").c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::is_ims(file_named("asa_ims_1P").c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::find_type(file_named("asa_ims_1P").c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::find_type(file_named("SAR_IMS_1P").c_str()), 0);
-}
-
-TEST(EnvisatTypes, UnreadableFilesAreNoType) {
+  // The real files: the product name decides, not the file name.
+  const std::pair<const std::string*, int> real[] = {{&kVor, kEnvisatDorVor},
+                                                     {&kPor, kEnvisatDorPor},
+                                                     {&kXca, kEnvisatAsaXca},
+                                                     {&kEr1Xca, kEnvisatAsaXca}};
+  for (const auto& [file, type] : real) EXPECT_EQ(EnvisatTypes::find_type(file->c_str()), type);
+  EXPECT_EQ(EnvisatTypes::is_dorpor(kVor.c_str()), 0);
+  // Not a type: the level-0 codes need all nine characters, case counts,
+  // and unreadable, empty or cut files.
+  const std::string dir = testing::TempDir();
+  std::ofstream(dir + "type_cut", std::ios::binary) << "PRODUCT=\"ASA_WS";
+  std::ofstream(dir + "type_empty", std::ios::binary).flush();
+  for (const std::string& p :
+       {file_named("ASA_IM_X0"), file_named("asa_ims_1P"), file_named("SAR_IMS_1P"),
+        dir + "type_cut", dir + "type_empty", std::string("/nonexistent/ASA_WSS")})
+    EXPECT_EQ(EnvisatTypes::find_type(p.c_str()), 0) << p;
   errno = 0;
   EXPECT_EQ(EnvisatTypes::is_wss("/nonexistent/ASA_WSS"), 0);
   EXPECT_EQ(errno, 0);
-  EXPECT_EQ(EnvisatTypes::find_type("/nonexistent/ASA_WSS"), 0);
+  EXPECT_EQ(EnvisatTypes::is_ims(file_named("asa_ims_1P").c_str()), 0);
   EXPECT_EQ(EnvisatTypes::find_type(nullptr), 0);
-  // Cut inside the product name, before the code is complete.
-  const std::string cut = testing::TempDir() + "type_cut";
-  std::ofstream(cut, std::ios::binary) << "PRODUCT=\"ASA_WS";
-  EXPECT_EQ(EnvisatTypes::find_type(cut.c_str()), 0);
-  const std::string empty = testing::TempDir() + "type_empty";
-  std::ofstream(empty, std::ios::binary).flush();
-  EXPECT_EQ(EnvisatTypes::find_type(empty.c_str()), 0);
-  EXPECT_EQ(EnvisatTypes::check_dorvor(empty.c_str(), kVor.c_str()), 0);
+  EXPECT_EQ(EnvisatTypes::check_dorvor((dir + "type_empty").c_str(), kVor.c_str()), 0);
 }
 
 // Products against the real orbit files: the precise one is valid from

@@ -3,18 +3,17 @@
 #pragma once
 
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <cctype>
 #include <cmath>
 #include <cstdio>
-#include <cstdlib>
 #include <ctime>
 #include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
 
+#include "metadata_fixture.h"
 #include "sample_files.h"
 #include "truth_math.h"
 
@@ -32,10 +31,6 @@ inline std::string Slurp(const std::string& file) {
   std::ostringstream s;
   s << in.rdbuf();
   return s.str();
-}
-
-inline void Spit(const std::string& file, const std::string& text) {
-  std::ofstream(file, std::ios::binary) << text;
 }
 
 // One record as the test reads it, with the standard library only.
@@ -155,17 +150,9 @@ void WorstErrors(const CircularOrbit& orbit, Section* s, const std::vector<doubl
   }
 }
 
-// A scratch directory per test.
-class ScratchTest : public ::testing::Test {
+// A scratch directory per test, with DORIS files written into it.
+class ScratchTest : public MetadataTest {
  protected:
-  void SetUp() override {
-    char pattern[] = "/tmp/vlr_orbit_XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    dir_ = pattern;
-  }
-  void TearDown() override { std::system(("rm -rf '" + dir_ + "'").c_str()); }
-  std::string path(const std::string& name) const { return dir_ + "/" + name; }
-
   // Writes header and records; the record count written is `count`, or the
   // number of records when count < 0, and the data set size agrees with it.
   std::string WriteDoris(const std::string& name, std::string header,
@@ -177,12 +164,9 @@ class ScratchTest : public ::testing::Test {
     SetHeaderValue(&header, "DS_SIZE", size);
     std::string text = header;
     for (const std::string& r : records) text += r;
-    const std::string file = path(name);
-    Spit(file, text);
-    return file;
+    spit(path(name), text);
+    return path(name);
   }
-
-  std::string dir_;
 };
 
 }  // namespace orbit_test

@@ -34,7 +34,7 @@ class BadDoris : public ScratchTest {
     d.records.assign(vor_.records.begin(), vor_.records.begin() + 40);
     damage(&d);
     if (d.text.empty()) return WriteDoris("damaged", d.header, d.records, d.count);
-    Spit(path("damaged"), d.text);
+    spit(path("damaged"), d.text);
     return path("damaged");
   }
   // Reads n vectors dt apart around time tc.
@@ -103,7 +103,7 @@ TEST_F(BadDoris, HostileFilesGiveTheirCodes) {
   };
   for (const auto& c : cases) EXPECT_EQ(Read(Write(c.damage), time(c.at)), 4) << c.what;
   // An empty file.
-  Spit(path("empty"), "");
+  spit(path("empty"), "");
   EXPECT_EQ(Read(path("empty"), time(20)), 4);
   // Nine records are enough.
   EXPECT_EQ(Read(Write([](Doris* d) { d->records.resize(9); }), time(4)), 0);

@@ -172,9 +172,8 @@ TEST_F(ClosedFormDoris, AscendingNodeOfTheOrbit) {
 }
 
 // The vectors of a scene's grid, 5 s apart, each come from the records
-// around their own time: a vector at a record's time is that record, the
-// others follow the orbit, over scenes of a minute to half an hour and
-// where the grid reaches the first or last record.
+// around their own time and follow the orbit, over scenes of a minute to
+// half an hour and where the grid reaches the first or last record.
 TEST_F(ClosedFormDoris, SceneGridsFollowTheOrbitOverTheirWholeLength) {
   const std::string file = WriteRecords("grid", std::vector<double>(kRecords, 0.0));
   const double first = records_.front().t, last = records_.back().t, middle = records_[60].t;
@@ -200,27 +199,14 @@ TEST_F(ClosedFormDoris, SceneGridsFollowTheOrbitOverTheirWholeLength) {
     ASSERT_EQ(o.n(), n) << s.what;
     ASSERT_EQ(o.t0(), t0) << s.what;
     double worstP = 0.0, worstV = 0.0;
-    int onRecords = 0;
     for (int i = 0; i < n; ++i) {
-      const double t = t0 + i * dt;
-      const double* p = o.positions() + 3 * i;
-      const double* v = o.velocities() + 3 * i;
       double rp[3], rv[3];
-      orbit_.at(t, rp, rv);
-      for (const Record& r : records_) {
-        if (r.t != t) continue;
-        ++onRecords;
-        for (int a = 0; a < 3; ++a) {
-          EXPECT_EQ(p[a], r.p[a]) << s.what << ", vector " << i;
-          EXPECT_EQ(v[a], r.v[a]) << s.what << ", vector " << i;
-        }
-      }
+      orbit_.at(t0 + i * dt, rp, rv);
       for (int a = 0; a < 3; ++a) {
-        worstP = std::fmax(worstP, std::fabs(p[a] - rp[a]));
-        worstV = std::fmax(worstV, std::fabs(v[a] - rv[a]));
+        worstP = std::fmax(worstP, std::fabs(o.positions()[3 * i + a] - rp[a]));
+        worstV = std::fmax(worstV, std::fabs(o.velocities()[3 * i + a] - rv[a]));
       }
     }
-    EXPECT_GE(onRecords, (n - 1) / 12) << s.what;
     EXPECT_LT(worstP, 3e-3) << s.what;
     EXPECT_LT(worstV, 3e-6) << s.what;
   }

@@ -61,11 +61,9 @@ TEST(GroundPoint, SphericalCaseMatchesTheTriangle) {
 }
 
 // The satisfied equations are checked through the orbit's sat2earth.
-TEST(GroundPoint, RangeShortOfTheEarthOrNoVelocityFail) {
-  const double P[3] = {6494931.106, 578715.148, -2977719.455};
-  const double V[3] = {3188.730641, -1416.295158, 6692.698996}, still[3] = {0.0, 0.0, 0.0};
+TEST(GroundPoint, NoVelocityFails) {
+  const double P[3] = {6494931.106, 578715.148, -2977719.455}, still[3] = {0.0, 0.0, 0.0};
   double G[3];
-  EXPECT_EQ(gr_pt(P, V, 1e-4, 0.0, 0.0562, 0.0, 1, kWgs84A, kWgs84B, G), 2);
   EXPECT_EQ(gr_pt(P, still, 5.9e-3, 0.0, 0.0562, 0.0, 1, kWgs84A, kWgs84B, G), 1);
 }
 
@@ -143,24 +141,23 @@ TEST(OrbitFit, CoefficientLayouts) {
   EXPECT_EQ(orbffit(pos, nullptr, 10.0, 2.0, m, cpos, nullptr, 7, nullptr, nullptr), 1);
 }
 
-double shifted_cos(double x) {
+double cosine(double x) {
   return std::cos(x);
 }
 double always_positive(double x) {
   return 1.0 + x * x;
 }
 
-TEST(Rtbis, RootOrAFailureCode) {
-  double root = 0.0;
-  ASSERT_EQ(rtbis(shifted_cos, 0.0, 3.0, 1e-10, &root), 0);
-  EXPECT_NEAR(root, M_PI / 2.0, 1e-10);
-  ASSERT_EQ(rtbis(shifted_cos, 3.0, 0.0, 1e-10, &root), 0);
-  EXPECT_NEAR(root, M_PI / 2.0, 1e-10);
-  root = -1.0;
+TEST(Rtbis, RootEitherWayRoundOrAFailureCode) {
+  double root = -1.0;
   EXPECT_EQ(rtbis(always_positive, -1.0, 1.0, 1e-6, &root), 1);
   EXPECT_EQ(root, -1.0);
+  for (double a : {0.0, 3.0}) {
+    ASSERT_EQ(rtbis(cosine, a, 3.0 - a, 1e-10, &root), 0);
+    EXPECT_NEAR(root, M_PI / 2.0, 1e-10);
+  }
   // An accuracy that halving never reaches.
-  EXPECT_EQ(rtbis(shifted_cos, 0.0, 3.0, 0.0, &root), 1);
+  EXPECT_EQ(rtbis(cosine, 0.0, 3.0, 0.0, &root), 1);
 }
 
 }  // namespace
