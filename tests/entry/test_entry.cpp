@@ -118,7 +118,7 @@ TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
     SCOPED_TRACE("closed " + name + (c.trace ? "with trace" : "without trace"));
     TempInstallation inst(c.trace);
     inst.hostFiles();
-    const RunResult r = inst.runWithClosed("main_convert#x", c.closed);
+    const RunResult r = inst.run("main_convert#x", {}, c.closed);
     EXPECT_EQ(r.status, 255);
     const std::string log = ReadFile(inst.working() + "Process.log");
     // The error recorder's lines go to the standard error stream only.
