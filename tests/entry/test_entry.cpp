@@ -69,7 +69,7 @@ TEST_F(Tool, RunsEndingBeforeTheDriver) {
       {"unknown command word", "main_Import_ESA#x", 456963,
        kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command; the tool", true},
       {"no installation", "main_import_ESA#x", 783360,
-       "AN ERROR OCCUR DURING Veloran INIT  : [783360]\n", false, kNone},
+       "AN ERROR OCCUR DURING Veloran INIT  : [783360]\n [EC : 783360]\nwindir\n", false, kNone},
       {"installation named by windir", "main_Import_ESA#x", 456963, "[ERROR ID : 456963]", true,
        kWindir},
       {"no configuration", "main_import_ESA#x", 261122, ini + "\n", false, kInitDir, "-"},

@@ -149,6 +149,31 @@ TEST_F(HostPaths, PercentWrittenForTheHostStaysWithinZeroTo99) {
   EXPECT_EQ(working(), "5\nkeep\n");
 }
 
+TEST_F(HostPaths, OperatorInterruptsThroughTheProgressBar) {
+  init();
+  inst_.hostFiles(0, "Starting");
+  const std::string path = inst_.workingFile();
+  EXPECT_EXIT(
+      {
+        waitbar_update(0, 1.0f);
+        waitbar_open("Extracting");
+        waitbar_update(0, 10.0f);
+        // The host withdraws the run while the bar is shown.
+        std::remove((path + "_batch_ok").c_str());
+        waitbar_update(0, 20.0f);
+        std::_Exit(0);
+      },
+      ::testing::ExitedWithCode(255), "");
+  const std::string lines = "BATCH RUN INTERRUPTED\n [EC : 326400]\n" + path + "\n" + kErrorTail;
+  EXPECT_EQ(working(), "-1\nExtracting\n" + lines);
+  EXPECT_EQ(errorFile(), "-1\n" + lines);
+  EXPECT_NE(log().find("\n\n" + kId + " [ERROR ID : 326400]\n  BATCH RUN INTERRUPTED []\n  " +
+                       path + " \n\n"),
+            std::string::npos)
+      << log();
+  EXPECT_NE(log().find("\nEND :  Extracting  -  "), std::string::npos) << log();
+}
+
 TEST_F(HostPaths, FailedCopyRaises261123) {
   init();
   inst_.hostFiles();
