@@ -185,8 +185,6 @@ void ExpectSubSwaths(const SynthRun& run, const std::string& root, bool withOrbi
     EXPECT_TRUE(Exists(raster + ".vrt"));
 
     const vlr_test::SmlFields f = ReadSml(raster + ".sml");
-    EXPECT_EQ(Number(f, "NrOfLinesPerImage"), records);
-    EXPECT_EQ(Number(f, "NrOfPixelsPerLine"), samples);
     EXPECT_EQ(Field(f, "CellType"), "FLOAT_COMPLEX");
     EXPECT_EQ(Field(f, "DataUnits"), "SLC");
     EXPECT_EQ(Field(f, "BytesOrder"), "LSBF");
@@ -204,13 +202,16 @@ void ExpectSubSwaths(const SynthRun& run, const std::string& root, bool withOrbi
     EXPECT_NEAR(Number(f, "SlantRange", 0), nearRange, kSlantRangeTolerance);
     EXPECT_NEAR(Number(f, "SlantRange", 1), 0.5 * (nearRange + farRange), kSlantRangeTolerance);
     EXPECT_NEAR(Number(f, "SlantRange", 2), farRange, kSlantRangeTolerance);
-    EXPECT_NEAR(Number(f, "PixelSpacingRg"), TruthNumber(run, s, "RangeSpacing"), 1e-6);
-    EXPECT_NEAR(Number(f, "PRFExtracted"), TruthNumber(run, s, "PRF"), 1e-6);
-    for (const auto& [field, key] : {std::pair{"Lines_per_burst", "LinesPerBurst"},
-                                     {"Bursts", "Bursts"},
-                                     {"Echoes_per_burst", "EchoesPerBurst"},
-                                     {"Rank", "Rank"}})
-      EXPECT_EQ(Number(f, field), TruthNumber(run, s, key)) << field;
+    const struct {
+      const char* field;
+      const char* truth;
+      double tolerance;
+    } counts[] = {{"NrOfLinesPerImage", "Records", 0},       {"NrOfPixelsPerLine", "Samples", 0},
+                  {"PixelSpacingRg", "RangeSpacing", 1e-6},  {"PRFExtracted", "PRF", 1e-6},
+                  {"Lines_per_burst", "LinesPerBurst", 0},   {"Bursts", "Bursts", 0},
+                  {"Echoes_per_burst", "EchoesPerBurst", 0}, {"Rank", "Rank", 0}};
+    for (const auto& c : counts)
+      EXPECT_NEAR(Number(f, c.field), TruthNumber(run, s, c.truth), c.tolerance) << c.field;
     EXPECT_EQ(Field(f, "OtherInfo.SCENE DATA"), "ENVISAT-1|ENVISAT_WSS|SS" + std::to_string(k) +
                                                     "|" + Truth(run, "Scene", "Polarisation") +
                                                     "|" + Truth(run, "Scene", "Pass") +

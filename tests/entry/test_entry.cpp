@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <map>
 #include <regex>
 #include <stdexcept>
 #include <string>
@@ -48,70 +49,59 @@ TEST(CommandWord, SelectionIsCaseSensitiveAndNeedsTheHash) {
   EXPECT_STREQ(cmd, "main_import_ESA#/a/b");
 }
 
-TEST_F(Tool, UnknownCommandWordEndsWith456963) {
-  const RunResult r = inst_.run("main_Import_ESA#x");
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(log().find(kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command; the tool"),
-            std::string::npos);
-  EXPECT_NE(errorFile().find("[EC : 456963]"), std::string::npos);
-  EXPECT_EQ(log().find("START :"), std::string::npos);
-  EXPECT_NE(MaskLocalTimes(log()).find("\n\n- -   " + kId + "\n\n<TIME>\n\nERROR :\n   \n\n\n" +
-                                       kStars + "\nEND :  -  -  <TIME>\n" + kStars + "\n\n"),
-            std::string::npos);
-}
-
-TEST_F(Tool, MissingInstallationWritesNothing) {
-  RunResult r = inst_.run("main_import_ESA#x", {{"VELORAN_INIT_DIR", ""}});
-  EXPECT_EQ(r.status, 255);
-  // Only the standard error stream tells the code before the catalogs exist.
-  EXPECT_NE(r.err.find("AN ERROR OCCUR DURING Veloran INIT  : [783360]\n"), std::string::npos);
-  EXPECT_NE(r.err.find("\nwindir\n"), std::string::npos);
-  EXPECT_FALSE(Exists(inst_.working() + "Process.log"));
-  EXPECT_FALSE(Exists(inst_.workingFile() + "_error"));
-  // windir is the second place looked at.
-  r = inst_.run("main_import_ESA#x", {{"VELORAN_INIT_DIR", ""}, {"windir", inst_.root()}});
-  EXPECT_EQ(r.status, 255);
-  EXPECT_TRUE(Exists(inst_.working() + "Process.log"));
-}
-
-TEST_F(Tool, BrokenConfigurationFails) {
+// Runs that end before any driver starts: an unknown command word, no
+// installation, a damaged configuration, an empty argument text.  Before the
+// catalogs exist only the standard error stream tells the code.
+TEST_F(Tool, RunsEndingBeforeTheDriver) {
   const std::string ini = inst_.root() + "/Veloran_configuration.ini";
   const std::string good = ReadFile(ini);
-  // Missing configuration: 261122; thirteen lines or an over-long line: 783360.
-  std::remove(ini.c_str());
-  RunResult r = inst_.run("main_import_ESA#x");
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(r.err.find("[EC : 261122]\n" + ini + "\n"), std::string::npos) << r.err;
-  WriteFile(ini, good.substr(0, good.rfind("NaN")));
-  r = inst_.run("main_import_ESA#x");
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(r.err.find("[783360]\n [EC : 783360]\n"), std::string::npos) << r.err;
-  WriteFile(ini, std::string(600, 'w') + "/\n" + good);
-  r = inst_.run("main_import_ESA#x");
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(r.err.find("[EC : 783360]\n"), std::string::npos);
-  EXPECT_NE(r.err.find("too long\n"), std::string::npos) << r.err;
-  EXPECT_FALSE(Exists(inst_.working() + "Process.log"));
-}
-
-TEST_F(Tool, TooFewArgumentsRaise456962AfterTheStartRecord) {
-  const std::string title = "Import ESA Products";
-  const std::string args = inst_.writeArguments({"one", "two"});
-  const RunResult r = inst_.run("main_import_ESA#" + args + "###Veloran###host text");
-  EXPECT_EQ(r.status, 255);
-  const std::string expected = "\n\n\n" + kStars + "\nSTART : " + title + "  [ " + kId +
-                               " ]\n<TIME>\n" + kStars +
-                               "\n\n Parameter 0 (one)\n Parameter 1 (two)\n\n" + kStars + "\n\n";
-  EXPECT_EQ(MaskLocalTimes(log()).substr(0, expected.size()), expected) << log();
-  EXPECT_NE(log().find("[ERROR ID : 456962]\n  INVALID INPUT [An input argument is missing or "
-                       "invalid; check the named input]\n  " +
-                       args + " \n\n"),
-            std::string::npos);
-  const std::string error = errorFile();
-  EXPECT_EQ(error.substr(0, 3), "-1\n");
-  EXPECT_NE(error.find("[EC : 456962]\n" + args + "\n"), std::string::npos);
-  EXPECT_EQ(ReadFile(inst_.workingFile()).substr(0, 12), "-1\nStarting\n");
-  EXPECT_NE(log().find("\nEND :  " + title + "  -  "), std::string::npos);
+  enum Init { kInitDir, kNone, kWindir };  // where the installation is named
+  struct Case {
+    const char* what;
+    std::string command;
+    int code;
+    std::string text;  // in Process.log when `logged`, else on standard error
+    bool logged;
+    Init init = kInitDir;
+    std::string configuration = "";  // empty: the installed one; "-": none
+  };
+  const Case cases[] = {
+      {"unknown command word", "main_Import_ESA#x", 456963,
+       kId + " [ERROR ID : 456963]\n  INVALID INPUT [Unknown command; the tool", true},
+      {"no installation", "main_import_ESA#x", 783360,
+       "AN ERROR OCCUR DURING Veloran INIT  : [783360]\n [EC : 783360]\nwindir\n", false, kNone},
+      {"installation named by windir", "main_Import_ESA#x", 456963, "[ERROR ID : 456963]", true,
+       kWindir},
+      {"no configuration", "main_import_ESA#x", 261122, ini + "\n", false, kInitDir, "-"},
+      {"thirteen configuration lines", "main_import_ESA#x", 783360, "[783360]\n [EC : 783360]\n",
+       false, kInitDir, good.substr(0, good.rfind("NaN"))},
+      {"an over-long configuration line", "main_import_ESA#x", 783360, "too long\n", false,
+       kInitDir, std::string(600, 'w') + "/\n" + good},
+      {"empty argument text", "main_import_ESA#", 261122, "[ERROR ID : 261122]", true},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    std::remove((inst_.working() + "Process.log").c_str());
+    std::remove((inst_.workingFile() + "_error").c_str());
+    std::remove(ini.c_str());
+    if (c.configuration != "-") WriteFile(ini, c.configuration.empty() ? good : c.configuration);
+    std::map<std::string, std::string> env;
+    if (c.init != kInitDir) env["VELORAN_INIT_DIR"] = "";
+    if (c.init == kWindir) env["windir"] = inst_.root();
+    const RunResult r = inst_.run(c.command, env);
+    EXPECT_EQ(r.status, 255);
+    const std::string code = std::to_string(c.code);
+    if (!c.logged) {
+      EXPECT_NE(r.err.find(c.text), std::string::npos) << r.err;
+      EXPECT_NE(r.err.find("[EC : " + code + "]\n"), std::string::npos) << r.err;
+      EXPECT_FALSE(Exists(inst_.working() + "Process.log"));
+      EXPECT_FALSE(Exists(inst_.workingFile() + "_error"));
+      continue;
+    }
+    EXPECT_NE(log().find(c.text), std::string::npos) << log();
+    EXPECT_EQ(log().find("START :"), std::string::npos) << log();
+    EXPECT_NE(errorFile().find("[EC : " + code + "]"), std::string::npos) << errorFile();
+  }
 }
 
 TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
@@ -128,7 +118,7 @@ TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
     SCOPED_TRACE("closed " + name + (c.trace ? "with trace" : "without trace"));
     TempInstallation inst(c.trace);
     inst.hostFiles();
-    const RunResult r = inst.runWithClosed("main_convert#x", c.closed);
+    const RunResult r = inst.run("main_convert#x", {}, c.closed);
     EXPECT_EQ(r.status, 255);
     const std::string log = ReadFile(inst.working() + "Process.log");
     // The error recorder's lines go to the standard error stream only.
@@ -145,12 +135,6 @@ TEST_F(Tool, ClosedStandardDescriptorsKeepTheErrorLinesOutOfTheLogs) {
       EXPECT_NE(trace.find("\nERROR : INVALID INPUT [Unknown command"), std::string::npos) << trace;
     }
   }
-}
-
-TEST_F(Tool, EmptyArgumentTextEndsWithTheListReaderError) {
-  const RunResult r = inst_.run("main_import_ESA#");
-  EXPECT_EQ(r.status, 255);
-  EXPECT_NE(errorFile().find("[EC : 261122]"), std::string::npos);
 }
 
 // The entry with stand-in drivers, run in a child process as the host runs

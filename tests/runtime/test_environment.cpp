@@ -233,9 +233,6 @@ TEST(FileUtility, SuffixesAndHeaderNames) {
   EXPECT_EQ(NVLR_UTILITY_ResolveHeaderName((base + "_hdr").c_str()), base + ".sml");
   EXPECT_TRUE(NVLR_UTILITY_CreateDir((std::string(dir) + "/a/b/c").c_str()));
   EXPECT_TRUE(Exists(std::string(dir) + "/a/b/c"));
-  EXPECT_EQ(NVLR_UTILITY_Timestamp().size(), 21u);
-  EXPECT_EQ(NVLR_UTILITY_TimestampText().size(), 27u);
-  EXPECT_GT(NVLR_UTILITY_MemoryStatus(), 0u);
   vlr_test::RunProgram({"/bin/rm", "-rf", dir}, {}, true);
 }
 

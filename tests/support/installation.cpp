@@ -48,11 +48,6 @@ bool Exists(const std::string& path) {
 }
 
 RunResult RunProgram(const std::vector<std::string>& argv,
-                     const std::map<std::string, std::string>& env, bool inheritEnvironment) {
-  return RunProgram(argv, env, inheritEnvironment, {});
-}
-
-RunResult RunProgram(const std::vector<std::string>& argv,
                      const std::map<std::string, std::string>& env, bool inheritEnvironment,
                      const std::vector<int>& closedDescriptors) {
   std::map<std::string, std::string> vars;
@@ -154,13 +149,9 @@ std::map<std::string, std::string> toolEnvironment(const std::string& root,
 }  // namespace
 
 RunResult TempInstallation::run(const std::string& command,
-                                const std::map<std::string, std::string>& env) const {
-  return RunProgram({ToolPath(), command}, toolEnvironment(root_, env), true);
-}
-
-RunResult TempInstallation::runWithClosed(const std::string& command,
-                                          const std::vector<int>& closed) const {
-  return RunProgram({ToolPath(), command}, toolEnvironment(root_, {}), true, closed);
+                                const std::map<std::string, std::string>& env,
+                                const std::vector<int>& closed) const {
+  return RunProgram({ToolPath(), command}, toolEnvironment(root_, env), true, closed);
 }
 
 void TempInstallation::useInProcess() const {

@@ -33,12 +33,10 @@ class TempInstallation {
 
   // Runs the tool with the command string as its arguments, with
   // VELORAN_INIT_DIR pointing here unless env overrides it (an empty value
-  // removes the variable).
-  RunResult run(const std::string& command,
-                const std::map<std::string, std::string>& env = {}) const;
-  // The same with the given standard descriptors (0, 1, 2) closed in the
-  // tool, as a careless host may start it.
-  RunResult runWithClosed(const std::string& command, const std::vector<int>& closed) const;
+  // removes the variable), and the given standard descriptors (0, 1, 2)
+  // closed, as a careless host may start it.
+  RunResult run(const std::string& command, const std::map<std::string, std::string>& env = {},
+                const std::vector<int>& closed = {}) const;
 
   // Makes this installation the one the calling process initialises from.
   void useInProcess() const;
@@ -55,13 +53,10 @@ void WriteFile(const std::string& path, const std::string& content);
 bool Exists(const std::string& path);
 std::string ToolPath();
 std::string SourceDir();
-// Runs a program with arguments and an environment; returns its result.
-RunResult RunProgram(const std::vector<std::string>& argv,
-                     const std::map<std::string, std::string>& env, bool inheritEnvironment);
-// The same with the given standard descriptors closed in the program instead
-// of captured.
+// Runs a program with arguments and an environment, the given standard
+// descriptors closed in it instead of captured; returns its result.
 RunResult RunProgram(const std::vector<std::string>& argv,
                      const std::map<std::string, std::string>& env, bool inheritEnvironment,
-                     const std::vector<int>& closedDescriptors);
+                     const std::vector<int>& closedDescriptors = {});
 
 }  // namespace vlr_test
