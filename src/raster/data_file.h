@@ -124,10 +124,6 @@ class DataFile : public GeneralSAR_Base {
 
   // Copies the description (not the name, not the open state) into `other`.
   int clone(DataFile* other) const;
-  // Copies the data (data_size() bytes) into `new_name` in pieces of
-  // `piece_size` bytes and writes its header with this description.  0, 1
-  // (bad piece size or description, target is the source), 4, 5, 7 or 9.
-  int copy(const char* new_name, int piece_size);
 
  protected:
   void refreshParameters() override;

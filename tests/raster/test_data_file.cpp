@@ -148,27 +148,17 @@ TEST_F(DataFileTest, OffsetsBeyondFourGiB) {
   std::filesystem::remove(path("big"));
 }
 
-TEST_F(DataFileTest, CopyWritesDataAndHeader) {
+// A raster holds its data when the file is at least as long as the description; a copy of an
+// open file is closed and writes its header like the original.
+TEST_F(DataFileTest, HeldDataAndCopiesOfAnOpenFile) {
   DataFile df;
   Describe(&df, path("src"), CT_INT16, true, 3, 4, 2, 6);
-  const std::string data = RandomBytes(static_cast<size_t>(df.data_size()), 3);  // 36 bytes
   EXPECT_FALSE(df.holds_data());
-  spit(path("src"), data + "trailing bytes are not raster data");
+  spit(path("src"), RandomBytes(static_cast<size_t>(df.data_size()), 3));
   EXPECT_TRUE(df.holds_data());
-  ASSERT_EQ(df.copy(path("dst").c_str(), 12), 0);  // 36 = 3 x 12: a final empty piece
-  EXPECT_EQ(slurp(path("dst")), data);
-  DataFile copied;  // the header as well
-  ASSERT_EQ(copied.read_hdr(path("dst").c_str()), 0);
-  EXPECT_EQ(copied.header_offset, 6);
-
-  EXPECT_EQ(df.copy(path("x").c_str(), 0), 1);
-  EXPECT_EQ(df.copy(path("src").c_str(), 10), 1);  // onto itself: refused, source intact
-  EXPECT_EQ(slurp(path("src")).substr(0, data.size()), data);
   df.lines_per_image = 10;  // longer than the file
   EXPECT_FALSE(df.holds_data());
-  EXPECT_EQ(df.copy(path("dst").c_str(), 10), 4);
 
-  // A copy of an open file is closed and writes its header like the original.
   ASSERT_EQ(df.open(DataFile::kOpenRead), 0);
   DataFile copy = df;
   EXPECT_FALSE(copy.is_open());
@@ -176,6 +166,7 @@ TEST_F(DataFileTest, CopyWritesDataAndHeader) {
   copy.set_name(path("copy").c_str());
   copy.lines_per_image = 11;
   ASSERT_EQ(copy.write_hdr(), 0);
+  DataFile copied;
   ASSERT_EQ(copied.read_hdr(path("copy").c_str()), 0);
   EXPECT_EQ(copied.header_offset, 6);
   EXPECT_EQ(copied.lines_per_image, 11);
