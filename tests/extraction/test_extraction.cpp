@@ -306,10 +306,7 @@ TEST(DamagedAntennaPatterns, RecordsThatDoNotFitAreLeftOut) {
   bytes.replace(offset + kRecord + kBeam, 3, "SS3");
   const char quietNaN[4] = {0x7f, static_cast<char>(0xc0), 0, 0};
   bytes.replace(offset + 3 * kRecord + kFirstGain + 8, 4, quietNaN, 4);
-  std::FILE* f = std::fopen(run.product.c_str(), "wb");
-  ASSERT_NE(f, nullptr);
-  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
-  ASSERT_EQ(std::fclose(f), 0);
+  vlr_test::WriteFile(run.product, bytes);
 
   images_conf conf;
   images ex(conf);

@@ -183,10 +183,7 @@ TEST_F(MultilookInputs, BurstTimesFollowTheBurstStructure) {
   const size_t third = 2 * static_cast<size_t>(p.swath(1, "LinesPerBurst")) * line;
   ASSERT_LT(third + 12, bytes.size());
   bytes[third + 3] -= 1;  // one day earlier
-  std::FILE* f = std::fopen(raster.c_str(), "wb");
-  ASSERT_NE(f, nullptr);
-  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
-  std::fclose(f);
+  vlr_test::WriteFile(raster, std::string(bytes.begin(), bytes.end()));
   const Output damaged = multilook(Imported{p.run, root}, "T_pwr", false);
   const Output intact = multilook(p, "I_pwr", false);
   ASSERT_EQ(damaged.code, 0);
