@@ -1,9 +1,6 @@
-// The extraction against the generator's truth, for wide-swath products (five
-// sub-swaths in bursts), single-image stripmap products (IMS) and
-// alternating-polarisation products of two images (APS): every sample and line
-// prefix of every raster against the product's own bytes, the names of
-// rasters and headers, and the metadata against the values the generator
-// wrote and the geometry it computed by itself.
+// The extraction of wide-swath (WSS), stripmap (IMS) and alternating
+// polarisation (APS) products: every raster against the product's own bytes,
+// the metadata against the generator's values and geometry.
 #include <cmath>
 #include <cstdio>
 #include <cstring>

@@ -1,9 +1,6 @@
-// Generated products multilooked and geocoded: the checkerboard's cell edges
-// and the point targets lie where the generator's geometry puts them on the
-// map (transformed by GDAL into the map the file states), the file is a
-// Cloud Optimized GeoTIFF that GDAL places by itself, the UTM zone fits the
-// scene, and the lattice of exact solutions stays close to the exact
-// mapping.
+// Generated products multilooked and geocoded: checkerboard edges and point
+// targets where the generator's geometry puts them on the map (through GDAL),
+// a Cloud Optimized GeoTIFF that GDAL places, a UTM zone that fits the scene.
 #include <cpl_conv.h>
 #include <gdal_priv.h>
 #include <ogr_spatialref.h>
