@@ -6,13 +6,13 @@
 
 #include <gtest/gtest.h>
 #include <stdlib.h>
-#include <sys/stat.h>
 
 #include <cstdio>
 #include <cstdlib>
 #include <string>
 
 #include "extraction/images.h"
+#include "installation.h"
 #include "runtime/suite_state.h"
 #include "synth_run.h"
 
@@ -28,10 +28,7 @@ inline std::string Text(const SynthRun& run, const std::string& section, const s
 inline double Value(const SynthRun& run, const std::string& section, const std::string& key) {
   return std::atof(Text(run, section, key).c_str());
 }
-inline bool Exists(const std::string& path) {
-  struct stat st;
-  return stat(path.c_str(), &st) == 0;
-}
+using vlr_test::Exists;
 
 // Runs the extraction of a generated product into <dir>R, with the orbit
 // file the generator wrote unless another (or "" for none) is given.
@@ -56,14 +53,9 @@ class HostWorkingFile : public ::testing::Environment {
     char pattern[] = "/tmp/vlr_extraction_XXXXXX";
     ASSERT_NE(mkdtemp(pattern), nullptr);
     dir_ = pattern;
-    const std::string working = dir_ + "/Process.working";
-    for (const std::string& name : {working, working + "_batch_ok"}) {
-      std::FILE* f = std::fopen(name.c_str(), "w");
-      ASSERT_NE(f, nullptr);
-      if (name == working) std::fputs("0\nStarting\n", f);
-      std::fclose(f);
-    }
-    vlr_detail::suite().workingFile = working;
+    vlr_detail::suite().workingFile = dir_ + "/Process.working";
+    vlr_test::WriteFile(dir_ + "/Process.working", "0\nStarting\n");
+    vlr_test::WriteFile(dir_ + "/Process.working_batch_ok", "");
   }
   void TearDown() override { synth_test::shell("rm -rf '" + dir_ + "'"); }
 

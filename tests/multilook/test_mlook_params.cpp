@@ -54,6 +54,7 @@ TEST_F(MultilookParameters, MissingKeysAndRanges) {
   EXPECT_EQ(conf.Verbose, 1);
   EXPECT_EQ(conf.DeleteTempFile, 1);
   EXPECT_EQ(conf.checkpar(), 0);
+  // Out of range; no ground resolution is no resolution at all, not one look.
   for (int mlook_conf::*field : {&mlook_conf::Sl2Gr, &mlook_conf::GrSamplingStep,
                                  &mlook_conf::GrResolution, &mlook_conf::RgWinLen}) {
     for (int bad : {-1, 1001, kMlookUndefinedInt}) {
@@ -62,15 +63,10 @@ TEST_F(MultilookParameters, MissingKeysAndRanges) {
       EXPECT_EQ(c.checkpar(), 1) << bad;
     }
   }
-  // No ground resolution is no resolution at all, not one look.
-  for (int bad : {0, -120}) {
-    mlook_conf c;
-    c.GrResolution = bad;
-    EXPECT_EQ(c.checkpar(), 1) << bad;
-    EXPECT_NE(processLog().find("GrResolution = " + std::to_string(bad) + " is outside 1 to 1000"),
-              std::string::npos)
-        << processLog();
-  }
+  mlook_conf none;
+  none.GrResolution = 0;
+  EXPECT_EQ(none.checkpar(), 1);
+  EXPECT_NE(processLog().find("GrResolution = 0 is outside 1 to 1000"), std::string::npos);
   mlook_input input;
   EXPECT_EQ(input.readpar(write("in.hdr", "[mlookInput]\nLevel1Filename = R\n").c_str()), 1);
   EXPECT_EQ(input.BurstsToProcess, 0);
@@ -187,10 +183,7 @@ TEST_F(MultilookInputs, BurstTimesFollowTheBurstStructure) {
   const size_t third = 2 * static_cast<size_t>(p.swath(1, "LinesPerBurst")) * line;
   ASSERT_LT(third + 12, bytes.size());
   bytes[third + 3] -= 1;  // one day earlier
-  std::FILE* f = std::fopen(raster.c_str(), "wb");
-  ASSERT_NE(f, nullptr);
-  ASSERT_EQ(std::fwrite(bytes.data(), 1, bytes.size(), f), bytes.size());
-  std::fclose(f);
+  vlr_test::WriteFile(raster, std::string(bytes.begin(), bytes.end()));
   const Output damaged = multilook(Imported{p.run, root}, "T_pwr", false);
   const Output intact = multilook(p, "I_pwr", false);
   ASSERT_EQ(damaged.code, 0);
