@@ -140,6 +140,12 @@ TEST_F(Sections, HostileCountsFailWithoutAllocating) {
     EXPECT_NE(pattern.readhdr(par.c_str()), 0) << count;
     EXPECT_EQ(pattern.patternSize(), 0);
   }
+  // A header may hold no pattern (0 samples): there are no gains to hand out.
+  AntennaPattern_Obj none;
+  none.PatternSamples = 0;
+  float gain = -1.0f;
+  EXPECT_EQ(none.getPatternArray(&gain), 1);
+  EXPECT_EQ(gain, -1.0f);
   SwathInfo swath;
   fill(swath, 1);
   const std::string par = path("swath.par");
